@@ -1,0 +1,21 @@
+// Every declaration of the tarsel_ps engine interface.
+#pragma once
+
+#include "tarsel/export.h"
+#include "tarsel/limits.h"
+#include "tarsel/errors.h"
+#include "tarsel/identity.h"
+#include "tarsel/wrapped_array.h"
+#include "tarsel/param_flags.h"
+#include "tarsel/render_context.h"
+#include "tarsel/param.h"
+#include "tarsel/genotype.h"
+#include "tarsel/effect_globals.h"
+#include "tarsel/catalogue.h"
+#include "tarsel/param_queries.h"
+#include "tarsel/raster_info.h"
+#include "tarsel/effect.h"
+#include "tarsel/image_utils.h"
+#include "tarsel/load_frame.h"
+#include "tarsel/gfx.h"
+#include "tarsel/ipc.h"

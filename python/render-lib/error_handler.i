@@ -1,0 +1,63 @@
+// The engine's message channel to Python: one process-wide handler, a Python
+// callable taking (level, message), installed with set_error_handler.
+
+%{
+#include "tarsel/errors.h"
+%}
+
+// Message levels, rising with severity. "NoBeep" levels are the quiet forms of
+// their namesakes; "NoHdr" levels are shown without a header line. The module
+// passes the level through; the handler decides what it means for display.
+enum ErrLevel {
+  Err_LogOnly = 0,
+  Err_NoHdrNoBeep = 1,
+  Err_InfoNoBeep = 2,
+  Err_NoteNoBeep = 3,
+  Err_Info = 4,
+  Err_Note = 5,
+  Err_NoHdr = 6,
+  Err_Alert = 7,
+  Err_Warning = 8,
+  Err_Error = 9,
+  Err_Fatal = 10
+};
+
+%{
+// The installed handler, or null. The module owns one reference to it.
+static PyObject *installed_error_handler = NULL;
+
+// Called by the engine from any thread, with or without a Python thread state.
+// The handler's result is deliberately neither inspected nor released, and an
+// exception it raises is left pending in the calling thread's state.
+static void forward_engine_message(int level, const char *message)
+{
+  if (!installed_error_handler)
+    return;
+  PyGILState_STATE gil = PyGILState_Ensure();
+  // Read again under the lock: the handler may have been removed meanwhile.
+  if (installed_error_handler)
+    PyObject_CallFunction(installed_error_handler, "(is)", level, message);
+  PyGILState_Release(gil);
+}
+
+static PyObject *set_error_handler(PyObject *callback)
+{
+  if (callback != Py_None && !PyCallable_Check(callback)) {
+    PyErr_SetString(PyExc_TypeError, "Callback must be callable");
+    return NULL;
+  }
+  // The engine is told first, so an abort leaves the old handler in place.
+  T_set_err_handler(callback == Py_None ? NULL : forward_engine_message);
+  PyObject *previous = installed_error_handler;
+  if (callback == Py_None) {
+    installed_error_handler = NULL;
+  } else {
+    Py_INCREF(callback);
+    installed_error_handler = callback;
+  }
+  Py_XDECREF(previous);
+  Py_RETURN_NONE;
+}
+%}
+
+PyObject *set_error_handler(PyObject *callback);

@@ -1,0 +1,18 @@
+// Errors of the shared-memory transport, as its get_last_error reports them.
+
+%{
+#include "tarsel/ipc.h"
+%}
+
+namespace Tarsel {
+namespace IPC {
+enum class ShmemError {
+  SHMEM_NO_ERROR = 0,
+  INVALID_SEGMENT = 1,
+  TIMEOUT = 2,
+  LOCK_ERROR = 3,
+  RETRY = 4,
+  MSG_TOO_LARGE = 5
+};
+}
+}

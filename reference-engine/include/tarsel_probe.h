@@ -1,0 +1,47 @@
+/* Test probe of the reference engine: a C interface, reached from tests through
+ * ctypes, that shows what the engine was asked to do and injects faults. It is
+ * not part of the engine contract and the Python module never calls it. */
+#ifndef TARSEL_PROBE_H
+#define TARSEL_PROBE_H
+
+#include "tarsel/export.h"
+
+#ifdef __cplusplus
+extern "C" {
+#endif
+
+/* Call log: one entry "name(arg, arg, ...)" per engine entry call, oldest
+ * first. Only the newest TARSEL_PROBE_LOG_CAPACITY entries are kept. */
+#define TARSEL_PROBE_LOG_CAPACITY 4096
+TARSEL_API int tarsel_probe_call_count(void);
+/* Entry `index` (0 = oldest kept); null when out of range. The text stays
+ * valid until the next probe call. */
+TARSEL_API const char *tarsel_probe_call(int index);
+TARSEL_API void tarsel_probe_clear_calls(void);
+
+/* Fault switch: while armed, the next engine entry call (of any thread)
+ * throws TarselAbortException instead of doing its work, and disarms it.
+ * 0 disarms. */
+TARSEL_API void tarsel_probe_set_abort_next_call(int armed);
+/* 1 while the switch is armed and no call has consumed it. */
+TARSEL_API int tarsel_probe_abort_armed(void);
+
+/* 1 while tarsel_abort_render's request stands. */
+TARSEL_API int tarsel_probe_abort_requested(void);
+
+/* Sends `count` messages "<text> <i>" (i from 0) at `level` to the installed
+ * handler from a new engine worker thread and waits for it; returns the number
+ * sent. */
+TARSEL_API int tarsel_probe_emit_from_worker(int count, int level, const char *text);
+/* Sends one message on the calling thread. */
+TARSEL_API void tarsel_probe_emit_here(int level, const char *text);
+
+/* Replaces the version text that get_tarsel_version_info reports (any bytes,
+ * for testing the text conversion); null restores the engine's own. */
+TARSEL_API void tarsel_probe_set_version_text(const char *text);
+
+#ifdef __cplusplus
+}
+#endif
+
+#endif

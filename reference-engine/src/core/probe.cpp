@@ -1,0 +1,120 @@
+// The test probe (tarsel_probe.h) and the call log that every entry point feeds.
+#include <atomic>
+#include <cinttypes>
+#include <cstdio>
+#include <deque>
+#include <mutex>
+#include <string>
+#include <thread>
+
+#include "core/abort.h"
+#include "core/entry.h"
+#include "core/messages.h"
+#include "core/probe_state.h"
+#include "tarsel/errors.h"
+#include "tarsel_probe.h"
+
+namespace tarsel_ref {
+namespace {
+
+struct CallLog {
+  std::mutex mutex;
+  std::deque<std::string> entries;
+  std::string returned;  // keeps the text handed out by tarsel_probe_call alive
+};
+
+CallLog &call_log() {
+  static CallLog *log = new CallLog;  // never destroyed: entry calls may come during process exit
+  return *log;
+}
+
+std::atomic<bool> abort_next_call{false};
+
+std::mutex version_mutex;
+std::optional<std::string> version_override;
+
+}  // namespace
+
+std::string describe(const char *text) {
+  if (!text) return "null";
+  return std::string("\"") + text + "\"";
+}
+
+std::string describe(const void *pointer) {
+  if (!pointer) return "null";
+  char buffer[32];
+  std::snprintf(buffer, sizeof buffer, "0x%" PRIxPTR, reinterpret_cast<std::uintptr_t>(pointer));
+  return buffer;
+}
+
+std::string describe(long long value) { return std::to_string(value); }
+
+std::string describe(double value) {
+  char buffer[32];
+  std::snprintf(buffer, sizeof buffer, "%g", value);
+  return buffer;
+}
+
+void record_entry(const char *name, std::string arguments) {
+  {
+    CallLog &log = call_log();
+    std::lock_guard<std::mutex> lock(log.mutex);
+    if (log.entries.size() == TARSEL_PROBE_LOG_CAPACITY) log.entries.pop_front();
+    log.entries.push_back(std::string(name) + "(" + arguments + ")");
+  }
+  if (abort_next_call.exchange(false)) throw TarselAbortException();
+}
+
+std::optional<std::string> probe::version_text_override() {
+  std::lock_guard<std::mutex> lock(version_mutex);
+  return version_override;
+}
+
+}  // namespace tarsel_ref
+
+using tarsel_ref::call_log;
+
+int tarsel_probe_call_count(void) {
+  std::lock_guard<std::mutex> lock(call_log().mutex);
+  return static_cast<int>(call_log().entries.size());
+}
+
+const char *tarsel_probe_call(int index) {
+  auto &log = call_log();
+  std::lock_guard<std::mutex> lock(log.mutex);
+  if (index < 0 || static_cast<std::size_t>(index) >= log.entries.size()) return nullptr;
+  log.returned = log.entries[static_cast<std::size_t>(index)];
+  return log.returned.c_str();
+}
+
+void tarsel_probe_clear_calls(void) {
+  std::lock_guard<std::mutex> lock(call_log().mutex);
+  call_log().entries.clear();
+}
+
+void tarsel_probe_set_abort_next_call(int armed) { tarsel_ref::abort_next_call.store(armed != 0); }
+
+int tarsel_probe_abort_armed(void) { return tarsel_ref::abort_next_call.load() ? 1 : 0; }
+
+int tarsel_probe_abort_requested(void) { return tarsel_ref::abort_requested() ? 1 : 0; }
+
+int tarsel_probe_emit_from_worker(int count, int level, const char *text) {
+  const std::string prefix = text ? text : "";
+  int sent = 0;
+  std::thread worker([&] {
+    for (int i = 0; i < count; ++i, ++sent)
+      tarsel_ref::emit_message(level, (prefix + " " + std::to_string(i)).c_str());
+  });
+  worker.join();
+  return sent;
+}
+
+void tarsel_probe_emit_here(int level, const char *text) { tarsel_ref::emit_message(level, text); }
+
+void tarsel_probe_set_version_text(const char *text) {
+  std::lock_guard<std::mutex> lock(tarsel_ref::version_mutex);
+  if (text)
+    tarsel_ref::version_override = std::string(text);
+  else
+    tarsel_ref::version_override.reset();
+}

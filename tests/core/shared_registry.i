@@ -1,0 +1,31 @@
+// A second binding module, built by the tests with the same SWIG as _renderlib.
+// It names T_RasterInfo and RenderContext without wrapping them, so the types
+// it uses are the ones _renderlib published in the shared type registry.
+%module shared_registry
+
+%{
+#include "tarsel/raster_info.h"
+#include "tarsel/render_context.h"
+
+// Stand-ins for engine render contexts: the identity rule compares and hashes
+// handles without reading through them.
+alignas(16) static char context_storage[2][16];
+%}
+
+struct T_RasterInfo;
+class RenderContext;
+
+%feature("compactdefaultargs") scaled;
+
+%inline %{
+int raster_width(const T_RasterInfo *info) { return info ? info->ds_xsize : -1; }
+T_RasterInfo *same_raster(T_RasterInfo *info) { return info; }
+RenderContext *context_handle(int which) { return reinterpret_cast<RenderContext *>(context_storage[which & 1]); }
+
+bool negate(bool value) { return !value; }
+float halve(float value) { return value / 2; }
+unsigned int echo_unsigned(unsigned int value) { return value; }
+int scaled(int value, int factor = 2) { return value * factor; }
+int arity(int) { return 1; }
+int arity(int, int) { return 2; }
+%}

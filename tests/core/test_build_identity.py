@@ -1,0 +1,90 @@
+"""Version text, build identifiers, colour configuration and the user check."""
+import os
+import re
+import subprocess
+import sys
+
+import pytest
+
+import _renderlib
+
+NO_ARGUMENT_FUNCTIONS = ["get_tarsel_version_info", "ext_build_id", "get_tarsel_build_id",
+                         "check_build_id", "get_ocio_path"]
+
+
+def test_module_and_engine_built_together_share_one_identifier():
+    module_id = _renderlib.ext_build_id()
+    assert re.fullmatch(r"[0-9a-f]{16}", module_id)
+    assert _renderlib.ext_build_id() == module_id
+    assert _renderlib.get_tarsel_build_id() == module_id
+    assert _renderlib.check_build_id() is True
+
+
+def test_an_engine_built_separately_fails_the_check(separate_engine):
+    # The separately configured engine replaces the bundled one at load time.
+    script = "import _renderlib; print(_renderlib.check_build_id(), _renderlib.ext_build_id(), _renderlib.get_tarsel_build_id())"
+    env = dict(os.environ, LD_PRELOAD=" ".join(filter(None, [os.environ.get("LD_PRELOAD"), separate_engine])))
+    out = subprocess.run([sys.executable, "-c", script], env=env, capture_output=True, text=True, check=True).stdout
+    check, module_id, engine_id = out.split()
+    assert check == "False"
+    assert module_id == _renderlib.ext_build_id()
+    assert re.fullmatch(r"[0-9a-f]{16}", engine_id) and engine_id != module_id
+
+
+@pytest.mark.parametrize("name", NO_ARGUMENT_FUNCTIONS)
+def test_functions_without_arguments_refuse_any(name):
+    with pytest.raises(TypeError, match=r"takes no arguments \(1 given\)"):
+        getattr(_renderlib, name)(None)
+
+
+def test_version_text_is_the_engines(probe):
+    assert _renderlib.get_tarsel_version_info().startswith("tarsel_ps reference engine ")
+    [call] = probe.calls()
+    assert re.fullmatch(r"get_tarsel_version_info\(0x[0-9a-f]+, 255\)", call)
+
+
+def test_version_text_is_cut_at_255_characters(probe):
+    probe.set_version_text(b"v" * 300)
+    assert _renderlib.get_tarsel_version_info() == "v" * 255
+
+
+def test_text_results_keep_invalid_utf8_as_surrogate_escapes(probe):
+    raw = b"caf\xe9 \xff build"
+    probe.set_version_text(raw)
+    text = _renderlib.get_tarsel_version_info()
+    assert text == "caf\udce9 \udcff build"
+    assert text.encode("utf-8", "surrogateescape") == raw
+
+
+def test_colour_configuration_is_what_the_engine_uses(monkeypatch):
+    monkeypatch.setenv("OCIO", "/studio/config.ocio")
+    assert _renderlib.get_ocio_path() == "/studio/config.ocio"
+    monkeypatch.delenv("OCIO")
+    assert _renderlib.get_ocio_path() == ""
+
+
+def test_user_check_compares_the_identity_text_exactly():
+    identity = "S-1-22-1-%d" % os.geteuid()
+    assert _renderlib.check_user(identity) is True
+    assert _renderlib.check_user("") is False
+    assert _renderlib.check_user(identity + " ") is False
+    assert _renderlib.check_user("S-1-22-1-%d" % (os.geteuid() + 1)) is False
+    assert _renderlib.check_user(None) is False  # a null text, as for any pointer
+
+
+@pytest.mark.parametrize("bad", [b"S-1-22-1-0", 0, "S-1-\udcff"])
+def test_user_check_takes_only_encodable_text(bad):
+    with pytest.raises(TypeError, match=r"^in method 'check_user', argument 1 of type 'char const \*'$"):
+        _renderlib.check_user(bad)
+
+
+def test_main_job_reports_engine_identity_user_and_catalogues():
+    out = subprocess.run([sys.executable, "-m", "renderlib", "info"],
+                         capture_output=True, text=True, check=True).stdout
+    fields = dict(line.split(":", 1) for line in out.splitlines())
+    fields = {key.strip(): value.strip() for key, value in fields.items()}
+    assert fields["engine version"] == _renderlib.get_tarsel_version_info()
+    assert fields["build identity"] == "match"
+    assert fields["user check"].endswith("-> ok")
+    assert fields["effects"] == str(_renderlib.get_n_tarsel_effects())
+    assert fields["builder effects"] == str(_renderlib.get_n_tarsel_builder_effects())

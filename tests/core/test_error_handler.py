@@ -1,0 +1,110 @@
+"""The engine's message channel and the translation of engine aborts."""
+import sys
+import threading
+
+import pytest
+
+import _renderlib
+
+
+def test_messages_from_an_engine_worker_reach_the_handler_in_order(probe, error_handler_removed):
+    received = []
+    _renderlib.set_error_handler(lambda level, message: received.append((level, message, threading.get_ident())))
+    # The probe call releases the interpreter lock while the engine's worker
+    # thread (which has no Python thread state) delivers the messages.
+    assert probe.emit_from_worker(500, _renderlib.Err_Warning, "grain") == 500
+    assert [(level, message) for level, message, _ in received] == [
+        (_renderlib.Err_Warning, "grain %d" % i) for i in range(500)]
+    assert {thread for _, _, thread in received} != {threading.get_ident()}
+
+
+def test_installing_tells_the_engine_and_removing_passes_null(probe, error_handler_removed):
+    assert _renderlib.set_error_handler(print) is None
+    assert _renderlib.set_error_handler(None) is None
+    assert _renderlib.set_error_handler(None) is None  # nothing installed: still told
+    calls = probe.calls()
+    assert len(calls) == 3 and calls[0].startswith("T_set_err_handler(0x")
+    assert calls[1:] == ["T_set_err_handler(null)"] * 2
+
+
+def test_without_a_handler_messages_are_dropped(probe, error_handler_removed):
+    _renderlib.set_error_handler(None)
+    assert probe.emit_from_worker(10, _renderlib.Err_Error, "lost") == 10
+
+
+def test_a_non_callable_is_refused_and_the_old_handler_stays(probe, error_handler_removed):
+    received = []
+    _renderlib.set_error_handler(lambda level, message: received.append(message))
+    probe.clear_calls()
+    for bad in (5, "print", object()):
+        with pytest.raises(TypeError, match="^Callback must be callable$"):
+            _renderlib.set_error_handler(bad)
+    assert probe.calls() == []  # the engine was not asked
+    probe.emit_here(_renderlib.Err_Info, "still here")
+    assert received == ["still here"]
+
+
+def test_the_module_holds_exactly_one_reference_to_the_handler(error_handler_removed):
+    def handler(level, message):
+        pass
+
+    before = sys.getrefcount(handler)
+    _renderlib.set_error_handler(handler)
+    _renderlib.set_error_handler(handler)  # replacing with itself keeps one
+    assert sys.getrefcount(handler) == before + 1
+    _renderlib.set_error_handler(None)
+    assert sys.getrefcount(handler) == before
+
+
+def test_an_exception_raised_by_the_handler_stays_pending_in_the_calling_thread(probe, error_handler_removed):
+    def handler(level, message):
+        raise ValueError("handler failed on " + message)
+
+    _renderlib.set_error_handler(handler)
+    # The engine's own call returns normally; the exception is left set in the
+    # thread that called the engine, so the interpreter finds it when the
+    # foreign call returns.
+    with pytest.raises(SystemError) as raised:
+        probe.emit_here(_renderlib.Err_Error, "frame 7")
+    assert isinstance(raised.value.__cause__, ValueError)
+    assert str(raised.value.__cause__) == "handler failed on frame 7"
+    # On an engine worker the exception goes with the worker's temporary
+    # thread state; the engine and the calling thread carry on.
+    assert probe.emit_from_worker(3, _renderlib.Err_Error, "worker") == 3
+
+
+def test_an_engine_abort_becomes_runtime_error_and_changes_nothing(probe, error_handler_removed):
+    received = []
+    _renderlib.set_error_handler(lambda level, message: received.append(message))
+    probe.abort_next_call()
+    with pytest.raises(RuntimeError) as raised:
+        _renderlib.set_error_handler(None)
+    assert raised.value.args == ("Tarsel Abort",)
+    probe.emit_here(_renderlib.Err_Info, "after abort")
+    assert received == ["after abort"]  # the handler is still installed
+    assert _renderlib.get_n_tarsel_effects() == 0  # the next call is served
+
+
+@pytest.mark.parametrize("call", [
+    _renderlib.get_n_tarsel_effects,
+    _renderlib.get_n_tarsel_builder_effects,
+    lambda: _renderlib.get_tarsel_plugin_info_i(0),
+    _renderlib.get_tarsel_version_info,
+    _renderlib.get_tarsel_build_id,
+    _renderlib.check_build_id,
+    _renderlib.get_ocio_path,
+    _renderlib.tarsel_abort_render,
+    _renderlib.tarsel_clear_abort,
+], ids=lambda call: getattr(call, "__name__", "get_tarsel_plugin_info_i"))
+def test_every_engine_call_is_guarded(probe, call):
+    probe.abort_next_call()
+    with pytest.raises(RuntimeError, match="^Tarsel Abort$"):
+        call()
+    assert not probe.abort_armed()
+
+
+def test_abort_request_is_set_and_cleared_by_the_engine(probe):
+    _renderlib.tarsel_abort_render()
+    assert probe.abort_requested()
+    _renderlib.tarsel_clear_abort()
+    assert not probe.abort_requested()

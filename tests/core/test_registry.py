@@ -1,0 +1,53 @@
+"""Type sharing between _renderlib and another module on the same registry,
+and the identity rule of engine records."""
+import ctypes
+
+import pytest
+
+import _renderlib
+import renderlib
+
+
+def test_a_renderlib_proxy_is_accepted_by_the_other_module(shared_registry):
+    info = renderlib.T_RasterInfo()
+    info.ds_xsize = 1920
+    assert shared_registry.raster_width(info) == 1920
+    assert shared_registry.raster_width(info.this) == 1920  # the bare proxy object too
+
+
+def test_pointers_returned_by_the_other_module_become_renderlib_classes(shared_registry):
+    info = renderlib.T_RasterInfo()
+    again = shared_registry.same_raster(info)
+    assert type(again) is renderlib.T_RasterInfo
+    assert int(again.this) == int(info.this)
+    assert not again.this.own()  # the other module did not create it
+    again.ds_ysize = 1080
+    assert info.ds_ysize == 1080
+
+
+def test_the_other_module_refuses_foreign_types(shared_registry):
+    with pytest.raises(TypeError, match=r"^in method 'raster_width', argument 1 of type 'T_RasterInfo const \*'$"):
+        shared_registry.raster_width(renderlib.T_RenderInfo())
+
+
+def low_32_bits_signed(address):
+    return ctypes.c_int32(address & 0xFFFFFFFF).value
+
+
+def test_records_are_equal_by_native_address_and_hash_by_its_low_bits(shared_registry):
+    first, same, other = (shared_registry.context_handle(i) for i in (0, 0, 1))
+    assert type(first) is renderlib.RenderContext
+    assert first is not same and first == same and not (first != same)
+    assert first != other and not (first == other)
+    assert hash(first) == hash(same) == low_32_bits_signed(int(first.this))
+    assert hash(other) == low_32_bits_signed(int(other.this))
+
+
+@pytest.mark.parametrize("foreign", [None, 5, "context", renderlib.T_RasterInfo()], ids=repr)
+def test_comparing_a_record_with_anything_else_falls_back_to_python(shared_registry, foreign):
+    context = shared_registry.context_handle(0)
+    assert (context == foreign) is False
+    assert (context != foreign) is True
+    assert _renderlib.RenderContext___eq__(context, foreign) is NotImplemented
+    assert _renderlib.RenderContext___ne__(context, foreign) is NotImplemented
+

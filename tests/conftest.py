@@ -26,7 +26,9 @@ def error_handler_removed():
 
 
 @pytest.fixture(scope="session")
-def separate_engine(tmp_path_factory):
-    """A reference engine configured and built apart from the module."""
-    from native_build import build_reference_engine
-    return build_reference_engine(tmp_path_factory.mktemp("separate-engine"))
+def module_on_separate_engine(tmp_path_factory):
+    """A module built with the build's option for another engine, against a
+    reference engine configured and built on its own: the folder holding it."""
+    from native_build import build_module_against, build_reference_engine
+    engine = build_reference_engine(tmp_path_factory.mktemp("separate-engine"))
+    return build_module_against(engine, tmp_path_factory.mktemp("module-on-separate-engine"))

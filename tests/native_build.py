@@ -25,13 +25,26 @@ def run(command, cwd=None):
                    stdout=subprocess.PIPE, stderr=subprocess.STDOUT)
 
 
+def cmake_build(source_dir, build_dir, *options):
+    run([tool("cmake"), "-S", source_dir, "-B", build_dir, "-G", "Ninja", "-DCMAKE_MAKE_PROGRAM=" + tool("ninja"),
+         "-DCMAKE_BUILD_TYPE=Release"] + list(options))
+    run([tool("cmake"), "--build", build_dir])
+    return pathlib.Path(build_dir)
+
+
 def build_reference_engine(build_dir):
     """Configures and builds reference-engine/ on its own, which draws a build
-    identifier of its own; returns the path of its libtarsel_ps.so."""
-    run([tool("cmake"), "-S", REPO / "reference-engine", "-B", build_dir, "-G", "Ninja",
-         "-DCMAKE_MAKE_PROGRAM=" + tool("ninja"), "-DCMAKE_BUILD_TYPE=Release"])
-    run([tool("cmake"), "--build", build_dir, "--target", "tarsel_ps"])
-    return str(pathlib.Path(build_dir) / "libtarsel_ps.so")
+    identifier of its own; returns the folder holding its libraries."""
+    return cmake_build(REPO / "reference-engine", build_dir)
+
+
+def build_module_against(engine_dir, build_dir):
+    """Builds the module alone against the engine libraries in `engine_dir`
+    (headers from engine-api/); returns the folder holding _renderlib."""
+    cmake_build(REPO, build_dir, "-DRENDERLIB_ENGINE_INCLUDE_DIR=%s" % (REPO / "engine-api"),
+                "-DRENDERLIB_ENGINE_LIBRARY_DIR=%s" % engine_dir, "-DPython_EXECUTABLE=" + sys.executable,
+                "-DSWIG_EXECUTABLE=" + tool("swig"))
+    return pathlib.Path(build_dir) / "python" / "render-lib"
 
 
 def build_swig_module(interface, build_dir, include_dirs=()):

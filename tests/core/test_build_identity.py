@@ -20,15 +20,17 @@ def test_module_and_engine_built_together_share_one_identifier():
     assert _renderlib.check_build_id() is True
 
 
-def test_an_engine_built_separately_fails_the_check(separate_engine):
-    # The separately configured engine replaces the bundled one at load time.
-    script = "import _renderlib; print(_renderlib.check_build_id(), _renderlib.ext_build_id(), _renderlib.get_tarsel_build_id())"
-    env = dict(os.environ, LD_PRELOAD=" ".join(filter(None, [os.environ.get("LD_PRELOAD"), separate_engine])))
+def test_a_module_built_against_a_separately_built_engine_fails_the_check(module_on_separate_engine):
+    script = ("import _renderlib; print(_renderlib.__file__); "
+              "print(_renderlib.check_build_id(), _renderlib.ext_build_id(), _renderlib.get_tarsel_build_id())")
+    env = dict(os.environ, PYTHONPATH=str(module_on_separate_engine))
     out = subprocess.run([sys.executable, "-c", script], env=env, capture_output=True, text=True, check=True).stdout
-    check, module_id, engine_id = out.split()
+    location, result = out.splitlines()
+    assert location.startswith(str(module_on_separate_engine))
+    check, module_id, engine_id = result.split()
     assert check == "False"
-    assert module_id == _renderlib.ext_build_id()
-    assert re.fullmatch(r"[0-9a-f]{16}", engine_id) and engine_id != module_id
+    assert re.fullmatch(r"[0-9a-f]{16}", module_id) and re.fullmatch(r"[0-9a-f]{16}", engine_id)
+    assert module_id != engine_id
 
 
 @pytest.mark.parametrize("name", NO_ARGUMENT_FUNCTIONS)

@@ -40,6 +40,13 @@ TARSEL_API void tarsel_probe_emit_here(int level, const char *text);
  * for testing the text conversion); null restores the engine's own. */
 TARSEL_API void tarsel_probe_set_version_text(const char *text);
 
+/* Counts for leak checks: effect instances made and not yet freed, Param
+ * objects alive (those of instances and those a host made), and stamps held
+ * by the engine's stamp cache. */
+TARSEL_API int tarsel_probe_live_instances(void);
+TARSEL_API int tarsel_probe_live_params(void);
+TARSEL_API int tarsel_probe_stamp_count(void);
+
 #ifdef __cplusplus
 }
 #endif

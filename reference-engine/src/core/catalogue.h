@@ -1,5 +1,5 @@
 // The engine's two catalogues of effect plug-ins: the ordinary effects and the
-// effect builder's. Effect modules add their entries at start-up.
+// effect builder's, made from the effect definitions (effects/registry.h).
 #pragma once
 
 #include <vector>

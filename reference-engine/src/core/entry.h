@@ -1,5 +1,11 @@
 // Every exported engine entry point starts with enter(): it records the call in
 // the probe's call log and honours the probe's "abort the next call" switch.
+//
+// enter() returns a scope that marks the calling thread as inside the engine
+// until the entry point returns. Calls the engine makes to its own entry points
+// meanwhile (a parameter's virtual operations while an instance is built, say)
+// are neither logged nor aborted: the log shows what the host asked for, and
+// the fault switch strikes only where the host can see the abort.
 #pragma once
 
 #include <cstddef>
@@ -19,9 +25,20 @@ inline std::string describe(std::size_t value) { return describe(static_cast<lon
 inline std::string describe(bool value) { return value ? "true" : "false"; }
 inline std::string describe(float value) { return describe(static_cast<double>(value)); }
 
-// Appends "name(arg, arg, ...)" to the call log, then throws
-// TarselAbortException if the probe armed its fault switch.
-void record_entry(const char *name, std::string arguments);
+// Appends "name(arg, arg, ...)" to the call log, then, when `may_abort`,
+// throws TarselAbortException if the probe armed its fault switch.
+void record_entry(const char *name, std::string arguments, bool may_abort = true);
+
+// Depth of engine entry calls on the calling thread.
+int &entry_depth();
+
+class EntryScope {
+public:
+  EntryScope() { ++entry_depth(); }
+  ~EntryScope() { --entry_depth(); }
+  EntryScope(const EntryScope &) = delete;
+  EntryScope &operator=(const EntryScope &) = delete;
+};
 
 inline void join_arguments(std::string &) {}
 template <typename First, typename... Rest>
@@ -32,10 +49,23 @@ void join_arguments(std::string &out, const First &first, const Rest &...rest) {
 }
 
 template <typename... Args>
-void enter(const char *name, const Args &...args) {
+EntryScope enter(const char *name, const Args &...args) {
+  if (entry_depth() == 0) {
+    std::string arguments;
+    join_arguments(arguments, args...);
+    record_entry(name, std::move(arguments));
+  }
+  return EntryScope();
+}
+
+// For entry points that must not throw (destructors): logged like enter(), but
+// the fault switch stays armed for the next call.
+template <typename... Args>
+void note_entry(const char *name, const Args &...args) {
+  if (entry_depth() != 0) return;
   std::string arguments;
   join_arguments(arguments, args...);
-  record_entry(name, std::move(arguments));
+  record_entry(name, std::move(arguments), false);
 }
 
 }  // namespace tarsel_ref

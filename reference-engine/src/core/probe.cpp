@@ -11,6 +11,9 @@
 #include "core/entry.h"
 #include "core/messages.h"
 #include "core/probe_state.h"
+#include "model/instance.h"
+#include "model/param_values.h"
+#include "model/stamps.h"
 #include "tarsel/errors.h"
 #include "tarsel_probe.h"
 
@@ -55,14 +58,19 @@ std::string describe(double value) {
   return buffer;
 }
 
-void record_entry(const char *name, std::string arguments) {
+int &entry_depth() {
+  thread_local int depth = 0;
+  return depth;
+}
+
+void record_entry(const char *name, std::string arguments, bool may_abort) {
   {
     CallLog &log = call_log();
     std::lock_guard<std::mutex> lock(log.mutex);
     if (log.entries.size() == TARSEL_PROBE_LOG_CAPACITY) log.entries.pop_front();
     log.entries.push_back(std::string(name) + "(" + arguments + ")");
   }
-  if (abort_next_call.exchange(false)) throw TarselAbortException();
+  if (may_abort && abort_next_call.exchange(false)) throw TarselAbortException();
 }
 
 std::optional<std::string> probe::version_text_override() {
@@ -118,3 +126,9 @@ void tarsel_probe_set_version_text(const char *text) {
   else
     tarsel_ref::version_override.reset();
 }
+
+int tarsel_probe_live_instances(void) { return tarsel_ref::live_instance_count(); }
+
+int tarsel_probe_live_params(void) { return tarsel_ref::live_params(); }
+
+int tarsel_probe_stamp_count(void) { return tarsel_ref::stamp_count(); }

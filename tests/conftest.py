@@ -1,6 +1,11 @@
+import importlib
+import pathlib
+import sys
+
 import pytest
 
 import _renderlib
+import renderlib  # noqa: F401  (registers the proxy classes before a second module loads)
 from engine_probe import EngineProbe
 
 _probe = None
@@ -32,3 +37,33 @@ def module_on_separate_engine(tmp_path_factory):
     from native_build import build_module_against, build_reference_engine
     engine = build_reference_engine(tmp_path_factory.mktemp("separate-engine"))
     return build_module_against(engine, tmp_path_factory.mktemp("module-on-separate-engine"))
+
+
+@pytest.fixture
+def instance():
+    """Factory of effect instances that frees them after the test."""
+    made = []
+
+    def make(name, builder=False):
+        effect = _renderlib.init_tarsel_effect(name, builder)
+        assert effect is not None, name
+        made.append(effect)
+        return effect
+
+    yield make
+    for effect in made:
+        if effect.this.own():  # not freed by the test itself
+            _renderlib.free_tarsel_effect(effect)
+
+
+@pytest.fixture(scope="session")
+def shared_registry(tmp_path_factory):
+    """A second SWIG module sharing _renderlib's type registry."""
+    from native_build import REPO, build_swig_module
+    folder = build_swig_module(pathlib.Path(__file__).with_name("shared_registry.i"),
+                               tmp_path_factory.mktemp("shared-registry"), [REPO / "engine-api"])
+    sys.path.insert(0, str(folder))
+    try:
+        yield importlib.import_module("shared_registry")
+    finally:
+        sys.path.remove(str(folder))

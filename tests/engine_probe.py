@@ -32,6 +32,15 @@ class EngineProbe:
         lib.tarsel_probe_set_abort_next_call.argtypes = [ctypes.c_int]
         lib.tarsel_probe_set_version_text.argtypes = [ctypes.c_char_p]
 
+    def live_instances(self):
+        return self.lib.tarsel_probe_live_instances()
+
+    def live_params(self):
+        return self.lib.tarsel_probe_live_params()
+
+    def stamp_count(self):
+        return self.lib.tarsel_probe_stamp_count()
+
     def calls(self):
         """The call log, oldest first, as text."""
         lib = self.lib

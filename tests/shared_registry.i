@@ -22,6 +22,9 @@ int raster_width(const T_RasterInfo *info) { return info ? info->ds_xsize : -1; 
 T_RasterInfo *same_raster(T_RasterInfo *info) { return info; }
 RenderContext *context_handle(int which) { return reinterpret_cast<RenderContext *>(context_storage[which & 1]); }
 
+// The address of any Python object as a void * pointer proxy.
+void *object_address(PyObject *object) { return object; }
+
 bool negate(bool value) { return !value; }
 float halve(float value) { return value / 2; }
 unsigned int echo_unsigned(unsigned int value) { return value; }

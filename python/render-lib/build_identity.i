@@ -1,8 +1,6 @@
 // What the module runs against: the engine's version and build identifier,
 // the module's own identifier, the engine's colour-management configuration,
 // and the identity of the process's user.
-%include "std_string.i"
-
 %{
 #include <cstdio>
 #include <cstdlib>

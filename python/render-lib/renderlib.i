@@ -25,6 +25,11 @@ static void renderlib_initialize_threads()
 #include "tarsel/errors.h"
 %}
 
+// Proxy methods pass their arguments on as given, so that an omitted argument
+// takes the default of the engine's declaration and every overload set
+// reports its own prototypes.
+%feature("python:cdefaultargs");
+
 // Wrappers keep the interpreter lock unless an interface file lets a long
 // engine call run without it (%threadallow).
 %nothreadallow;
@@ -41,6 +46,7 @@ static void renderlib_initialize_threads()
 }
 
 %include "conventions.i"
+%include "renderlib_typemaps.i"
 
 // Product identity and build configuration, fixed when the module is built.
 %{
@@ -101,10 +107,21 @@ static void renderlib_initialize_threads()
 
 // The order of this list is the order in which the module registers its
 // constants and classes at import.
-%include "model/param_types.i"
+%include "std_except.i"
+%include "std_string.i"
+%include "std_vector.i"
+%include "std_map.i"
+%include "model/value_arrays.i"
+%include "model/containers.i"
+%include "model/param_enums.i"
+%include "model/effect_globals.i"
+%include "model/genotype.i"
+%include "model/effect_def.i"
 %include "model/param_flags.i"
+%include "model/param.i"
 %include "render/raster_info.i"
 %include "model/catalogue.i"
+%include "model/param_queries.i"
 %include "render/effect_instance.i"
 %include "error_handler.i"
 %include "ipc/shmem_error.i"

@@ -7,6 +7,7 @@ import sys
 import pytest
 
 import _renderlib
+from renderlib import effects
 
 NO_ARGUMENT_FUNCTIONS = ["get_tarsel_version_info", "ext_build_id", "get_tarsel_build_id",
                          "check_build_id", "get_ocio_path"]
@@ -83,10 +84,14 @@ def test_user_check_takes_only_encodable_text(bad):
 def test_main_job_reports_engine_identity_user_and_catalogues():
     out = subprocess.run([sys.executable, "-m", "renderlib", "info"],
                          capture_output=True, text=True, check=True).stdout
-    fields = dict(line.split(":", 1) for line in out.splitlines())
+    summary, listing = out.split("\n\n", 1)
+    fields = dict(line.split(":", 1) for line in summary.splitlines())
     fields = {key.strip(): value.strip() for key, value in fields.items()}
     assert fields["engine version"] == _renderlib.get_tarsel_version_info()
     assert fields["build identity"] == "match"
     assert fields["user check"].endswith("-> ok")
     assert fields["effects"] == str(_renderlib.get_n_tarsel_effects())
     assert fields["builder effects"] == str(_renderlib.get_n_tarsel_builder_effects())
+    for builder in (False, True):
+        for entry in effects.catalogue(builder):
+            assert "  %s  [%s]" % (entry.plugin_name, entry._category) in listing

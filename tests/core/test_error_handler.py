@@ -82,7 +82,7 @@ def test_an_engine_abort_becomes_runtime_error_and_changes_nothing(probe, error_
     assert raised.value.args == ("Tarsel Abort",)
     probe.emit_here(_renderlib.Err_Info, "after abort")
     assert received == ["after abort"]  # the handler is still installed
-    assert _renderlib.get_n_tarsel_effects() == 0  # the next call is served
+    assert _renderlib.get_n_tarsel_effects() > 0  # the next call is served
 
 
 @pytest.mark.parametrize("call", [

@@ -1,4 +1,7 @@
 """Raster and render descriptors made and edited from Python."""
+import ctypes
+import struct
+
 import pytest
 
 import _renderlib
@@ -61,3 +64,17 @@ def test_render_context_cannot_be_made_from_python():
     with pytest.raises(AttributeError, match="No constructor defined"):
         renderlib.RenderContext()
     assert not hasattr(_renderlib, "new_RenderContext")
+
+
+def test_raster_descriptor_fields_at_their_offsets():
+    info = renderlib.T_RasterInfo()
+    names = ["ds_xsize", "ds_ysize", "x_origin", "y_origin", "world_xsize", "world_ysize", "pixel_type", None,
+             "bit_depth", "raster_type", "sizeof_pixel", "clamp_p", "res_factor", "downsample_offset",
+             "extra_line_stride_elts", None, None, None, None, None, "flip_y_p", "levels_601_p",
+             "is_premultiplied", None]
+    ctypes.memmove(int(info.this), struct.pack("<24i", *range(1, 25)), 96)
+    for word, name in enumerate(names):
+        if name:
+            assert getattr(info, name) == word + 1, name
+    ctypes.memmove(int(info.this) + 96, struct.pack("<ff", 0.25, -4.5), 8)
+    assert (info.x_origin_float, info.y_origin_float) == (0.25, -4.5)

@@ -5,6 +5,7 @@ import subprocess
 import sys
 
 import _renderlib
+from renderlib import effects
 
 
 def user_identity():
@@ -36,7 +37,25 @@ def info(_args):
         print("user check:         ", identity, "->", "ok" if _renderlib.check_user(identity) else "FAILED")
     print("effects:            ", _renderlib.get_n_tarsel_effects())
     print("builder effects:    ", _renderlib.get_n_tarsel_builder_effects())
+    for builder in (False, True):
+        print()
+        print("Effect builder catalogue" if builder else "Effect catalogue")
+        for entry in effects.catalogue(builder):
+            describe_effect(entry, builder)
     return 0 if build_match else 3
+
+
+def describe_effect(entry, builder):
+    """One catalogue entry: its inputs and parameters, read from an instance."""
+    print("  %s  [%s]" % (entry.plugin_name, entry._category))
+    instance = _renderlib.init_tarsel_effect(entry.plugin_name, builder)
+    if instance is None:
+        print("    (the engine made no instance)")
+        return
+    genotype = instance.effect_genotype
+    print("    inputs:     %s" % (", ".join(genotype._get_input_names()) or "none"))
+    for param in genotype._get_params():
+        print("    %-22s %-10s %s" % (param.name, param.ptype_name(), param.to_string(None)))
 
 
 def main(argv=None):

@@ -1,0 +1,75 @@
+"""Both catalogues walked completely: every effect created, read and freed."""
+import _renderlib
+import renderlib
+from effect_helpers import all_entries, all_params
+from renderlib import effects
+
+PARAM_ATTRIBUTES = ["ptype", "name", "canonical_name", "n_channels", "n_channels_c1", "use_old_default_p",
+                    "old_default_version_limit", "min_bound", "max_bound", "step", "normalize_scale", "slider_min",
+                    "slider_max", "big_slider_min", "big_slider_max", "param_group", "flags_string"]
+FLAG_ATTRIBUTES = ["wenable_p", "fromfile_popup_p", "screen_mode", "autotrans_type", "hidden_p", "group_start_p",
+                   "group_start_open_p", "group_end_p", "doc_group_p", "needs_input_n", "auto_animation_type",
+                   "dont_publish_p", "builder_disable_p", "builder_disable_one_p"]
+GENOTYPE_ATTRIBUTES = ["name", "flare_param", "disable_gpu", "force_gpu_enable", "force_gpu_disable",
+                       "gpu_disable_reason", "rgba_mode", "rgba_ok_for_inputs", "transform_with_warp",
+                       "alpha_z_source_input", "need_other_frames_p", "use_prev_dest_p", "mask_color_p",
+                       "transition_p", "use_reduce_p", "effect_popup_name", "old_default_effect",
+                       "old_default_version_limit"]
+
+
+def test_catalogues_hold_named_categorised_effects():
+    regular, builder = effects.catalogue(), effects.catalogue(builder=True)
+    assert len(regular) >= 8 and len(builder) >= 2
+    for info in regular + builder:
+        assert info.plugin_name.startswith(_renderlib.PLUGIN_NAME_PREFIX) and info._category
+        assert info.use_prev_dest_p in (0, 1) and info.dynamic_genotype_p in (0, 1)
+    assert any(info.use_prev_dest_p for info in regular)
+    assert all(info.dynamic_genotype_p for info in builder)
+    assert len({info.plugin_name for info in regular + builder}) == len(regular) + len(builder)
+
+
+def test_every_effect_is_created_read_completely_and_freed(probe):
+    before = probe.live_instances(), probe.live_params()
+    for name, builder in all_entries():
+        effect = _renderlib.init_tarsel_effect(name, builder)
+        assert effect.plugin_name == name and effect.this.own()
+        genotypes = effect._get_genotypes()
+        assert len(genotypes) == effect.n_effects >= 1 and genotypes[0] == effect.effect_genotype
+        for genotype in genotypes:
+            for attribute in GENOTYPE_ATTRIBUTES:
+                getattr(genotype, attribute)
+            assert len(genotype._get_input_names()) == len(genotype._get_canonical_input_names())
+            list(genotype.input_optional_p), list(genotype.input_default_to)
+            genotype._uses_host_data(), genotype._has_flare_param(), genotype._has_glare_param()
+            definition = genotype.effect_info
+            assert definition.name and len(definition.input_names) == len(definition.input_optional_p)
+            definition.arg_names, definition.get_arg_hardcoded_values()
+            for param in genotype._get_params():
+                for attribute in PARAM_ATTRIBUTES:
+                    getattr(param, attribute)
+                for attribute in FLAG_ATTRIBUTES:
+                    getattr(param.flags, attribute)
+                list(param.default_value), list(param.old_default_value)
+                assert isinstance(genotype.get_param_group_name(param), str)
+                param.get_titles(), param.get_limits(), param.get_state_names(), param.get_fromfile_popup_names()
+                param.is_point(), param.numeric_p(), param.format(), param.ptype_name()
+                assert param.get_canonical_name() == param.canonical_name
+                assert isinstance(param.to_string(None), str)
+        effect._get_shared_params()
+        _renderlib.free_tarsel_effect(effect)
+        assert not effect.this.own()
+    assert (probe.live_instances(), probe.live_params()) == before
+
+
+def test_every_parameter_type_is_in_the_catalogue(instance):
+    types = set()
+    colour_channels = set()
+    for name, builder in all_entries():
+        for param in all_params(instance(name, builder)):
+            types.add(param.ptype)
+            if param.ptype == _renderlib.ptype_color:
+                colour_channels.add(param.n_channels)
+    assert {_renderlib.ptype_float, _renderlib.ptype_int, _renderlib.ptype_color, _renderlib.ptype_popup,
+            _renderlib.ptype_boolean, _renderlib.ptype_pushbutton, _renderlib.ptype_string,
+            _renderlib.ptype_label, _renderlib.ptype_flare} <= types
+    assert {3, 4} <= colour_channels

@@ -1,0 +1,121 @@
+"""Param made from Python: construction, attributes, overloads, identity."""
+import ctypes
+import re
+
+import pytest
+
+import _renderlib
+import renderlib
+
+CONSTRUCTOR_PROTOTYPES = (
+    "Wrong number or type of arguments for overloaded function 'new_Param'.\n"
+    "  Possible C/C++ prototypes are:\n"
+    "    Param::Param(char const *,enum param_type,int,screen_mode)\n"
+    "    Param::Param(char const *,enum param_type,int)\n"
+    "    Param::Param(char const *,enum param_type)\n")
+
+
+def test_a_param_made_from_a_name_and_type_has_one_channel_and_the_normal_mode():
+    param = renderlib.Param("Radius", _renderlib.ptype_float)
+    assert (param.name, param.ptype, param.n_channels, param.flags.screen_mode) == ("Radius", 1, 1, 0)
+    assert repr(param) == 'Param("Radius" (1 ch) @0x%x)' % int(param.this)
+    assert param.this.own()
+
+
+def test_constructor_overloads_and_their_message():
+    point = renderlib.Param("Center", _renderlib.ptype_float, 2, _renderlib.screen_mode_screen_center)
+    assert (point.n_channels, point.flags.screen_mode) == (2, 2)
+    assert renderlib.Param("Wide", _renderlib.ptype_float, 300).n_channels == 300 & 0xFF
+    assert renderlib.Param("Masked", _renderlib.ptype_float, 1, 17).flags.screen_mode == 1
+    for bad in [(), ("x",), (5, 1), ("x", 1.0), ("x", 1, True, 0.5)]:
+        with pytest.raises(TypeError) as raised:
+            renderlib.Param(*bad)
+        assert str(raised.value) == CONSTRUCTOR_PROTOTYPES
+    with pytest.raises(TypeError) as raised:
+        renderlib.Param("x", 1, 1, 0, 0)
+    assert str(raised.value) == ("new_Param expected at most 4 arguments, got 5\nAdditional information:\n"
+                                 + CONSTRUCTOR_PROTOTYPES)
+
+
+def test_name_assignment():
+    param = renderlib.Param("Old", _renderlib.ptype_int)
+    param.name = "New \u00e9"
+    assert param.name == "New \u00e9"
+    param.name = None
+    assert param.name is None
+    assert repr(param) == 'Param("(null)" (1 ch) @0x%x)' % int(param.this)
+    with pytest.raises(TypeError, match=r"^in method 'Param_name_set', argument 2 of type 'char \*'$"):
+        param.name = 5
+    assert param.name is None
+
+
+def test_channel_count_and_type_assignment_are_range_checked():
+    param = renderlib.Param("Count", _renderlib.ptype_int)
+    param.n_channels = 255
+    assert param.n_channels == 255
+    with pytest.raises(OverflowError, match=r"^in method 'Param_n_channels_set', argument 2 of type 'unsigned char'$"):
+        param.n_channels = 256
+    with pytest.raises(TypeError, match=r"^in method 'Param_ptype_set', argument 2 of type 'enum param_type'$"):
+        param.ptype = "float"
+    param.ptype = _renderlib.ptype_boolean
+    assert param.ptype == _renderlib.ptype_boolean
+    for name in ("canonical_name", "n_channels_c1", "min_bound", "flags", "default_value", "param_group"):
+        with pytest.raises(AttributeError):
+            setattr(param, name, getattr(param, name))
+
+
+def test_identity_equality_and_hash():
+    a = renderlib.Param("Same", _renderlib.ptype_float)
+    b = renderlib.Param("Same", _renderlib.ptype_float)
+    assert a != b and not (a == b)  # equal contents, different objects
+    assert a == a and hash(a) == hash(a)
+    assert (a == 3) is False and (a != 3) is True
+    assert _renderlib.Param___eq__(a, 3) is NotImplemented
+    assert _renderlib.Param___eq__(a, None) is NotImplemented
+
+
+def test_overloaded_methods_and_strict_booleans():
+    param = renderlib.Param("Amount", _renderlib.ptype_float)
+    assert param.to_string(None) == param.to_string(None, False)
+    assert param.to_string_const(None) == param.to_string(None)
+    with pytest.raises(TypeError) as raised:
+        param.to_string(None, 1)
+    assert str(raised.value) == (
+        "Wrong number or type of arguments for overloaded function 'Param_to_string'.\n"
+        "  Possible C/C++ prototypes are:\n"
+        "    Param::to_string(RenderContext *,bool)\n"
+        "    Param::to_string(RenderContext *)\n")
+    with pytest.raises(TypeError, match=r"^Wrong number or type of arguments for overloaded function 'Param_to_json'"):
+        param.to_json(None, 0)
+    with pytest.raises(TypeError, match=r"^Wrong number or type of arguments for overloaded function "
+                                        r"'Param_maybe_set_to_old_default'.\n  Possible C/C\+\+ prototypes are:\n"
+                                        r"    Param::maybe_set_to_old_default\(RenderContext \*,float,unsigned int\)\n"
+                                        r"    Param::maybe_set_to_old_default\(RenderContext \*,float\)\n$"):
+        param.maybe_set_to_old_default(None)
+    with pytest.raises(TypeError, match=r"^in method 'Param_needs_old_default', argument 2 of type 'float'$"):
+        param.needs_old_default("1")
+    with pytest.raises(TypeError, match=r"^in method 'Param_numeric_p', argument 1 of type 'Param \*'$"):
+        _renderlib.Param_numeric_p(renderlib.Genotype())
+    with pytest.raises(TypeError, match=r"^in method 'Param_ptype_name', argument 1 of type 'Param const \*'$"):
+        _renderlib.Param_ptype_name(5)
+
+
+def test_engine_members_of_a_param_made_from_python():
+    param = renderlib.Param("Angle", _renderlib.ptype_float)
+    assert param.ptype_name() == "float"
+    assert param.numeric_p() is True
+    assert isinstance(param.format(), int)
+    json_node = param.to_json(None)
+    assert re.fullmatch(r"<Swig Object of type 'cJSON \*' at 0x[0-9a-f]+>", repr(json_node))
+    assert param.get_state_names() == []  # not a popup
+    assert param.is_point() is False
+    assert param.get_limits() == (None, None, param.slider_min, param.slider_max)  # "no limit" both ways
+
+
+@pytest.mark.parametrize("mode, point", [(0, False), (1, True), (2, True), (3, False), (4, True), (5, False),
+                                         (6, True), (7, True), (8, False), (9, False)])
+def test_point_parameters_are_two_channel_params_in_placing_screen_modes(mode, point):
+    param = renderlib.Param("P", _renderlib.ptype_float, 2, mode)
+    ctypes.memmove(int(param.this) + 41, bytes([2]), 1)  # the engine shows two channels
+    assert param.is_point() is point
+    assert len(param.get_titles()) == (1 if point else 2)

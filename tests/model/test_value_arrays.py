@@ -1,0 +1,74 @@
+"""ValueArray and ShortInputArray: fixed arrays overlaying engine records."""
+import ctypes
+import math
+
+import pytest
+
+import _renderlib
+import renderlib
+
+
+def test_new_arrays_have_their_fixed_length_and_read_zero():
+    assert len(renderlib.ValueArray()) == 4 and list(renderlib.ValueArray()) == [0.0] * 4
+    assert len(renderlib.ShortInputArray()) == 8 and list(renderlib.ShortInputArray()) == [0] * 8
+
+
+def test_value_array_elements():
+    values = renderlib.ValueArray()
+    values[3] = 1.5
+    values[0] = 2  # an int is taken as a float
+    values[1] = float("inf")
+    values[2] = float("nan")
+    assert values[3] == 1.5 and values[0] == 2.0 and values[1] == math.inf and math.isnan(values[2])
+    with pytest.raises(IndexError, match="^out of bounds access$"):
+        values[4]
+    with pytest.raises(IndexError, match="^out of bounds access$"):
+        values[4] = 0.0
+    with pytest.raises(OverflowError, match=r"^in method 'ValueArray___getitem__', argument 2 of type 'size_t'$"):
+        values[-1]
+    with pytest.raises(OverflowError, match=r"^in method 'ValueArray___setitem__', argument 3 of type 'float'$"):
+        values[0] = 1e39
+    assert values[0] == 2.0  # a refused store changes nothing
+
+
+def test_short_input_array_elements():
+    shorts = renderlib.ShortInputArray()
+    shorts[7] = 32767
+    shorts[0] = -32768
+    assert (shorts[7], shorts[0]) == (32767, -32768)
+    for value, error in ((32768, OverflowError), (-32769, OverflowError), (1.0, TypeError)):
+        with pytest.raises(error, match=r"^in method 'ShortInputArray___setitem__', argument 3 of type 'short'$"):
+            shorts[1] = value
+    with pytest.raises(IndexError, match="^out of bounds access$"):
+        shorts[8]
+
+
+def test_data_is_a_pointer_and_assigning_one_copies_the_elements():
+    source, target = renderlib.ValueArray(), renderlib.ValueArray()
+    for i in range(4):
+        source[i] = i + 0.5
+    assert int(source.data) == int(source.this)
+    target.data = source.data
+    assert list(target) == [0.5, 1.5, 2.5, 3.5]
+    with pytest.raises(ValueError, match=r"^invalid null reference in variable 'data' of type 'float \[MAX_CHANNELS\]'$"):
+        target.data = None
+    with pytest.raises(TypeError, match=r"^in method 'ValueArray_data_set', argument 2 of type 'float \[MAX_CHANNELS\]'$"):
+        target.data = [1.0, 2.0, 3.0, 4.0]
+    with pytest.raises(ValueError, match=r"^invalid null reference in variable 'data' of type 'short \[MAX_INPUTS\]'$"):
+        renderlib.ShortInputArray().data = None
+
+
+def test_a_raster_descriptors_background_is_accepted_as_value_data():
+    info = renderlib.T_RasterInfo()
+    ctypes.memmove(int(info.this) + 60, (ctypes.c_float * 4)(0.1, 0.2, 0.3, 0.4), 16)
+    values = renderlib.ValueArray()
+    values.data = info.background_pixel
+    assert list(values) == pytest.approx([0.1, 0.2, 0.3, 0.4])
+
+
+def test_messages_name_the_template():
+    with pytest.raises(TypeError, match=r"^in method 'ValueArray___len__', argument 1 of type "
+                                        r"'wrapped_array< float,MAX_CHANNELS > const \*'$"):
+        _renderlib.ValueArray___len__(renderlib.ShortInputArray())
+    with pytest.raises(TypeError, match=r"argument 1 of type 'wrapped_array< short,MAX_INPUTS > \*'$"):
+        _renderlib.ShortInputArray___setitem__(renderlib.ValueArray(), 0, 1)

@@ -117,7 +117,12 @@ struct T_RenderInfo {
 typedef void *RawImage;
 
 // Fills `info` for its current pixel_type and an image of xsize by ysize
-// pixels; returns the image's size in bytes, or 0 when the pixel type is not supported.
+// pixels: ds and world sizes, origin 0, bit_depth, raster_type, sizeof_pixel,
+// res_factor 1 and clamp_p (set for integer layouts); the other fields are
+// left as they are. Returns the image's size in bytes (ysize lines of xsize
+// pixels plus the extra_line_stride_elts elements of padding already set),
+// or 0 for a pixel type the engine does not support, a negative size or a
+// size that an int cannot hold.
 TARSEL_API int make_tarsel_raster_info(T_RasterInfo *info, int xsize, int ysize);
 
 static_assert(sizeof(T_RasterType) == 4 && sizeof(T_PixelType) == 4, "raster enumerations are 32-bit");

@@ -80,7 +80,8 @@
 //     string          the text itself
 //     flare           elements "kind size brightness position red green blue"
 //                     separated by "; " (kinds: glow, ring, disc, streak,
-//                     star, iris); "" for none
+//                     star, iris, and texture:<index> for a flare texture);
+//                     "" for none
 //     label, push button: ""
 //   to_string's text belongs to the Param until its next to_string or its
 //   destruction; callers never free it. set_value_from_string returns 1, or
@@ -164,4 +165,155 @@
 //   process-wide; instances prepare those their defaults draw.
 //   tarsel_free_all_stamp_collections empties that cache.
 //   tarsel_shutdown_apps: the engine runs no helper applications; it releases
-//   its process-wide caches (stamps, look-up tables) and stays usable.
+//   its process-wide caches (stamps, look-up tables, kept pixel buffers) and
+//   its worker threads, and stays usable: the next render makes them again.
+
+// Pixel buffers (T_RasterInfo)
+//   Layouts read and written: pixel_a8, rgb8, bgr8, rgba8, bgra8, argb8, a16,
+//   rgb16, rgba16, bgra16, argb16, af, rgbf, rgbaf, argbf, l8, l16, lf, la8,
+//   la16, laf, rgb16f, rgba16f and a16f (16f: IEEE half floats). Not
+//   supported: pixel_rgba16z, pixel_rgb10 and the unnamed values.
+//   Integers span 0..1 (v / 255, v / 65535), 16-bit values in native byte
+//   order. A buffer is ds_ysize lines of ds_xsize pixels of sizeof_pixel
+//   bytes (0: the layout's own size; any other value must be that size),
+//   each line followed by extra_line_stride_elts elements of the layout's
+//   channel size; flip_y_p stores the lines bottom-up. x_origin and y_origin
+//   place the buffer's top-left pixel in the frame, in the buffer's pixels;
+//   world_xsize and world_ysize give the frame in full-resolution pixels
+//   (0: the destination is the frame). res_factor 0 and 1 mean full
+//   resolution; a buffer with another factor must be at the render's
+//   downsample. clamp_p keeps float results within 0..1 (integer layouts
+//   always are). Channels a layout lacks read as 1 (alpha) or, for alpha-only
+//   layouts, as white (the alpha itself when premultiplied); luminance
+//   layouts store the Rec. 709 luma. An unsupported layout or sizes that do
+//   not add up fail the call with an Err_Error message saying which buffer.
+
+// Rendering (render_tarsel_effect_to_native_image; arguments in effect.h)
+//   The frame is measured in render pixels (full-resolution pixels divided
+//   by downsample), y downwards. Inputs are read where they overlap the
+//   destination; elsewhere, outside the destination included, they are
+//   transparent. An unconnected input follows its descriptor's
+//   input_default_to. Effects compute on premultiplied colour in the working
+//   space; inputs are decoded from the input space, the previous output
+//   (images[0], laid out as the destination) from the output space, and the
+//   result encoded into the output space. The call's mix is scaled by the
+//   instance's "Effect Mix" slot; for an effect without inputs it is the
+//   result's opacity. Effects that leave their input as it is (mix 0, a blur
+//   of radius 0, a dissolve at 0 or 1, an identity transform, an echo of the
+//   current frame only) copy its pixels exactly. Fields count frame lines
+//   (y_origin + line). Flag bit 0 clears the whole destination first, also
+//   the lines of the other field. Parameter values are read as they stand;
+//   counters the engine animates (auto_anim_floor0/1) add the frame number,
+//   ramps (auto_anim_ramp_up) are per second (frame / frame_rate); a
+//   parameter that needs an unconnected input reads as its default.
+//   Lengths named in pixels are full-resolution pixels, divided by downsample.
+//   What each effect draws:
+//     Gradient     start to end colour (premultiplied blend); Linear along the
+//                  angle (0 left to right, 90 top to bottom) with the first
+//                  and last pixel centres exactly at the two colours; Radial
+//                  and Diamond from the centre to the farthest corner;
+//                  Conical once around from the angle; spread stretches it;
+//                  an ordered dither below half an 8-bit step breaks bands.
+//     Blur         n box passes (iterations) approaching a Gaussian whose
+//                  standard deviation is half the radius; vertical scale
+//                  multiplies the vertical radius; edges Transparent, Repeat
+//                  (edge pixels repeated) or Mirror; whole-pixel boxes in
+//                  draft (the lower of the call's and the parameter's
+//                  quality); Blur Alpha off keeps the source's alpha.
+//     Blur Fast    one box pass on a copy reduced by a quarter of the radius,
+//                  scaled back up bilinearly.
+//     Glow         luma above the threshold, blurred (standard deviation half
+//                  the radius), tinted, times intensity and the mask's luma
+//                  (an unconnected mask: 1), added as light.
+//     Dissolve     per grain cell (grain size) a switch moment drawn from the
+//                  seed parameter (plus the frame) and the call's seed;
+//                  softness widens the switch into a fade.
+//     Echo         frames frame + k * frame_step (k < echoes) weighted by
+//                  decay^k, added, maximum, averaged or laid over; frames
+//                  other than the current one are not yet fetched.
+//     Trails       previous output times persistence plus the fade colour
+//                  times the rest, blended under (Over, Add, Lighten, Screen)
+//                  the current frame.
+//     Lens Flare   the flare's elements lit from the position (fractions of
+//                  the frame), scaled by scale, times brightness, added over
+//                  the background. The preset only names where a flare came
+//                  from: the flare parameter is what is drawn.
+//     Glare        the glare's elements drawn at up to 48 brightest points
+//                  (local maxima of 32-pixel cells above the threshold), in
+//                  their colour, sized by size, turned by rotation.
+//     Caption      the text ("{n}": the counter) in the built-in 5 x 8 bitmap
+//                  font (printable ASCII; others draw as '?'; '\n' breaks
+//                  lines); size is a line's glyph cell height; position is
+//                  the anchor from the frame's centre; align picks the lines'
+//                  left end, centre or right end; the block is centred on it
+//                  vertically. The host's face is not used.
+//     Transform    the pivot (fractions of the frame) plus the anchor moves
+//                  to position + offset + (target - 0.5) and origin times the
+//                  frame, scaled by scale times stretch, skewed, turned by
+//                  rotation plus spin per second; crop keeps the source
+//                  between its edges; Nearest, Bilinear or Bicubic
+//                  (Catmull-Rom; bilinear in draft); edges Transparent,
+//                  Repeat (tiled), Mirror, Clamp. The defaults leave a
+//                  1920 x 1080 frame as it is; other frames set position to
+//                  their centre and the crop to their size.
+//     Builder Mix  front over back by the blend mode at the opacity, then
+//                  levels (black, white, gamma) on straight colour.
+//     Builder Matte colours within half the tolerance of the key are keyed
+//                  out, beyond it kept; choke shrinks (grows, negative) the
+//                  matte by that many pixels, softness blurs it; remove spill
+//                  limits the key's main channel to the mean of the others.
+//   Failures (a dead instance, an unknown descriptor or colour space, a
+//   field other than 0..2, a negative downsample or frame rate, a bad pixel
+//   aspect, a bad buffer) return 0 with an Err_Error message; nothing is
+//   written then.
+
+// Lens flares (render_tarsel_lensflare_to_native_image; arguments in effect.h)
+//   Draws the descriptor's flare parameter (flare or glare; a descriptor
+//   without one fails) from the centre given in destination pixels, its
+//   elements' brightness times the call's, sizes times the descriptor's
+//   "scale" and turned by its "rotation" where it has them, added over the
+//   background (images[1]). Element geometry: a flare's elements lie on the
+//   axis from the light through the frame's centre; size is a radius in
+//   fractions of the frame's diagonal. The drawn kinds use the cached stamps
+//   (finer stamps for elements over 96 pixels in radius).
+
+// Flare textures (tarsel_load_flare_texture ... tarsel_free_all_flare_textures)
+//   A process-wide, thread-safe store; indices count from 0 in the order
+//   textures are added and start again after tarsel_free_all_flare_textures.
+//   PNG files (8 or 16 bits; grey, grey and alpha, RGB, RGBA; palettes and
+//   transparency chunks become RGB(A), low-depth grey 8 bits) keep their
+//   depth: bytes_per_channel 1 or 2, 16-bit channels in native byte order.
+//   Registered pixels are copied: 1 to 4 channels of 1, 2 or 4 (float)
+//   bytes, lines top to bottom without padding, at most 16384 pixels a side.
+//   tarsel_get_flare_texture_error reports the last texture call of the
+//   calling thread (null when it succeeded). A flare element
+//   "texture:<index>" draws the texture, its longer side across the
+//   element's diameter, as light: colour (grey for one or two channels)
+//   times alpha, tinted by the element's colour and brightness. A missing
+//   texture draws nothing and sends one Err_Warning per render.
+
+// Image utilities (image_utils.h, make_tarsel_raster_info)
+//   Resizes filter stored values (no colour conversion), premultiplied when
+//   the source has straight alpha; shrinking widens the filter by the
+//   reduction, so every source pixel counts; edges repeat. Box is an area
+//   average (a linear blend when enlarging); bicubic sharpness walks the
+//   cubics with B + 2C = 1 from the B-spline (0) to Catmull-Rom (1). A resize
+//   to the same size that moves nothing copies the pixels exactly. The result
+//   descriptor is filled as make_tarsel_raster_info fills one, top-down, with
+//   the source's is_premultiplied.
+//   tarsel_convert_to_bgra_8: each pixel's straight colour goes through the
+//   input table, is decoded from the source colour space, multiplied by the
+//   exposure, encoded for the display and looked up in the display table.
+//   The conversion does not depend on the instance argument.
+//   tarsel_comp_bgra_8: straight-alpha "over"; the lighter checker colour is
+//   half-way to white; cell (0, 0) has the background colour.
+
+// Worker threads and abort
+//   Renders, resizes, conversions and composites run on a process-wide pool
+//   with one thread per core (made on first use), the calling thread
+//   working too; renders from several threads share it. Results do not
+//   depend on the number of threads. Work polls the abort request at every
+//   line, so tarsel_abort_render ends even a 3840 x 2160 float render within
+//   a few milliseconds: the call throws TarselAbortException on its calling
+//   thread once every worker has stopped. Frame-sized working buffers are
+//   kept for reuse (up to 768 MB) until tarsel_shutdown_apps.

@@ -18,6 +18,8 @@ TARSEL_API int tarsel_probe_call_count(void);
  * valid until the next probe call. */
 TARSEL_API const char *tarsel_probe_call(int index);
 TARSEL_API void tarsel_probe_clear_calls(void);
+/* 0 pauses the call log (arguments are then not even formatted), 1 resumes it. */
+TARSEL_API void tarsel_probe_set_call_log(int on);
 
 /* Fault switch: while armed, the next engine entry call (of any thread)
  * throws TarselAbortException instead of doing its work, and disarms it.
@@ -46,6 +48,20 @@ TARSEL_API void tarsel_probe_set_version_text(const char *text);
 TARSEL_API int tarsel_probe_live_instances(void);
 TARSEL_API int tarsel_probe_live_params(void);
 TARSEL_API int tarsel_probe_stamp_count(void);
+
+/* Render timing and the binding's own cost. While immediate return is on
+ * (non-zero), both render entry points check that an instance, a descriptor
+ * list and at least one entry are given, return success (1 / true; failure
+ * without a message when those are missing) and touch nothing else, so a
+ * benchmark measures the binding alone. The call is still logged. */
+TARSEL_API void tarsel_probe_set_render_immediate_return(int on);
+/* The engine's own wall time of the last render call (either entry point),
+ * in seconds, measured inside the entry point whatever its outcome. */
+TARSEL_API double tarsel_probe_last_render_seconds(void);
+
+/* Threads of the engine's worker pool: one per core once a render has made
+ * it, 0 before that and after tarsel_shutdown_apps. */
+TARSEL_API int tarsel_probe_worker_threads(void);
 
 #ifdef __cplusplus
 }

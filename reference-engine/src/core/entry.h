@@ -29,6 +29,10 @@ inline std::string describe(float value) { return describe(static_cast<double>(v
 // throws TarselAbortException if the probe armed its fault switch.
 void record_entry(const char *name, std::string arguments, bool may_abort = true);
 
+// Whether the call log is kept (the probe can pause it, so that timing runs do
+// not pay for formatting arguments).
+bool call_log_enabled();
+
 // Depth of engine entry calls on the calling thread.
 int &entry_depth();
 
@@ -52,7 +56,7 @@ template <typename... Args>
 EntryScope enter(const char *name, const Args &...args) {
   if (entry_depth() == 0) {
     std::string arguments;
-    join_arguments(arguments, args...);
+    if (call_log_enabled()) join_arguments(arguments, args...);
     record_entry(name, std::move(arguments));
   }
   return EntryScope();
@@ -64,7 +68,7 @@ template <typename... Args>
 void note_entry(const char *name, const Args &...args) {
   if (entry_depth() != 0) return;
   std::string arguments;
-  join_arguments(arguments, args...);
+  if (call_log_enabled()) join_arguments(arguments, args...);
   record_entry(name, std::move(arguments), false);
 }
 

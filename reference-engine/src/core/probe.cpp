@@ -14,6 +14,8 @@
 #include "model/instance.h"
 #include "model/param_values.h"
 #include "model/stamps.h"
+#include "render/render_stats.h"
+#include "render/workers.h"
 #include "tarsel/errors.h"
 #include "tarsel_probe.h"
 
@@ -63,8 +65,12 @@ int &entry_depth() {
   return depth;
 }
 
+std::atomic<bool> log_enabled{true};
+
+bool call_log_enabled() { return log_enabled.load(std::memory_order_relaxed); }
+
 void record_entry(const char *name, std::string arguments, bool may_abort) {
-  {
+  if (call_log_enabled()) {
     CallLog &log = call_log();
     std::lock_guard<std::mutex> lock(log.mutex);
     if (log.entries.size() == TARSEL_PROBE_LOG_CAPACITY) log.entries.pop_front();
@@ -100,6 +106,8 @@ void tarsel_probe_clear_calls(void) {
   call_log().entries.clear();
 }
 
+void tarsel_probe_set_call_log(int on) { tarsel_ref::log_enabled.store(on != 0); }
+
 void tarsel_probe_set_abort_next_call(int armed) { tarsel_ref::abort_next_call.store(armed != 0); }
 
 int tarsel_probe_abort_armed(void) { return tarsel_ref::abort_next_call.load() ? 1 : 0; }
@@ -132,3 +140,9 @@ int tarsel_probe_live_instances(void) { return tarsel_ref::live_instance_count()
 int tarsel_probe_live_params(void) { return tarsel_ref::live_params(); }
 
 int tarsel_probe_stamp_count(void) { return tarsel_ref::stamp_count(); }
+
+void tarsel_probe_set_render_immediate_return(int on) { tarsel_ref::set_render_immediate_return(on != 0); }
+
+double tarsel_probe_last_render_seconds(void) { return tarsel_ref::last_render_seconds(); }
+
+int tarsel_probe_worker_threads(void) { return tarsel_ref::worker_thread_count(); }

@@ -8,6 +8,8 @@
 #include "model/instance.h"
 #include "model/luts.h"
 #include "model/stamps.h"
+#include "render/buffers.h"
+#include "render/workers.h"
 #include "tarsel/effect.h"
 #include "tarsel/errors.h"
 
@@ -76,9 +78,12 @@ void tarsel_free_all_stamp_collections() {
 }
 
 // The engine runs no helper applications; what it lets go of are its
-// process-wide caches. Everything is made again on demand afterwards.
+// process-wide caches (stamps, tables, kept pixel buffers) and its worker
+// threads. Everything is made again on demand afterwards.
 void tarsel_shutdown_apps() {
   auto scope = tarsel_ref::enter("tarsel_shutdown_apps");
   tarsel_ref::clear_stamps();
   tarsel_ref::clear_luts();
+  tarsel_ref::release_workers();
+  tarsel_ref::release_buffer_cache();
 }

@@ -11,7 +11,7 @@ namespace {
 
 bool known_kind(const std::string &kind) {
   const auto &kinds = flare_kinds();
-  return std::find(kinds.begin(), kinds.end(), kind) != kinds.end();
+  return std::find(kinds.begin(), kinds.end(), kind) != kinds.end() || texture_kind(kind);
 }
 
 // Sizes, brightnesses and colours are never negative; positions may be.
@@ -49,6 +49,17 @@ bool number_item(const cJSON *object, const char *key, float *value) {
 const std::vector<std::string> &flare_kinds() {
   static const std::vector<std::string> kinds = {"glow", "ring", "disc", "streak", "star", "iris"};
   return kinds;
+}
+
+bool texture_kind(const std::string &kind, int *index) {
+  static const std::string prefix = "texture:";
+  if (kind.compare(0, prefix.size(), prefix) != 0) return false;
+  const std::string digits = kind.substr(prefix.size());
+  const bool number = !digits.empty() && digits.size() <= 9 &&
+                      std::all_of(digits.begin(), digits.end(), [](char c) { return c >= '0' && c <= '9'; });
+  if (!number) return false;
+  if (index) *index = std::stoi(digits);
+  return true;
 }
 
 std::string format_flare(const std::vector<FlareElement> &elements) {

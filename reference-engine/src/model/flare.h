@@ -2,7 +2,9 @@
 //
 // Text form: the elements separated by "; ", each written as
 //   <kind> <size> <brightness> <position> <red> <green> <blue>
-// kind: glow, ring, disc, streak, star or iris; size: radius as a fraction of
+// kind: glow, ring, disc, streak, star or iris, or texture:<index> (the flare
+// texture of that index, scaled to the element and tinted by its colour,
+// see tarsel_load_flare_texture); size: radius as a fraction of
 // the image diagonal; brightness: multiplier (1 = as drawn); position: place
 // on the axis from the flare's source (0) through the image centre (1) and on
 // (negative values lie behind the source); red, green, blue: the element's
@@ -27,8 +29,11 @@ struct FlareElement {
 // Most elements one flare can hold.
 constexpr int kMaxFlareElements = 32;
 
-// The kinds an element can be, in the engine's order.
+// The drawn kinds an element can be, in the engine's order (textures aside).
 const std::vector<std::string> &flare_kinds();
+
+// Whether `kind` is "texture:<index>", and the index when it is.
+bool texture_kind(const std::string &kind, int *index = nullptr);
 
 std::string format_flare(const std::vector<FlareElement> &elements);
 

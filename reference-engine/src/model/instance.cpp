@@ -29,7 +29,8 @@ void prepare_stamps(const Descriptor &d, const DescriptorDefinition &source) {
     std::vector<FlareElement> elements;
     const char *text = store_of(*flare).text;
     if (parse_flare(text ? text : "", &elements))
-      for (const FlareElement &e : elements) kinds.push_back(e.kind);
+      for (const FlareElement &e : elements)
+        if (!texture_kind(e.kind)) kinds.push_back(e.kind);  // textures are drawn as they are
   }
   for (const std::string &kind : kinds) element_stamp(kind, kElementStampSize);
 }

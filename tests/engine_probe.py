@@ -30,6 +30,9 @@ class EngineProbe:
         lib.tarsel_probe_emit_from_worker.argtypes = [ctypes.c_int, ctypes.c_int, ctypes.c_char_p]
         lib.tarsel_probe_emit_here.argtypes = [ctypes.c_int, ctypes.c_char_p]
         lib.tarsel_probe_set_abort_next_call.argtypes = [ctypes.c_int]
+        lib.tarsel_probe_set_call_log.argtypes = [ctypes.c_int]
+        lib.tarsel_probe_set_render_immediate_return.argtypes = [ctypes.c_int]
+        lib.tarsel_probe_last_render_seconds.restype = ctypes.c_double
         lib.tarsel_probe_set_version_text.argtypes = [ctypes.c_char_p]
 
     def live_instances(self):
@@ -41,11 +44,21 @@ class EngineProbe:
     def stamp_count(self):
         return self.lib.tarsel_probe_stamp_count()
 
+    def render_returns_at_once(self, on=True):
+        """While on, the render entries return success at once, touching nothing."""
+        self.lib.tarsel_probe_set_render_immediate_return(int(on))
+
+    def last_render_seconds(self):
+        return self.lib.tarsel_probe_last_render_seconds()
+
     def calls(self):
         """The call log, oldest first, as text."""
         lib = self.lib
         return [lib.tarsel_probe_call(i).decode("utf-8", "surrogateescape")
                 for i in range(lib.tarsel_probe_call_count())]
+
+    def keep_call_log(self, on=True):
+        self.lib.tarsel_probe_set_call_log(int(on))
 
     def clear_calls(self):
         self.lib.tarsel_probe_clear_calls()
@@ -71,5 +84,7 @@ class EngineProbe:
     def reset(self):
         """Back to a quiet engine: no armed fault, no abort, no override."""
         self.abort_next_call(False)
+        self.render_returns_at_once(False)
+        self.keep_call_log(True)
         self.lib.tarsel_probe_set_version_text(None)
         self.clear_calls()

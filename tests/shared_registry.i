@@ -10,6 +10,8 @@
 // Stand-ins for engine render contexts: the identity rule compares and hashes
 // handles without reading through them.
 alignas(16) static char context_storage[2][16];
+
+typedef unsigned char uchar_t;
 %}
 
 struct T_RasterInfo;
@@ -21,6 +23,16 @@ class RenderContext;
 int raster_width(const T_RasterInfo *info) { return info ? info->ds_xsize : -1; }
 T_RasterInfo *same_raster(T_RasterInfo *info) { return info; }
 RenderContext *context_handle(int which) { return reinterpret_cast<RenderContext *>(context_storage[which & 1]); }
+
+// The address of byte `offset` of a writable buffer (a bytearray, say) as the
+// uchar_t pointer proxy that DEC and base64decode take.
+uchar_t *byte_address(PyObject *buffer, int offset) {
+  Py_buffer view;
+  if (PyObject_GetBuffer(buffer, &view, PyBUF_WRITABLE) != 0) { PyErr_Clear(); return 0; }
+  uchar_t *address = static_cast<uchar_t *>(view.buf) + offset;
+  PyBuffer_Release(&view);
+  return address;
+}
 
 // The address of any Python object as a void * pointer proxy.
 void *object_address(PyObject *object) { return object; }

@@ -2,10 +2,19 @@
 // typemaps serve everywhere else.
 //
 // Who frees what:
-// | typemap          | memory                         | freed by                         |
-// |------------------|--------------------------------|----------------------------------|
-// | EngineHeapText   | a text member of an engine     | the engine, with free(); the old |
-// |                  | record, on the C heap          | value here when it is replaced   |
+// | typemap                | memory                              | freed by                               |
+// |------------------------|-------------------------------------|----------------------------------------|
+// | EngineHeapText         | a text member of an engine record,  | the engine, with free(); the old value |
+// |                        | on the C heap                       | here when it is replaced               |
+// | RawImage               | none: the caller's buffer, by       | nobody; the view is released at once   |
+// |                        | address                             |                                        |
+// | RasterInfoList         | the array of descriptor pointers    | the wrapper, on every path             |
+// | RawImageList           | the address array and one view per  | the wrapper: views after the call,     |
+// |                        | buffer                              | on every path                          |
+// | (TYPEMAP, SIZE)        | none: the caller's buffer           | nobody; the view is released at once   |
+// | ByteCount32            | an output on the wrapper's stack    | nothing to free                        |
+// | CharValueResult        | none: points into a static table    | nothing to free                        |
+// | RasterImageBytes       | the UTF-8 copy of the str           | the wrapper, on every path             |
 
 // char *EngineHeapText
 // A text member that the engine releases with free(). Assignment frees the old
@@ -25,3 +34,139 @@
     $1 = copy;
   }
 }
+
+%{
+#include <vector>
+%}
+
+// RawImage pixels
+// Any object exporting the buffer protocol; its start address goes to the
+// engine. The view (PyBUF_ND: contiguous, writability not requested) is
+// released at once, so the exporter must keep its memory in place, unresized,
+// for the whole call; a read-only object is accepted even where the engine
+// writes.
+%typemap(in, noblock=1) RawImage {
+  {
+    Py_buffer view;
+    if (PyObject_GetBuffer($input, &view, PyBUF_ND) != 0) {
+      PyObject *type, *value, *traceback;
+      PyErr_Fetch(&type, &value, &traceback);
+      Py_XDECREF(value);
+      Py_XDECREF(traceback);
+      PyErr_SetString(type ? type : PyExc_TypeError, "in method '$symname', argument $argnum of type '(RawImage)'");
+      Py_XDECREF(type);
+      SWIG_fail;
+    }
+    $1 = view.buf;
+    PyBuffer_Release(&view);
+  }
+}
+%typemap(typecheck, precedence=SWIG_TYPECHECK_POINTER) RawImage "$1 = PyObject_CheckBuffer($input);"
+
+// T_RasterInfo **RasterInfoList
+// A list (or list subclass) of T_RasterInfo proxies and None, passed as an
+// array of record pointers (null for None); an empty list passes a null
+// array. Items are recognised by their class name "T_RasterInfo", not by
+// inheritance.
+%typemap(in) T_RasterInfo **RasterInfoList (std::vector<T_RasterInfo *> rasters) {
+  if (!PyList_Check($input)) {
+    PyErr_SetString(PyExc_TypeError, "in $symname, arg $argnum of type T_RasterInfo **: expected list.");
+    SWIG_fail;
+  }
+  rasters.resize((size_t)PyList_GET_SIZE($input));
+  for (size_t i = 0; i < rasters.size(); ++i) {
+    PyObject *item = PyList_GET_ITEM($input, (Py_ssize_t)i);
+    if (std::strcmp(Py_TYPE(item)->tp_name, "T_RasterInfo") == 0) {
+      void *pointer = 0;
+      int res = SWIG_ConvertPtr(item, &pointer, $*1_descriptor, 0);
+      if (!SWIG_IsOK(res))
+        SWIG_exception_fail(SWIG_ArgError(res), "in method '$symname', argument $argnum of type 'T_RasterInfo **': cannot convert to T_RasterInfo");
+      rasters[i] = static_cast<T_RasterInfo *>(pointer);
+    } else if (item == Py_None) {
+      rasters[i] = NULL;
+    } else {
+      PyErr_SetString(PyExc_TypeError, "in $symname, arg $argnum of type T_RasterInfo **, elts should be T_RasterInfo");
+      SWIG_fail;
+    }
+  }
+  $1 = rasters.empty() ? NULL : rasters.data();
+}
+
+// RawImage *RawImageList
+// A list of writable buffer exporters and None, passed as an array of start
+// addresses (null for None); an empty list passes a null array. Unlike a
+// single RawImage, each view (PyBUF_WRITABLE) is held until the engine call
+// has returned, so these buffers cannot be resized meanwhile.
+%typemap(in) RawImage *RawImageList (std::vector<void *> addresses, std::vector<Py_buffer> views) {
+  if (!PyList_Check($input)) {
+    PyErr_SetString(PyExc_TypeError, "in $symname, arg $argnum of type RawImage *: expected list.");
+    SWIG_fail;
+  }
+  const Py_ssize_t count = PyList_GET_SIZE($input);
+  addresses.assign((size_t)count, NULL);
+  views.reserve((size_t)count);
+  for (Py_ssize_t i = 0; i < count; ++i) {
+    PyObject *item = PyList_GET_ITEM($input, i);
+    if (PyObject_CheckBuffer(item)) {
+      Py_buffer view;
+      if (PyObject_GetBuffer(item, &view, PyBUF_WRITABLE) != 0) {
+        PyErr_Clear();
+        PyErr_SetString(PyExc_TypeError, "in $symname, arg $argnum, cannot get Py_buffer view; maybe has no size?");
+        SWIG_fail;
+      }
+      views.push_back(view);
+      addresses[(size_t)i] = view.buf;
+    } else if (item != Py_None) {
+      PyErr_SetString(PyExc_TypeError, "in $symname, arg $argnum, list must contain objects that support the buffer protocol");
+      SWIG_fail;
+    }
+  }
+  $1 = addresses.empty() ? NULL : reinterpret_cast<RawImage *>(addresses.data());
+}
+%typemap(freearg) RawImage *RawImageList {
+  for (size_t i = 0; i < views$argnum.size(); ++i)
+    PyBuffer_Release(&views$argnum[i]);
+  views$argnum.clear();
+}
+
+// (void *BufferAddress, size_t BufferSize)
+// Any object with a buffer, by address and length, as the read-only buffer
+// interface gives them (no writability check, no view kept). The engine
+// writes through the address.
+%typemap(in) (void *BufferAddress, size_t BufferSize) {
+  Py_buffer view;
+  if (PyObject_GetBuffer($input, &view, PyBUF_SIMPLE) != 0) {
+    PyErr_Clear();
+    SWIG_exception_fail(SWIG_TypeError, "in method '$symname', argument $argnum of type '(TYPEMAP, SIZE)'");
+  }
+  $1 = view.buf;
+  $2 = (size_t)view.len;
+  PyBuffer_Release(&view);
+}
+
+// size_t *ByteCount32
+// A size_t output appended to the result as a signed 32-bit int: its low 32
+// bits, so a count of 2**31 or more reads negative.
+%typemap(in, numinputs=0) size_t *ByteCount32 (size_t count = 0) "$1 = &count;"
+%typemap(argout) size_t *ByteCount32 {
+  $result = SWIG_Python_AppendOutput($result, SWIG_From_int((int)(uint32_t)*$1));
+}
+
+// uchar_t CharValueResult
+// A byte value returned as a uchar_t pointer proxy into a static table of the
+// 256 values (byte_value), so that no result ever needs freeing.
+%typemap(out) uchar_t CharValueResult "$result = SWIG_NewPointerObj(byte_value($1), $&1_descriptor, 0);"
+
+// char const *RasterImageBytes
+// The 104-byte image of a raster descriptor, by the text rule of every
+// char const * argument (a str, as UTF-8), keeping the encoded length: an
+// image shorter than 104 bytes is refused, not over-read.
+%typemap(in) char const *RasterImageBytes (char *buffer = 0, size_t size = 0, int alloc = 0) {
+  int res = SWIG_AsCharPtrAndSize($input, &buffer, &size, &alloc);
+  if (!SWIG_IsOK(res))
+    SWIG_exception_fail(SWIG_ArgError(res), "in method '$symname', argument $argnum of type 'char const *'");
+  if (!buffer || size < RASTER_INFO_IMAGE_SIZE + 1)
+    SWIG_exception_fail(SWIG_ValueError, "in method '$symname', argument $argnum: a raster descriptor image is 104 bytes");
+  $1 = buffer;
+}
+%typemap(freearg) char const *RasterImageBytes "if (alloc$argnum == SWIG_NEWOBJ) delete[] buffer$argnum;"

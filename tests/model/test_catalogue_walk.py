@@ -1,6 +1,5 @@
 """Both catalogues walked completely: every effect created, read and freed."""
 import _renderlib
-import renderlib
 from effect_helpers import all_entries, all_params
 from renderlib import effects
 

@@ -49,3 +49,27 @@ def recreate(instance, changes=None):
     """A new instance of the same effect with the same values, `changes`
     applied; None when the engine refuses a value's text."""
     return _renderlib.init_tarsel_effect_from_string(saved_text(instance, changes))
+
+
+def raster(pixel_type, width, height):
+    """A T_RasterInfo filled by the engine for `pixel_type` at width x height,
+    and a zeroed bytearray of the size it needs."""
+    import renderlib
+    info = renderlib.T_RasterInfo()
+    info.pixel_type = pixel_type
+    size = _renderlib.make_tarsel_raster_info(info, width, height)
+    if size <= 0:
+        raise ValueError("the engine cannot lay out pixel type %d at %dx%d" % (pixel_type, width, height))
+    return info, bytearray(size)
+
+
+def render(instance, dest, inputs=(), previous=None, frame=0, colorspace="linear"):
+    """Renders one frame of `instance` into `dest`, a (T_RasterInfo, buffer)
+    pair, from `inputs`, a sequence of such pairs or None for an unconnected
+    input, with `previous` the previous output's buffer (or None). Returns the
+    engine's answer; the engine's messages say why a render failed."""
+    rasters = [dest[0]] + [pair[0] if pair else None for pair in inputs]
+    images = [previous] + [pair[1] if pair else None for pair in inputs]
+    return _renderlib.render_tarsel_effect_to_native_image(
+        instance, "", dest[1], frame, 0, 1, 1, rasters, images, 1.0, len(rasters), 1.0, 0, 0, 0, 25, False,
+        colorspace, colorspace, "linear")

@@ -1,0 +1,97 @@
+"""Raster descriptors as 104-byte images and base64 text."""
+import base64
+import ctypes
+import struct
+
+import pytest
+from hypothesis import given, settings, strategies as st
+
+import _renderlib
+import renderlib
+
+WORDS = st.lists(st.integers(-2 ** 31, 2 ** 31 - 1), min_size=26, max_size=26)
+
+
+def record_from_words(words):
+    info = renderlib.T_RasterInfo()
+    _renderlib.make_tarsel_raster_info_from_base64(info, base64.b64encode(struct.pack("<26i", *words)).decode())
+    return info
+
+
+def test_a_new_record_is_104_zero_bytes():
+    image = _renderlib.raster_info_to_bytearray(renderlib.T_RasterInfo())
+    assert type(image) is bytearray and image == bytearray(104)
+
+
+def test_the_image_is_the_records_memory_in_field_order():
+    info = renderlib.T_RasterInfo()
+    info.ds_xsize, info.ds_ysize = 1920, -1
+    image = _renderlib.raster_info_to_bytearray(info)
+    assert image[0:4] == b"\x80\x07\x00\x00" and image[4:8] == b"\xff\xff\xff\xff"
+
+
+@settings(max_examples=300, deadline=None)
+@given(WORDS, st.booleans())
+def test_base64_text_from_a_standard_encoder_restores_every_byte(words, padded):
+    raw = struct.pack("<26i", *words)
+    text = base64.b64encode(raw).decode()
+    assert text.endswith("=")
+    info = renderlib.T_RasterInfo()
+    _renderlib.make_tarsel_raster_info_from_base64(info, text if padded else text.rstrip("="))
+    assert bytes(_renderlib.raster_info_to_bytearray(info)) == raw  # the unnamed words too
+    assert info.ds_xsize == words[0] and info.extra_line_stride_elts == words[14]
+
+
+def test_text_stopping_at_an_equals_sign_decodes_only_what_precedes_it():
+    raw = bytes(range(1, 105))
+    text = base64.b64encode(raw).decode()
+    info = record_from_words([7] * 26)
+    _renderlib.make_tarsel_raster_info_from_base64(info, text[:40] + "=" + text[41:])
+    image = bytes(_renderlib.raster_info_to_bytearray(info))
+    assert image[:30] == raw[:30] and image[30:] == bytes(74)
+
+
+def test_a_short_text_leaves_the_tail_zero():
+    raw = bytes(range(100, 204))
+    info = record_from_words([-1] * 26)
+    _renderlib.make_tarsel_raster_info_from_base64(info, base64.b64encode(raw).decode()[:120])
+    image = bytes(_renderlib.raster_info_to_bytearray(info))
+    assert image[:90] == raw[:90] and image[90:] == bytes(14)
+
+
+def test_from_bits_copies_the_first_104_bytes_of_the_texts_encoding():
+    info = renderlib.T_RasterInfo()
+    _renderlib.make_tarsel_raster_info_from_bits(info, "A" * 104 + "ignored")
+    assert bytes(_renderlib.raster_info_to_bytearray(info)) == b"A" * 104
+    with pytest.raises(ValueError, match="a raster descriptor image is 104 bytes"):
+        _renderlib.make_tarsel_raster_info_from_bits(info, "A" * 103)
+    with pytest.raises(TypeError, match=r"^in method 'make_tarsel_raster_info_from_bits', argument 2 of type 'char const \*'$"):
+        _renderlib.make_tarsel_raster_info_from_bits(info, b"A" * 104)
+    with pytest.raises(TypeError, match=r"^in method 'make_tarsel_raster_info_from_base64', argument 2 of type 'char const \*'$"):
+        _renderlib.make_tarsel_raster_info_from_base64(info, 5)
+    assert bytes(_renderlib.raster_info_to_bytearray(info)) == b"A" * 104  # refused calls change nothing
+
+
+def byte_at(proxy):
+    return ctypes.string_at(int(proxy), 1)[0]
+
+
+def test_character_values(shared_registry):
+    alphabet = b"AZaz09+/=-\x80"
+    text = bytearray(alphabet)
+    values = [byte_at(_renderlib.DEC(shared_registry.byte_address(text, i))) for i in range(len(text))]
+    assert values == [0, 25, 26, 51, 52, 61, 62, 63, 61, 45, 0x80]
+    with pytest.raises(ValueError, match=r"^invalid null reference in method 'DEC', argument 1 of type 'uchar_t'$"):
+        _renderlib.DEC(None)
+
+
+def test_the_decoder_writes_into_the_callers_bytes(shared_registry):
+    raw = bytes(range(200, 245))
+    dest = bytearray(b"\xee" * 60)
+    _renderlib.base64decode(base64.b64encode(raw).decode(), shared_registry.byte_address(dest, 0), 60)
+    assert bytes(dest[:45]) == raw and bytes(dest[45:]) == bytes(15)  # the whole length is cleared first
+    untouched = bytearray(b"\xee" * 4)
+    _renderlib.base64decode("QUJD", shared_registry.byte_address(untouched, 0), 0)
+    assert untouched == bytearray(b"\xee" * 4)  # a length of 0 touches nothing
+    with pytest.raises(TypeError, match=r"^in method 'base64decode', argument 2 of type 'uchar_t \*'$"):
+        _renderlib.base64decode("QUJD", dest, 4)

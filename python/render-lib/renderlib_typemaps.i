@@ -61,7 +61,6 @@
     PyBuffer_Release(&view);
   }
 }
-%typemap(typecheck, precedence=SWIG_TYPECHECK_POINTER) RawImage "$1 = PyObject_CheckBuffer($input);"
 
 // T_RasterInfo **RasterInfoList
 // A list (or list subclass) of T_RasterInfo proxies and None, passed as an

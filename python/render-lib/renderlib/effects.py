@@ -8,6 +8,7 @@ Python goes through it: ``recreate(instance, {"radius": "12"})``."""
 import json
 
 import _renderlib
+import renderlib
 
 
 def catalogue(builder=False):
@@ -54,7 +55,6 @@ def recreate(instance, changes=None):
 def raster(pixel_type, width, height):
     """A T_RasterInfo filled by the engine for `pixel_type` at width x height,
     and a zeroed bytearray of the size it needs."""
-    import renderlib
     info = renderlib.T_RasterInfo()
     info.pixel_type = pixel_type
     size = _renderlib.make_tarsel_raster_info(info, width, height)

@@ -1,7 +1,6 @@
 """Effect instances: creation, saved text, queries, freeing, threads, leaks."""
 import gc
 import json
-import os
 import sys
 import threading
 
@@ -10,6 +9,7 @@ import pytest
 import _renderlib
 import renderlib
 from effect_helpers import all_entries
+from process_memory import UNDER_ADDRESS_SANITIZER, resident_kib
 from renderlib import effects
 
 
@@ -166,14 +166,6 @@ def test_creation_and_freeing_from_four_threads(probe):
     assert errors == [] and probe.live_instances() == live
 
 
-UNDER_ADDRESS_SANITIZER = "libasan" in os.environ.get("LD_PRELOAD", "")
-
-
-def resident_kib():
-    with open("/proc/self/status") as status:
-        return next(int(line.split()[1]) for line in status if line.startswith("VmRSS:"))
-
-
 def test_ten_thousand_create_free_cycles_keep_memory_and_references_flat(probe):
     def cycle(count):
         for _ in range(count):
@@ -196,5 +188,5 @@ def test_ten_thousand_create_free_cycles_keep_memory_and_references_flat(probe):
     growth = [sys.getrefcount(item) - before for item, before in zip(watched, references)]
     assert max(growth) < 20, growth
     assert len(gc.get_objects()) <= objects + 50
-    if not UNDER_ADDRESS_SANITIZER:  # its quarantine keeps freed memory resident by design
+    if not UNDER_ADDRESS_SANITIZER:
         assert resident_kib() - rss < 2048, "resident memory grew by %d KiB" % (resident_kib() - rss)

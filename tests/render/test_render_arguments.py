@@ -7,6 +7,7 @@ import pytest
 
 import _renderlib
 import renderlib
+from process_memory import UNDER_ADDRESS_SANITIZER, resident_kib
 
 EFFECT = "render_tarsel_effect_to_native_image"
 FLARE = "render_tarsel_lensflare_to_native_image"
@@ -123,10 +124,13 @@ def test_no_argument_gains_or_loses_references_over_ten_thousand_calls(quick):
     watched = [dest, image, raster, rasters, images, quick] + [
         a for args in failing for a in args if not isinstance(a, (int, float, str, bytes))]
     before = [sys.getrefcount(item) for item in watched]
+    rss = resident_kib()
     for _ in range(10_000 // (len(failing) + 1)):
         _renderlib.render_tarsel_effect_to_native_image(*good)
         for args in failing:
             with pytest.raises(TypeError):
                 _renderlib.render_tarsel_effect_to_native_image(*args)
     assert [sys.getrefcount(item) for item in watched] == before
+    if not UNDER_ADDRESS_SANITIZER:
+        assert resident_kib() - rss < 1024, "resident memory grew by %d KiB" % (resident_kib() - rss)
     image.extend(b"x")  # no view of the input is left behind: it can be resized again

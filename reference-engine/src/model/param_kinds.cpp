@@ -94,6 +94,15 @@ int PushButtonParam::set_values(RenderContext *ctx, int first_channel, int n, fl
 
 Param *PushButtonParam::clone_impl() { return copy_of<PushButtonParam>(*this); }
 
+// Puts a text-valued parameter (string, flare) back to its default text;
+// true when the value changed.
+static bool restore_default_text(Param &param, const std::string &default_text) {
+  ParamStore &store = store_of(param);
+  const std::string current = store.text ? store.text : "";
+  replace_text(store.text, default_text.empty() ? nullptr : default_text.c_str());
+  return current != default_text;
+}
+
 StringParam::StringParam(std::string text) : default_text(std::move(text)) {
   ptype = ptype_string;
 }
@@ -101,10 +110,7 @@ StringParam::StringParam(std::string text) : default_text(std::move(text)) {
 bool StringParam::set_to_default(RenderContext *ctx, unsigned int flags) {
   auto scope = enter("Param::set_to_default", static_cast<const void *>(this), static_cast<const void *>(ctx), flags);
   if (ptype != ptype_string) return Param::set_to_default(ctx, flags);
-  ParamStore &store = store_of(*this);
-  const std::string current = store.text ? store.text : "";
-  replace_text(store.text, default_text.empty() ? nullptr : default_text.c_str());
-  return current != default_text;
+  return restore_default_text(*this, default_text);
 }
 
 Param *StringParam::clone_impl() { return copy_of<StringParam>(*this, default_text); }
@@ -121,10 +127,7 @@ FlareParam::FlareParam(std::string text) : default_text(std::move(text)) {
 bool FlareParam::set_to_default(RenderContext *ctx, unsigned int flags) {
   auto scope = enter("Param::set_to_default", static_cast<const void *>(this), static_cast<const void *>(ctx), flags);
   if (ptype != ptype_flare) return Param::set_to_default(ctx, flags);
-  ParamStore &store = store_of(*this);
-  const std::string current = store.text ? store.text : "";
-  replace_text(store.text, default_text.empty() ? nullptr : default_text.c_str());
-  return current != default_text;
+  return restore_default_text(*this, default_text);
 }
 
 Param *FlareParam::clone_impl() { return copy_of<FlareParam>(*this, default_text); }

@@ -36,7 +36,8 @@ struct T_RenderState {
 
 // Frame request of the engine: the per-render state (a T_RenderState), the
 // input, the frame wanted, a request flag and two engine values; fills
-// *out_info and returns the first byte of the frame's pixels.
+// *out_info and returns the first byte of the frame's pixels, or null when
+// there is no such frame.
 typedef void *(*T_LoadOtherFrameFun)(void *render_state, int input, int frame, unsigned char flag,
                                      void *engine_data1, void *engine_data2, T_RasterInfo *out_info);
 

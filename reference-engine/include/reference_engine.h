@@ -42,12 +42,14 @@
 //   | T_Transform  | Distort        | Source                | label (documents a group), two-channel floats in |
 //   |              |                |                       | screen modes 0-9, float x3 (one animated),       |
 //   |              |                |                       | popup x2, boolean; group "Sampling"              |
+//   | T_TimeBlur   | Time           | Source, Matte*        | int x2, float                                    |
 //   Effect-builder catalogue (descriptors assembled per instance)
 //   | T_BuilderMix   | Builder      | Front, Back*          | popup, float x4; groups "Blend", "Levels"        |
 //   | T_BuilderMatte | Builder      | Source, Matte*        | colour (3 ch), float x3, boolean; groups "Key",  |
 //   |                |              |                       | "Edge", "Spill"                                  |
-//   T_Trails reads its previous output (use_prev_dest_p); T_Echo reads other
-//   frames; T_Dissolve is a transition; T_Caption takes data from the host.
+//   T_Trails reads its previous output (use_prev_dest_p); T_Echo and
+//   T_TimeBlur read other frames (need_other_frames_p); T_Dissolve is a
+//   transition; T_Caption takes data from the host.
 
 // Descriptors (Genotype)
 //   input_default_to: 0 transparent black, 1 every channel at the input's
@@ -200,12 +202,13 @@
 //   instance's "Effect Mix" slot; for an effect without inputs it is the
 //   result's opacity. Effects that leave their input as it is (mix 0, a blur
 //   of radius 0, a dissolve at 0 or 1, an identity transform, an echo of the
-//   current frame only) copy its pixels exactly. Fields count frame lines
-//   (y_origin + line). Flag bit 0 clears the whole destination first, also
-//   the lines of the other field. Parameter values are read as they stand;
-//   counters the engine animates (auto_anim_floor0/1) add the frame number,
-//   ramps (auto_anim_ramp_up) are per second (frame / frame_rate); a
-//   parameter that needs an unconnected input reads as its default.
+//   current frame only, a time blur with no other frame at hand) copy its
+//   pixels exactly. Fields count frame lines (y_origin + line). Flag bit 0
+//   clears the whole destination first, also the lines of the other field.
+//   Parameter values are read as they stand; counters the engine animates
+//   (auto_anim_floor0/1) add the frame number, ramps (auto_anim_ramp_up) are
+//   per second (frame / frame_rate); a parameter that needs an unconnected
+//   input reads as its default.
 //   Lengths named in pixels are full-resolution pixels, divided by downsample.
 //   What each effect draws:
 //     Gradient     start to end colour (premultiplied blend); Linear along the
@@ -228,12 +231,43 @@
 //     Dissolve     per grain cell (grain size) a switch moment drawn from the
 //                  seed parameter (plus the frame) and the call's seed;
 //                  softness widens the switch into a fade.
-//     Echo         frames frame + k * frame_step (k < echoes) weighted by
-//                  decay^k, added, maximum, averaged or laid over; frames
-//                  other than the current one are not yet fetched.
+//     Echo         frames frame + k * frame_step (k < echoes, the step
+//                  rounded to whole frames) weighted by decay^k, added,
+//                  maximum, averaged (over the weights present) or laid over,
+//                  the oldest lowest. The current frame comes from the call,
+//                  the others through frame requests (flag 0, in the order
+//                  they are laid together: newest first, oldest first for
+//                  Over; neighbouring echoes of one frame ask for it once); a
+//                  frame the host does not have is left out. Without a
+//                  callback only the current frame is at hand.
 //     Trails       previous output times persistence plus the fade colour
 //                  times the rest, blended under (Over, Add, Lighten, Screen)
-//                  the current frame.
+//                  the current frame. Given no previous output (images[0]
+//                  null) while a frame-request callback is installed, the
+//                  render rebuilds it: it requests frames frame - K to
+//                  frame - 1 of Source, oldest first, with flag 1, K being
+//                  the fewest frames after which persistence^K is below
+//                  1/1024 (at most 16; none for persistence 0), and renders
+//                  them in turn, the oldest with no previous output, each
+//                  written in the destination's layout and read back as a
+//                  previous output is. The result is that of the same frame
+//                  in a sequence of renders (same arguments, whole frames)
+//                  begun at frame - K. A frame the host does not have ends
+//                  the history there: the sequence begins at the frame after
+//                  it. Without a callback a render given no previous output
+//                  starts afresh: the trail is the fade colour alone.
+//     Time Blur    the source blended towards the average of its frames
+//                  frame - frames_before to frame + frames_after
+//                  (premultiplied; frames the host does not have left out)
+//                  by amount times the Matte's luma (Rec. 709, each frame's
+//                  within 0..1) averaged over the same frames: the Matte
+//                  moves with the clip. Frames come through frame requests
+//                  (flag 0), oldest first, each frame of Source followed by
+//                  that frame of Matte when it is connected (unconnected: 1
+//                  everywhere, nothing requested); a frame of Matte the host
+//                  does not have is left out of its average. Without a
+//                  callback only the current frame is at hand and the source
+//                  is copied as it is.
 //     Lens Flare   the flare's elements lit from the position (fractions of
 //                  the frame), scaled by scale, times brightness, added over
 //                  the background. The preset only names where a flare came
@@ -264,8 +298,57 @@
 //                  limits the key's main channel to the mean of the others.
 //   Failures (a dead instance, an unknown descriptor or colour space, a
 //   field other than 0..2, a negative downsample or frame rate, a bad pixel
-//   aspect, a bad buffer) return 0 with an Err_Error message; nothing is
-//   written then.
+//   aspect, a bad buffer, a frame request answered with a bad descriptor)
+//   return 0 with an Err_Error message; nothing is written then.
+
+// Frame requests (set_load_other_frame_into_buffer_fun)
+//   The callback is process-wide: installing one replaces the one before,
+//   null removes it. A render takes the callback installed when it starts.
+//   Without one only the current frame is at hand (the call's images) and
+//   effects render with that alone. Requests are made for effects that read
+//   other frames (Echo, Time Blur) or rebuild their previous output (Trails),
+//   and only for connected inputs: every frame of an unconnected input is its
+//   fallback. The current frame is never requested.
+//   fun(render_state, input, frame, flag, engine_data1, engine_data2, out_info):
+//     render_state  a T_RenderState of the render: input_info[i] is the
+//                   call's descriptor of input i (rasters[i + 1]), zeroed for
+//                   an unconnected input; the engine bytes are 0. One per
+//                   render, valid until the render returns.
+//     input         the input, counted from 0 (rasters[input + 1]).
+//     frame         the frame wanted.
+//     flag          0: another frame of the input, for the effect to read;
+//                   1: a frame of the input the effect's previous output is
+//                   rebuilt from.
+//     engine_data1  the instance being rendered (EffectGlobals_t *).
+//     engine_data2  the descriptor being rendered (Genotype *).
+//     out_info      filled by the host: the descriptor of the pixels it
+//                   returns.
+//   The result is the first byte of the frame's pixels, read like an input:
+//   from the call's input colour space, premultiplied as the call says,
+//   placed by its origin where it overlaps the destination (transparent
+//   elsewhere), at the render's resolution (res_factor 0, 1 or the
+//   downsample). Null means the host has no such frame: each effect leaves
+//   it out as "What each effect draws" says.
+//   Threads: requests are made from a thread the render starts for them
+//   (one per render, for all its requests, ended when the render returns),
+//   never from the thread that called the render (it waits meanwhile),
+//   whatever n_threads says. Within one render they are made one at a time,
+//   and each returned frame is read into the render's working form before
+//   the next request is made, so the host's buffer needs to stay valid only
+//   until then (the render's next request or its return). Renders running
+//   at the same time make their requests independently, each from its own
+//   thread, so the callback may be entered from several threads at once.
+//   A standing abort request (tarsel_abort_render) is honoured before each
+//   request.
+//   Failure: a callback that throws, whatever it throws (TarselAbortException
+//   included), ends the render as an abort: no further request is made, and
+//   the render call throws TarselAbortException on its calling thread once
+//   its workers have stopped. The abort request is not set, so the next
+//   render runs. A descriptor in out_info that does not describe readable
+//   pixels (an unsupported layout, another resolution factor, sizes that do
+//   not add up) fails the render: it returns 0 with an Err_Error message
+//   naming the input and the frame ("... the host's answer for frame 11 of
+//   input 0 ("Source"): pixel type 99 is not supported").
 
 // Lens flares (render_tarsel_lensflare_to_native_image; arguments in effect.h)
 //   Draws the descriptor's flare parameter (flare or glare; a descriptor
@@ -307,6 +390,85 @@
 //   The conversion does not depend on the instance argument.
 //   tarsel_comp_bgra_8: straight-alpha "over"; the lighter checker colour is
 //   half-way to white; cell (0, 0) has the background colour.
+
+// Widgets (tarsel_set_gfx_impl, tarsel_widget_draw, tarsel_widget_mouse_event)
+//   tarsel_set_gfx_impl keeps one plain pointer for the process (null removes
+//   it); the host keeps the object alive while it is installed. Both widget
+//   calls run on the calling thread, inside the call, and take: the instance
+//   (not a live one: an Err_Error); the canonical name of the one parameter
+//   whose widget is meant (null or "": every widget of the descriptor in use;
+//   an unknown name: an Err_Warning, nothing drawn or hit); the viewer's size
+//   in screen pixels; the frame position (full-resolution pixels) shown at
+//   the viewer's top-left corner (finite); screen pixels per frame pixel
+//   (positive and finite); and [frame width, frame height, frame number]
+//   (missing entries: the view size over the scale, frame 0; the sizes
+//   positive and finite, the frame rounded to a whole frame). Arguments
+//   outside these: an Err_Error and nothing done. A frame point (fx, fy) is
+//   shown at ((fx - view_x) * scale_x, (fy - view_y) * scale_y), y downwards.
+//   Values are read at the frame: counters (auto_anim_floor0/1) add the frame
+//   number; ramps are taken as they stand (the calls have no frame rate).
+//   Widgets, in parameter table order, for parameters not hidden (geometry
+//   in screen pixels):
+//     point   a float or int parameter shown as one two-channel point (screen
+//             modes screen, screen_center, normalize, screen_to_norm,
+//             screen_center_to_norm), placed in the frame by its mode: frame
+//             pixels; pixels from the frame's centre; fractions of the
+//             frame; fractions of the frame; fractions from the centre.
+//             color_3f(1, 1, 0), line_width, line(x - 14, y, x + 14, y),
+//             line(x, y - 14, x, y + 14), circle(x, y, 10),
+//             get_text_length_in_pixels(name) = w,
+//             draw_text(name, x - w / 2, y + 24).
+//     colour  a swatch in slot k, k counting the descriptor's colour
+//             parameters that are not hidden (whichever widgets a call asks
+//             for): the rectangle (10, 10 + 24k) to (34, 26 + 24k).
+//             color_3f(its red, green, blue clamped to 0..1), line_width,
+//             rect_filled, color_3f(1, 1, 1), the stippled outline (top-left,
+//             top-right, bottom-right, bottom-left, top-left),
+//             draw_text(name, 40, 24 + 24k).
+//     flare   a flare or glare parameter: its elements on the axis from the
+//             light (the descriptor's first point parameter, else the frame's
+//             centre) through the frame's centre. color_3f(0.5, 0.75, 1),
+//             line_width(1), the stippled axis (two points: axis positions
+//             min(0, element positions) and max(1, element positions)),
+//             dot(light, 6), then per element circle(light + position *
+//             (centre - light), size * factor * frame diagonal * scale_x),
+//             factor the descriptor's "scale" ("size" for a glare), 1 without.
+//   name is the display name (the canonical name when it has none). A
+//   stippled line is stipple_pattern(0x0F0F), stipple_on, begin_line, lines,
+//   end_line, stipple_off. line_width is 2 for the widget a drag holds, else 1.
+//   A draw is one pass: set_graphics_context(instance),
+//   start_drawing(number of widgets), the widgets, flush, end_drawing (a pass
+//   without widgets too). With no drawing implementation installed: an
+//   Err_Error and nothing drawn. T_Gradient (two swatches, a point) uses
+//   every operation but dot; T_LensFlare (a point, a flare) every one but
+//   rect_filled.
+//   Widgets per effect: T_Gradient start_color, end_color, center; T_Glow
+//   tint; T_Trails fade colour; T_LensFlare position, flare; T_Glare glare;
+//   T_Caption color, position; T_Transform position, anchor, pivot, target,
+//   origin; T_BuilderMatte key colour; the others none.
+//   Mouse events (position in viewer pixels) hit the topmost (last drawn)
+//   widget under the mouse: a point within 10 pixels of its centre, a swatch
+//   inside its rectangle, edges included; flares are never hit. PRESS on a
+//   widget takes it, keeping the press position and the parameter's value
+//   with the instance, and gives 1; elsewhere it lets go of any held widget
+//   and gives 0. DRAG moves the held widget and gives 1. With (dx, dy) the
+//   mouse's travel since the press in screen pixels, a point becomes its
+//   value at the press plus (dx / scale_x, dy / scale_y) frame pixels,
+//   divided by the frame's width and height where the point is in fractions;
+//   a swatch's red, green and blue become those at the press times
+//   2^(dx / 100), alpha unchanged. The value is stored as set_values stores
+//   it (bounds apply); one beyond the float range is not stored. RELEASE
+//   moves the held widget to its position the same way, lets go and gives 2.
+//   MOVE gives 1 over a widget or while one is held; DRAG and RELEASE with
+//   nothing held give 1 over a widget; otherwise 0. The list names each
+//   parameter whose value the event changed (canonical name, four channels,
+//   those it lacks 0); empty when none did. The held widget lives in the
+//   instance and ends with it; a change of the descriptor in use lets go.
+//   Failures of the host: the first exception out of any drawing operation
+//   ends the draw (the host is called no further) and the call throws
+//   TarselAbortException; the abort request stays as it was. A pending abort
+//   request makes both calls throw TarselAbortException before they do
+//   anything.
 
 // Worker threads and abort
 //   Renders, resizes, conversions and composites run on a process-wide pool

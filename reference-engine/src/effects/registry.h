@@ -18,6 +18,7 @@ const PluginDefinition &lens_flare_plugin();
 const PluginDefinition &glare_plugin();
 const PluginDefinition &caption_plugin();
 const PluginDefinition &transform_plugin();
+const PluginDefinition &time_blur_plugin();
 const PluginDefinition &builder_mix_plugin();
 const PluginDefinition &builder_matte_plugin();
 

@@ -13,11 +13,20 @@
 
 namespace tarsel_ref {
 
+// The widget a mouse drag holds, kept with the instance so that it ends with it.
+struct WidgetHold {
+  int param_index = -1;                // into the held descriptor's parameter table; -1: none held
+  const Genotype *descriptor = nullptr;  // the descriptor in use at the press
+  int press_x = 0, press_y = 0;        // the mouse at the press, in viewer pixels
+  float press_value[MAX_CHANNELS] = {};  // the value the parameter held at the press
+};
+
 struct EffectInstance : EffectGlobals_t {
   const PluginDefinition *plugin = nullptr;
   std::vector<std::unique_ptr<Descriptor>> descriptors;
   std::string plugin_name_text;
   std::string gpu_status;
+  WidgetHold widget_hold;
 };
 
 // Builds an instance of `plugin` and registers it as live; throws on failure.

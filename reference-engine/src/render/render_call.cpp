@@ -9,6 +9,7 @@
 
 #include "model/instance.h"
 #include "model/param_store.h"
+#include "render/frame_requests.h"
 #include "render/pixels.h"
 
 namespace tarsel_ref {
@@ -183,6 +184,55 @@ void copy_line(const RenderCall &call, const KernelContext &ctx, const RasterVie
   write_pixels(dest, y, 0, ctx.width, line.data());
 }
 
+// The previous output a render was not given, rebuilt as the renders of the
+// `history` frames before it would have left it: from the oldest, which has
+// no previous output, each frame is rendered from the frames of its inputs
+// that the host returns, written in the destination's layout and read back
+// as a previous output is read. A frame the host does not have ends the
+// history there: the frame after it starts again with no previous output.
+std::shared_ptr<const WorkImage> rebuild_previous(const RenderCall &call, const KernelContext &ctx,
+                                                  const RasterView &dest, const Spaces &spaces, const Genotype &g,
+                                                  Kernel kernel, float mix, int history) {
+  const std::size_t n_inputs = ctx.inputs.size();
+  RasterView written = dest;
+  std::vector<unsigned char> pixels(image_bytes(*dest.layout, dest.width, dest.height, 0));
+  written.base = pixels.data();
+  written.line_bytes = image_bytes(*dest.layout, dest.width, 1, 0);
+  written.flip = false;
+  std::shared_ptr<const WorkImage> previous;
+  for (int frame = ctx.frame - history; frame < ctx.frame; ++frame) {
+    KernelContext step = ctx;
+    step.frame = frame;
+    step.previous = std::move(previous);
+    std::vector<std::shared_ptr<const WorkImage>> loaded(n_inputs);
+    bool missing = false;
+    for (std::size_t i = 0; i < n_inputs && !missing; ++i)
+      if (ctx.connected[i]) {
+        loaded[i] = ctx.requests->request(static_cast<int>(i), frame, kRequestPreviousOutput);
+        missing = !loaded[i];
+      }
+    if (missing) continue;
+    for (std::size_t i = 0; i < n_inputs; ++i)
+      step.inputs[i] = loaded[i] ? loaded[i] : fallback(g, static_cast<int>(i), step, loaded);
+    const ParamReader params(g, ctx.connected, frame, step.seconds());
+    step.params = &params;
+    std::unique_ptr<WorkImage> made;
+    int unchanged = 0;
+    if (n_inputs == 0 || mix > 0.0f) {
+      made = std::make_unique<WorkImage>(ctx.width, ctx.height);
+      unchanged = kernel(step, *made);
+    }
+    const WorkImage &result = unchanged < 0 ? *made : step.input(unchanged);
+    const float line_mix = unchanged != 0 ? mix : 1.0f;
+    step.rows([&](int y) {
+      std::vector<float> line(static_cast<std::size_t>(ctx.width) * 4);
+      finish_line(call, step, written, spaces, g, line_mix, result, y, line);
+    });
+    previous = read_image(written, ctx, spaces, spaces.output, call.premultiplied);
+  }
+  return previous;
+}
+
 }  // namespace
 
 bool render(const RenderCall &call, std::string *error) {
@@ -277,6 +327,31 @@ bool render(const RenderCall &call, std::string *error) {
     return false;
   }
   const float mix = call.flare_call ? 1.0f : std::clamp(call.mix, 0.0f, 1.0f) * slot_mix(*instance);
+
+  // Other frames of the inputs, asked of the host by effects that read them
+  // or rebuild their previous output; read like the inputs.
+  std::unique_ptr<FrameRequests> requests;
+  const T_LoadOtherFrameFun request_fun = installed_frame_request();
+  if (request_fun && !call.flare_call && (g->flags.need_other_frames_p || g->flags.use_prev_dest_p)) {
+    T_RenderState state;
+    std::memset(&state, 0, sizeof state);
+    for (int i = 0; i < n_inputs && i < MAX_INPUTS; ++i)
+      if (connected[static_cast<std::size_t>(i)]) state.input_info[i] = *call.rasters[i + 1];
+    auto read_frame = [&](const T_RasterInfo &frame_info, void *pixels,
+                          std::string *why) -> std::shared_ptr<const WorkImage> {
+      RasterView frame;
+      if (!describe_raster(frame_info, pixels, &frame, why)) return nullptr;
+      if (!check_resolution(frame_info, downsample, "the frame", why)) return nullptr;
+      return read_image(frame, ctx, spaces, spaces.input, call.premultiplied);
+    };
+    requests = std::make_unique<FrameRequests>(request_fun, state, call.instance, *g, read_frame);
+    ctx.requests = requests.get();
+  }
+  if (g->flags.use_prev_dest_p && !ctx.previous && ctx.requests)
+    if (const History history = find_history(g->name)) {
+      const int frames = history(ctx);
+      if (frames > 0) ctx.previous = rebuild_previous(call, ctx, dest, spaces, *g, kernel, mix, frames);
+    }
   std::unique_ptr<WorkImage> made;
   int unchanged = kWrote;  // the input that is the result as it is
   if (n_inputs > 0 && mix <= 0.0f) {

@@ -26,6 +26,8 @@ struct FlareCall {
   float brightness = 1.0f;
 };
 
+class FrameRequests;  // render/frame_requests.h
+
 struct KernelContext {
   const Genotype *genotype = nullptr;
   const ParamReader *params = nullptr;
@@ -45,9 +47,16 @@ struct KernelContext {
   std::vector<bool> connected;
   std::shared_ptr<const WorkImage> previous;  // the previous output; null when none was given
   const FlareCall *flare_call = nullptr;
+  FrameRequests *requests = nullptr;  // the host's frames; null when only the current frame is at hand
 
   const ParamReader &p() const { return *params; }
   const WorkImage &input(int i) const { return *inputs[static_cast<std::size_t>(i)]; }
+  // Frame `frame` of input `i`: the call's image for the frame being
+  // rendered, the fallback (every frame) of an unconnected input, otherwise
+  // the host's answer to a frame request; null when the host has no such
+  // frame or takes no requests. Call it outside rows(): requests are made
+  // one at a time and may end the render (see FrameRequests::request).
+  std::shared_ptr<const WorkImage> other_frame(int i, int frame) const;
   // A length in full-resolution pixels as render pixels.
   double length(double full_resolution) const { return full_resolution / downsample; }
   double seconds() const { return static_cast<double>(frame) / frame_rate; }
@@ -61,8 +70,15 @@ struct KernelContext {
 constexpr int kWrote = -1;
 using Kernel = int (*)(const KernelContext &ctx, WorkImage &out);
 
+// For an effect that reads its previous output: how many earlier frames that
+// output is rebuilt from when a render is given none (0: it is not rebuilt).
+using History = int (*)(const KernelContext &ctx);
+
 // The kernel of the descriptor of that name; null when there is none.
 Kernel find_kernel(const char *descriptor_name);
+
+// The history of the descriptor of that name; null when it has none.
+History find_history(const char *descriptor_name);
 
 // The lens-flare render call's kernel: the descriptor's flare parameter,
 // lit at ctx.flare_call's position, over input 1.
@@ -76,6 +92,8 @@ int render_glow(const KernelContext &ctx, WorkImage &out);
 int render_dissolve(const KernelContext &ctx, WorkImage &out);
 int render_echo(const KernelContext &ctx, WorkImage &out);
 int render_trails(const KernelContext &ctx, WorkImage &out);
+int trails_history(const KernelContext &ctx);
+int render_time_blur(const KernelContext &ctx, WorkImage &out);
 int render_lens_flare(const KernelContext &ctx, WorkImage &out);
 int render_glare(const KernelContext &ctx, WorkImage &out);
 int render_caption(const KernelContext &ctx, WorkImage &out);

@@ -39,4 +39,18 @@ int render_trails(const KernelContext &ctx, WorkImage &out) {
   return kWrote;
 }
 
+// The frames whose trails still show: the fewest before the persistence has
+// faded them below 1/1024, at most 16.
+int trails_history(const KernelContext &ctx) {
+  const double keep = std::clamp(ctx.p().number("persistence"), 0.0f, 1.0f);
+  if (keep <= 0.0) return 0;
+  constexpr int kLongest = 16;
+  double left = 1.0;
+  for (int n = 1; n < kLongest; ++n) {
+    left *= keep;
+    if (left < 1.0 / 1024.0) return n;
+  }
+  return kLongest;
+}
+
 }  // namespace tarsel_ref

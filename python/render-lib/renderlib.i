@@ -2,7 +2,7 @@
 // QRVExternalMonitor library. This file holds the module declaration, the
 // build's constants, the one exception guard and the list of interface files;
 // each subsystem lives in its own folder.
-%module(moduleimport="import _renderlib") renderlib
+%module(moduleimport="import _renderlib", directors="1") renderlib
 
 %begin %{
 // Import enables thread support last; see renderlib_initialize_threads.
@@ -35,18 +35,24 @@ static void renderlib_initialize_threads()
 %nothreadallow;
 
 // The abort guard around every engine call. An engine abort becomes
-// RuntimeError "Tarsel Abort"; when the call ran without the interpreter lock,
-// the lock is taken back as the call's frame unwinds, before the error is set.
+// RuntimeError "Tarsel Abort" (chained to the host callback that caused it,
+// if one did); when the call ran without the interpreter lock, the lock is
+// taken back as the call's frame unwinds, before the error is set. A failed
+// host callback that reaches a wrapper has its Python error set already.
 %exception {
   try {
     $action
   } catch (const TarselAbortException &) {
-    SWIG_exception_fail(SWIG_RuntimeError, "Tarsel Abort");
+    raise_tarsel_abort();
+    SWIG_fail;
+  } catch (const Swig::DirectorException &) {
+    SWIG_fail;
   }
 }
 
 %include "conventions.i"
 %include "renderlib_typemaps.i"
+%include "abort_translation.i"
 
 // Product identity and build configuration, fixed when the module is built.
 %{
@@ -111,6 +117,7 @@ static void renderlib_initialize_threads()
 %include "std_string.i"
 %include "std_vector.i"
 %include "std_map.i"
+%include "callbacks/load_frame.i"
 %include "model/value_arrays.i"
 %include "model/containers.i"
 %include "model/param_enums.i"

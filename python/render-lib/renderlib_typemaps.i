@@ -15,6 +15,7 @@
 // | ByteCount32            | an output on the wrapper's stack    | nothing to free                        |
 // | CharValueResult        | none: points into a static table    | nothing to free                        |
 // | RasterImageBytes       | the UTF-8 copy of the str           | the wrapper, on every path             |
+// | WidgetResult           | the engine's result, by value       | the wrapper, after conversion          |
 
 // char *EngineHeapText
 // A text member that the engine releases with free(). Assignment frees the old
@@ -169,3 +170,25 @@
   $1 = buffer;
 }
 %typemap(freearg) char const *RasterImageBytes "if (alloc$argnum == SWIG_NEWOBJ) delete[] buffer$argnum;"
+
+// T_WidgetResult WidgetResult
+// What a widget interaction set, as (status, ((name, (v0, v1, v2, v3)), ...)):
+// the names decoded like every text result, each value all four channels.
+%typemap(out) T_WidgetResult WidgetResult {
+  const T_WidgetResult &interaction = $1;
+  const std::vector<std::pair<std::string, T_WidgetValue> > &values = interaction.second;
+  if (values.size() > (size_t)INT_MAX)
+    SWIG_exception_fail(SWIG_OverflowError, "sequence size not valid in python");
+  PyOwned changed(PyTuple_New((Py_ssize_t)values.size()));
+  if (!changed.get())
+    SWIG_fail;
+  for (size_t i = 0; i < values.size(); ++i) {
+    const T_WidgetValue &value = values[i].second;
+    PyObject *entry = Py_BuildValue("(N(dddd))", engine_text(values[i].first.data(), values[i].first.size()),
+                                    (double)value[0], (double)value[1], (double)value[2], (double)value[3]);
+    if (!entry)
+      SWIG_fail;
+    PyTuple_SET_ITEM(changed.get(), (Py_ssize_t)i, entry);
+  }
+  $result = Py_BuildValue("(iN)", interaction.first, changed.release());
+}

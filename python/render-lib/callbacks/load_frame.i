@@ -1,0 +1,107 @@
+// Frame loading: the engine asks the host for other frames of an input during
+// a render. The host subclasses LoadFrameInterface in Python and installs it
+// with set_load_frame_impl; the adapter below turns each engine request into
+// calls of its load_frame and current_raster_info methods.
+
+%{
+#include "tarsel/load_frame.h"
+
+// The installed frame source, or null. Held by plain pointer: the host keeps
+// its object alive (or disowns it) while it is installed.
+static LoadFrameInterface *installed_frame_loader = NULL;
+%}
+
+%feature("director") LoadFrameInterface;
+
+// PyObject *load_frame (a director's result)
+// The director hands its result on as a new reference: the Python-visible
+// wrapper returns it as its own, and the adapter drops it once it has the
+// pixels' address.
+%typemap(directorout) PyObject *load_frame "$result = $1; Py_XINCREF($result);"
+
+// A source that goes away stops being the installed one, so the engine never
+// calls a freed object.
+%feature("action") LoadFrameInterface::~LoadFrameInterface {
+  if (installed_frame_loader == arg1)
+    installed_frame_loader = NULL;
+  delete arg1;
+}
+
+class LoadFrameInterface {
+public:
+  virtual ~LoadFrameInterface();
+  virtual PyObject *load_frame(int input, int frame, int width, int height) = 0;
+  virtual T_RasterInfo current_raster_info(int input) = 0;
+};
+
+%{
+// The address of a frame that load_frame returned, checked against the
+// descriptor that current_raster_info gave for it. The engine reads the
+// pixels after the interpreter lock is given back, so the bytearray must
+// outlive this request in the host's hands.
+static void *frame_pixels_for_engine(PyObject *pixels, const T_RasterInfo &info)
+{
+  if (!PyByteArray_Check(pixels)) {
+    PyErr_Format(PyExc_TypeError, "load_frame must return a bytearray, not '%.200s'", Py_TYPE(pixels)->tp_name);
+    return NULL;
+  }
+  if (Py_REFCNT(pixels) < 2) {
+    PyErr_SetString(PyExc_ValueError,
+                    "load_frame's bytearray must stay referenced by the host until the render returns");
+    return NULL;
+  }
+  T_RasterInfo layout = info;
+  const int needed = make_tarsel_raster_info(&layout, info.ds_xsize, info.ds_ysize);
+  if (needed > 0 && PyByteArray_GET_SIZE(pixels) < needed) {
+    PyErr_Format(PyExc_ValueError, "load_frame returned %zd bytes; its descriptor describes %d",
+                 PyByteArray_GET_SIZE(pixels), needed);
+    return NULL;
+  }
+  return PyByteArray_AS_STRING(pixels);
+}
+
+// The engine's frame request. Runs on an engine thread, takes the interpreter
+// lock for the whole request and gives it back on every path. The source's
+// Python object is held for the request, so a host that drops its last
+// reference meanwhile does not free it under the engine. A failure (the
+// host's exception, a wrong result) is kept for the render call, which the
+// engine ends as an abort, and goes on into the engine as the native
+// exception it is.
+static void *load_frame_for_engine(void *render_state, int input, int frame, unsigned char,
+                                   void *, void *, T_RasterInfo *out_info)
+{
+  GilHeld gil;
+  LoadFrameInterface *loader = installed_frame_loader;
+  if (!loader)
+    return NULL;
+  Swig::Director *director = dynamic_cast<Swig::Director *>(loader);
+  PyObject *self = director ? director->swig_get_self() : NULL;
+  Py_XINCREF(self);
+  PyOwned held(self);
+  try {
+    if (input < 0 || input >= MAX_INPUTS) {
+      PyErr_Format(PyExc_IndexError, "the engine asked a frame loader for input %d", input);
+      throw Swig::DirectorMethodException();
+    }
+    const T_RasterInfo &wanted = static_cast<T_RenderState *>(render_state)->input_info[input];
+    PyOwned pixels(loader->load_frame(input, frame, wanted.ds_xsize, wanted.ds_ysize));
+    *out_info = loader->current_raster_info(input);
+    void *address = frame_pixels_for_engine(pixels.get(), *out_info);
+    if (!address)
+      throw Swig::DirectorMethodException();
+    return address;
+  } catch (...) {
+    keep_callback_failure();
+    throw;
+  }
+}
+
+static void set_load_frame_impl(LoadFrameInterface *loader)
+{
+  // The engine is told first, so an abort leaves the installed source as it was.
+  set_load_other_frame_into_buffer_fun(load_frame_for_engine);
+  installed_frame_loader = loader;
+}
+%}
+
+void set_load_frame_impl(LoadFrameInterface *loader);

@@ -34,6 +34,8 @@ class EngineProbe:
         lib.tarsel_probe_set_render_immediate_return.argtypes = [ctypes.c_int]
         lib.tarsel_probe_last_render_seconds.restype = ctypes.c_double
         lib.tarsel_probe_set_version_text.argtypes = [ctypes.c_char_p]
+        lib.tarsel_probe_time_frame_requests.restype = ctypes.c_double
+        lib.tarsel_probe_time_frame_requests.argtypes = [ctypes.c_int, ctypes.c_int, ctypes.c_int]
 
     def live_instances(self):
         return self.lib.tarsel_probe_live_instances()
@@ -77,6 +79,11 @@ class EngineProbe:
 
     def emit_here(self, level, text):
         self.lib.tarsel_probe_emit_here(level, text.encode())
+
+    def time_frame_requests(self, count, width, height):
+        """Seconds the installed frame-request callback takes for `count`
+        requests from an engine thread; -1 when none is installed or one failed."""
+        return self.lib.tarsel_probe_time_frame_requests(count, width, height)
 
     def set_version_text(self, raw):
         self.lib.tarsel_probe_set_version_text(raw)

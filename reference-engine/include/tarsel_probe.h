@@ -38,6 +38,13 @@ TARSEL_API int tarsel_probe_emit_from_worker(int count, int level, const char *t
 /* Sends one message on the calling thread. */
 TARSEL_API void tarsel_probe_emit_here(int level, const char *text);
 
+/* Calls the installed frame-request callback `count` times from a new engine
+ * thread (input 0, frames 0 to count - 1, flag 0, null engine values, a
+ * render state whose input 0 is width x height pixel_rgba8) and waits for it;
+ * returns the seconds the calls took, or -1 when no callback is installed or
+ * one threw. The answers are not read: this times the callback alone. */
+TARSEL_API double tarsel_probe_time_frame_requests(int count, int width, int height);
+
 /* Replaces the version text that get_tarsel_version_info reports (any bytes,
  * for testing the text conversion); null restores the engine's own. */
 TARSEL_API void tarsel_probe_set_version_text(const char *text);

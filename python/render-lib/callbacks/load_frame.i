@@ -60,6 +60,45 @@ static void *frame_pixels_for_engine(PyObject *pixels, const T_RasterInfo &info)
   return PyByteArray_AS_STRING(pixels);
 }
 
+// Whether the interpreter is shutting down (then no thread state may be made
+// or dropped from a foreign thread).
+static bool interpreter_finalizing()
+{
+#if PY_VERSION_HEX >= 0x030D0000
+  return Py_IsFinalizing();
+#else
+  return _Py_IsFinalizing();
+#endif
+}
+
+// An engine thread that makes frame requests keeps its Python thread state
+// from its first request until it ends: making and dropping one per request
+// would cost more than the request itself. Kept by holding one extra count
+// of PyGILState_Ensure, given back when the thread exits.
+class EngineThreadState {
+public:
+  // Called with the interpreter lock held by this thread's own Ensure.
+  void keep()
+  {
+    if (!kept_) {
+      state_ = PyGILState_Ensure();
+      kept_ = true;
+    }
+  }
+  ~EngineThreadState()
+  {
+    if (!kept_ || !Py_IsInitialized() || interpreter_finalizing())
+      return;
+    PyGILState_STATE taken = PyGILState_Ensure();
+    PyGILState_Release(state_);  // the kept count; the lock stays
+    PyGILState_Release(taken);   // the last count: the state goes, the lock with it
+  }
+private:
+  bool kept_ = false;
+  PyGILState_STATE state_ = PyGILState_LOCKED;
+};
+static thread_local EngineThreadState engine_thread_state;
+
 // The engine's frame request. Runs on an engine thread, takes the interpreter
 // lock for the whole request and gives it back on every path. The source's
 // Python object is held for the request, so a host that drops its last
@@ -71,6 +110,7 @@ static void *load_frame_for_engine(void *render_state, int input, int frame, uns
                                    void *, void *, T_RasterInfo *out_info)
 {
   GilHeld gil;
+  engine_thread_state.keep();
   LoadFrameInterface *loader = installed_frame_loader;
   if (!loader)
     return NULL;

@@ -1,5 +1,6 @@
 // The test probe (tarsel_probe.h) and the call log that every entry point feeds.
 #include <atomic>
+#include <chrono>
 #include <cinttypes>
 #include <cstdio>
 #include <deque>
@@ -14,6 +15,7 @@
 #include "model/instance.h"
 #include "model/param_values.h"
 #include "model/stamps.h"
+#include "render/frame_requests.h"
 #include "render/render_stats.h"
 #include "render/workers.h"
 #include "tarsel/errors.h"
@@ -126,6 +128,27 @@ int tarsel_probe_emit_from_worker(int count, int level, const char *text) {
 }
 
 void tarsel_probe_emit_here(int level, const char *text) { tarsel_ref::emit_message(level, text); }
+
+double tarsel_probe_time_frame_requests(int count, int width, int height) {
+  const T_LoadOtherFrameFun fun = tarsel_ref::installed_frame_request();
+  if (!fun) return -1.0;
+  T_RenderState state{};
+  state.input_info[0].pixel_type = pixel_rgba8;
+  make_tarsel_raster_info(&state.input_info[0], width, height);
+  double seconds = -1.0;
+  std::thread worker([&] {
+    try {
+      T_RasterInfo answer{};
+      const auto start = std::chrono::steady_clock::now();
+      for (int i = 0; i < count; ++i) fun(&state, 0, i, 0, nullptr, nullptr, &answer);
+      seconds = std::chrono::duration<double>(std::chrono::steady_clock::now() - start).count();
+    } catch (...) {
+      seconds = -1.0;
+    }
+  });
+  worker.join();
+  return seconds;
+}
 
 void tarsel_probe_set_version_text(const char *text) {
   std::lock_guard<std::mutex> lock(tarsel_ref::version_mutex);

@@ -32,8 +32,12 @@ enum class MouseEventType {
 // engine never draws through a freed object.
 %feature("action") GfxInterface::~GfxInterface {
   if (installed_drawing == arg1) {
-    tarsel_set_gfx_impl(NULL);
     installed_drawing = NULL;
+    try {
+      tarsel_set_gfx_impl(NULL);
+    } catch (const TarselAbortException &) {
+      // A collected object cannot report an abort; the object goes all the same.
+    }
   }
   delete arg1;
 }

@@ -130,6 +130,8 @@ static void *load_frame_for_engine(void *render_state, int input, int frame, uns
     if (!address)
       throw Swig::DirectorMethodException();
     return address;
+  } catch (const TarselAbortException &) {
+    throw;  // the engine's own abort, raised inside the request: no host failure to report
   } catch (...) {
     keep_callback_failure();
     throw;

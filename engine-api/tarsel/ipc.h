@@ -53,16 +53,18 @@ TARSEL_API const char *shmem_error_to_string(ShmemError error);
 class TARSEL_API ShmemTransport {
 public:
   // Waits for a message; returns its body size (0 when none) and sets *data
-  // to the body and *header to its header where those are not null.
+  // to the body and *header to its header where those are not null. With
+  // data null and header not null, only looks at the next message.
   size_t read(void **data, MessageHeader_t **header);
 
   // As read, without waiting.
   size_t try_read(void **data, MessageHeader_t **header);
 
-  // As read, waiting at most `timeout`.
+  // As read, waiting at most `timeout` seconds.
   size_t timed_read(void **data, float timeout, MessageHeader_t **header);
 
-  // As read, retrying within `timeout`.
+  // As timed_read, trying again within `timeout` seconds after a failure
+  // that may pass (RETRY, LOCK_ERROR).
   size_t read_and_retry(void **data, float timeout, MessageHeader_t **header);
 
   // Waits for `size` bytes of segment space for a message filled in place
@@ -72,7 +74,7 @@ public:
   // As reserve, without waiting.
   void *try_reserve(size_t size, const char *const desc = nullptr);
 
-  // As reserve, waiting at most `timeout`.
+  // As reserve, waiting at most `timeout` seconds.
   void *timed_reserve(size_t size, float timeout, const char *const desc = nullptr);
 
   // Writes a copy of `size` bytes as one message, waiting for space; true on success.
@@ -81,7 +83,7 @@ public:
   // As write, without waiting.
   bool try_write(const void *data, size_t size, const char *const desc = nullptr);
 
-  // As write, waiting at most `timeout`.
+  // As write, waiting at most `timeout` seconds.
   bool timed_write(const void *data, size_t size, float timeout, const char *const desc = nullptr);
 
   // Writes a NUL-terminated text as one message, waiting for space; true on success.
@@ -90,7 +92,7 @@ public:
   // As write_string, without waiting.
   bool try_write_string(const char *const text, const char *const desc = nullptr);
 
-  // As write_string, waiting at most `timeout`.
+  // As write_string, waiting at most `timeout` seconds.
   bool timed_write_string(const char *const text, float timeout, const char *const desc = nullptr);
 
   // Completes the message last reserved; true on success.
@@ -108,7 +110,7 @@ public:
   // Whether the client process is alive.
   bool client_pid_exists();
 
-  // Prints the transport's statistics to the engine's output.
+  // Prints the transport's statistics to standard output.
   void print_stats();
 
   // Cause of the last failure.

@@ -479,3 +479,129 @@
 //   a few milliseconds: the call throws TarselAbortException on its calling
 //   thread once every worker has stopped. Frame-sized working buffers are
 //   kept for reuse (up to 768 MB) until tarsel_shutdown_apps.
+
+// Shared-memory transport (ShmemManager, ShmemTransport)
+//   Names: 1 to 200 characters after an optional leading "/" ("/x" and "x"
+//   name the same segment), no other "/". The segment is the POSIX
+//   shared-memory object "/tarsel-ipc.<name>" (/dev/shm/tarsel-ipc.<name>),
+//   mode 0600 whatever the umask, its memory allocated when it is made (a
+//   full /dev/shm refuses it then). An invalid name: serve and connect give
+//   null, reset does nothing.
+//   serve(name, size1, size2): size1 is the capacity in bytes of the queue
+//   from server to client, size2 of the queue from client to server, each
+//   rounded down to a multiple of 64 and then 4096 to 1 GiB (else null); the
+//   segment takes 4096 + both capacities. A name in use is reclaimed when it
+//   holds a segment of this layout whose server process is dead (that one is
+//   marked removed, so ends still attached to it see INVALID_SEGMENT, and
+//   unlinked); a live server's segment, or anything else under the name, is
+//   refused (null). A segment is never reused: reclaiming makes a new one.
+//   connect(name): null unless the segment is of this layout, not removed,
+//   its server process alive and no other client attached. One client at a
+//   time: a client that frees its end leaves the place free; a dead client's
+//   place is taken over (a restarted client works again, and reads what the
+//   server wrote and the dead one did not read). Server and client may be
+//   one process. ShmemManager objects hold nothing.
+//   Messages: the server writes the queue to the client and reads the other,
+//   the client the opposite. A message is its MessageHeader_t and its body,
+//   contiguous in the ring, padded to a multiple of 64 bytes: a body of n
+//   bytes takes 64 + n rounded up to 64. An empty queue starts again at the
+//   ring's start, so a queue of capacity C takes bodies of up to C - 64
+//   bytes; a larger one fails at once with MSG_TOO_LARGE, changing nothing.
+//   id counts the writer's messages in that direction from 1 (its low 32
+//   bits; a client taking over a dead one's place goes on counting); size is
+//   the body's size; desc the writer's desc cut to 24 bytes, NUL-terminated
+//   when shorter, not terminated when it fills the field, all zeros for a
+//   null desc; padding and reserved are zeros.
+//   Waiting: read, reserve, write and write_string wait as long as it takes;
+//   the try_ forms never wait (RETRY when they would); the timed_ forms wait
+//   at most `timeout` seconds (a float; 0 or less: not at all), failing with
+//   TIMEOUT when that time has run out. On a machine with more than one
+//   processor a wait first watches the queue for about 20 microseconds (a
+//   busy lock for 5), yielding its processor between looks after the first
+//   2; then it sleeps until the peer publishes a message, frees room or
+//   releases the lock, waking at least every 50 ms to look at the segment
+//   and the peer: when the peer process has ended (for a server, its
+//   connected client's; for a client, the server's) the wait ends with
+//   RETRY, so a survivor never hangs. A server with no client connected
+//   waits for one. Calls that do not wait make no system call (wake-ups go
+//   to sleepers only).
+//   Reads: read(&data, &header) takes the next message and returns its body
+//   size, *data pointing to its body and *header to its header, both inside
+//   the segment (read only); either may be null. The message's space stays
+//   the reader's, and the pointers valid, until that transport's next read
+//   or its freeing: every read first releases the messages read before (also
+//   one that then finds nothing). With null data and a non-null header a
+//   read is a header query: it returns the next message's size and header
+//   without taking it (the next read returns that message) and releases
+//   nothing, so a writer waiting for the room of the message read last goes
+//   on waiting. An empty body is a message: read returns 0 for it with
+//   get_last_error SHMEM_NO_ERROR (*data pointing just past its header);
+//   nothing to read returns 0 with RETRY or TIMEOUT (*data, *header null).
+//   read_and_retry(timeout) is timed_read that, failing with RETRY (the peer
+//   gone) or LOCK_ERROR, tries again every millisecond until the timeout has
+//   passed; its error is then that of its last attempt.
+//   Reservations: reserve(size, desc) waits for room for one message of a
+//   body of `size` bytes and returns that body inside the segment (writable,
+//   `size` bytes; not null also for 0), touching none of it, so its cost
+//   does not depend on the size. commit() publishes it: the write position
+//   moves in one store, so a writer that dies before committing delivers
+//   nothing. commit with nothing reserved returns false and changes nothing,
+//   get_last_error included. A transport has one reservation: a reserve or
+//   write that succeeds while one is open takes its place (the open one is
+//   never delivered); one that fails leaves it open.
+//   Writes: write copies the `size` bytes once (memcpy into the ring, under
+//   the queue's lock) and publishes them as one message; write_string sends
+//   strlen(text) + 1 bytes, the NUL included. Null data with a size other
+//   than 0, or a null text, returns false and changes nothing.
+//   Errors: get_last_error is the outcome of the calling thread's last call
+//   on that transport (SHMEM_NO_ERROR after a success); a thread that made
+//   none sees the transport's last outcome on any thread.
+//     MSG_TOO_LARGE    64 + the padded body exceeds the queue's capacity.
+//     RETRY            a try_ form would wait (for a message, room or the
+//                      lock); a waiting call's peer process has ended.
+//     TIMEOUT          a timed form ran out of time (waiting for a message,
+//                      room or the lock).
+//     LOCK_ERROR       the queue's lock cannot be taken: it was left
+//                      unrecoverable. A lock whose holder died (a process
+//                      or a thread) is taken over and the call goes on: the
+//                      queue's positions change in single stores, so the
+//                      holder left them consistent.
+//     INVALID_SEGMENT  the segment was removed (remove, reset, a new server
+//                      reclaiming the name: every sleeper of both ends wakes
+//                      with it, at once, or within 50 ms one waiting for a
+//                      lock), its header no longer reads as one of this
+//                      layout, or its positions or message headers are
+//                      inconsistent. The mapping stays until the transport
+//                      is freed, so a removed segment never faults.
+//   remove(): marks the segment removed, wakes every sleeper and unlinks the
+//   name; true when it did; false (INVALID_SEGMENT) when the segment was
+//   removed already. is_segment_valid(): the header reads as a segment of
+//   this layout with the capacities this end mapped, not removed.
+//   get_server_pid(): the serving process as the segment records it (also
+//   after the server freed its end). client_pid_exists(): a client is
+//   attached and its process exists (kill(pid, 0) succeeds or fails with
+//   EPERM). print_stats() writes to standard output the name, this end, the
+//   process ids and, per direction: capacity, bytes in use, messages and
+//   body bytes written and read, calls that had to sleep (writing, reading),
+//   failed calls (writing, reading; RETRY and TIMEOUT included) and locks
+//   taken over from dead holders.
+//   free_tarsel_ipc_shmemtransport: releases what the end read, detaches a
+//   client end, unmaps and frees; the segment stays until remove or reset.
+//   Null does nothing; a pointer that is not a live transport gives an
+//   Err_Error message and nothing else. Nothing else here sends messages.
+//   reset(name, flag): flag false unlinks the segment only when it is stale
+//   (of this layout, its server process dead); true unlinks whatever the
+//   name holds, a segment of this layout being marked removed first (its
+//   attached ends see INVALID_SEGMENT). reset_all(flag): the same for every
+//   /dev/shm/tarsel-ipc.* object of the effective user.
+//   shmem_error_to_string: a text per code, engine-owned; null for others.
+//   Threads: a transport may be used from several threads at once (calls on
+//   one queue take turns at its lock; a thread asleep holds no lock). The
+//   reservation belongs to the transport, so threads reserving on one
+//   transport take turns from reserve to commit. A transport is freed only
+//   when no thread uses it.
+//   Segment layout: a 4096-byte header (the magic number "TRSLIPC\x01" in
+//   its first 8 bytes, layout version 1, sizes and ring offsets, server and
+//   client process ids, the removed flag, and per queue a robust
+//   process-shared mutex, futex words, positions and statistics), then the
+//   server-to-client ring, then the client-to-server ring.

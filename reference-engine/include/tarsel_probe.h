@@ -70,6 +70,22 @@ TARSEL_API double tarsel_probe_last_render_seconds(void);
  * it, 0 before that and after tarsel_shutdown_apps. */
 TARSEL_API int tarsel_probe_worker_threads(void);
 
+/* Shared-memory transports, for fault tests. `transport` is a
+ * Tarsel::IPC::ShmemTransport pointer; queue 0 carries the server's messages
+ * to the client, queue 1 the client's to the server. Each returns -1 at once
+ * for a pointer that is not a live transport or another queue number. */
+/* Takes the queue's lock and sleeps for ever holding it (never returns
+ * otherwise): for tests that kill the process while it holds the lock. */
+TARSEL_API int tarsel_probe_shmem_stall_holding_lock(void *transport, int which_queue);
+/* Lets a new thread take the queue's lock and end without releasing it, as a
+ * process dying with it would; the next operation on the queue takes the lock
+ * over from its dead owner. 0 when done. */
+TARSEL_API int tarsel_probe_shmem_abandon_lock(void *transport, int which_queue);
+/* Leaves the queue's lock unrecoverable (taken over from a dead owner and
+ * released without being made consistent): every operation on that queue
+ * then fails with LOCK_ERROR, for every process. 0 when done. */
+TARSEL_API int tarsel_probe_shmem_break_lock(void *transport, int which_queue);
+
 #ifdef __cplusplus
 }
 #endif

@@ -16,3 +16,10 @@ enum class ShmemError {
 };
 }
 }
+
+namespace Tarsel {
+namespace IPC {
+// The engine's text for a code; None for a code it does not know.
+const char *shmem_error_to_string(ShmemError error);
+}
+}

@@ -8,10 +8,15 @@
 #include <string>
 #include <thread>
 
+#include <errno.h>
+#include <pthread.h>
+#include <unistd.h>
+
 #include "core/abort.h"
 #include "core/entry.h"
 #include "core/messages.h"
 #include "core/probe_state.h"
+#include "ipc/transport.h"
 #include "model/instance.h"
 #include "model/param_values.h"
 #include "model/stamps.h"
@@ -78,7 +83,10 @@ void record_entry(const char *name, std::string arguments, bool may_abort) {
     if (log.entries.size() == TARSEL_PROBE_LOG_CAPACITY) log.entries.pop_front();
     log.entries.push_back(std::string(name) + "(" + arguments + ")");
   }
-  if (may_abort && abort_next_call.exchange(false)) throw TarselAbortException();
+  // A plain load first: the exchange, a locked write to a shared cache line,
+  // is paid only while the switch is armed.
+  if (may_abort && abort_next_call.load(std::memory_order_relaxed) && abort_next_call.exchange(false))
+    throw TarselAbortException();
 }
 
 std::optional<std::string> probe::version_text_override() {
@@ -169,3 +177,44 @@ void tarsel_probe_set_render_immediate_return(int on) { tarsel_ref::set_render_i
 double tarsel_probe_last_render_seconds(void) { return tarsel_ref::last_render_seconds(); }
 
 int tarsel_probe_worker_threads(void) { return tarsel_ref::worker_thread_count(); }
+
+namespace {
+
+// The lock of a live transport's queue; null for anything else.
+pthread_mutex_t *transport_queue_lock(void *transport, int which_queue) {
+  if (which_queue != 0 && which_queue != 1) return nullptr;
+  tarsel_ref::ipc::Endpoint *endpoint = tarsel_ref::ipc::find_endpoint(transport);
+  return endpoint ? &endpoint->queue_control(which_queue).lock : nullptr;
+}
+
+// Takes the lock on a thread that then ends holding it.
+void abandon(pthread_mutex_t *lock) {
+  std::thread owner([lock] {
+    if (pthread_mutex_lock(lock) == EOWNERDEAD) pthread_mutex_consistent(lock);
+  });
+  owner.join();
+}
+
+}  // namespace
+
+int tarsel_probe_shmem_stall_holding_lock(void *transport, int which_queue) {
+  pthread_mutex_t *lock = transport_queue_lock(transport, which_queue);
+  if (!lock) return -1;
+  if (pthread_mutex_lock(lock) == EOWNERDEAD) pthread_mutex_consistent(lock);
+  for (;;) pause();
+}
+
+int tarsel_probe_shmem_abandon_lock(void *transport, int which_queue) {
+  pthread_mutex_t *lock = transport_queue_lock(transport, which_queue);
+  if (!lock) return -1;
+  abandon(lock);
+  return 0;
+}
+
+int tarsel_probe_shmem_break_lock(void *transport, int which_queue) {
+  pthread_mutex_t *lock = transport_queue_lock(transport, which_queue);
+  if (!lock) return -1;
+  abandon(lock);
+  if (pthread_mutex_lock(lock) == EOWNERDEAD) pthread_mutex_unlock(lock);  // not made consistent
+  return 0;
+}

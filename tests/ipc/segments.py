@@ -1,0 +1,79 @@
+"""Shared-memory segments for the transport tests: names unique to this test
+session, served and connected in this process, and peer processes that run
+a short script against a segment with a hard time limit."""
+import itertools
+import os
+import pathlib
+import subprocess
+import sys
+import textwrap
+
+import _renderlib
+import renderlib  # noqa: F401  (registers the proxy classes)
+
+SESSION_PREFIX = "rltest-%d-" % os.getpid()
+_numbers = itertools.count()
+TESTS = pathlib.Path(__file__).resolve().parents[1]
+
+
+def fresh_name():
+    return SESSION_PREFIX + str(next(_numbers))
+
+
+def segment_file(name):
+    """Where the system keeps the segment of that name."""
+    return pathlib.Path("/dev/shm") / ("tarsel-ipc." + name)
+
+
+def session_segments():
+    return sorted(path.name for path in pathlib.Path("/dev/shm").glob("tarsel-ipc." + SESSION_PREFIX + "*"))
+
+
+def serve(name, size1=1 << 16, size2=1 << 16):
+    transport = _renderlib.ShmemManager_serve(name, size1, size2)
+    assert transport is not None, name
+    return transport
+
+
+def connect(name):
+    transport = _renderlib.ShmemManager_connect(name)
+    assert transport is not None, name
+    return transport
+
+
+class Peer:
+    """Another Python process running `script` (with `name`, `_renderlib`
+    and `renderlib` at hand). It may report on stdout; it is killed when the
+    test ends, at the latest after `limit` seconds."""
+
+    def __init__(self, script, name, limit=60):
+        prologue = "import os, sys, time, zlib\nimport _renderlib, renderlib\nname = %r\n" % name
+        paths = [str(TESTS), str(TESTS / "ipc")] + [p for p in [os.environ.get("PYTHONPATH")] if p]
+        environment = dict(os.environ, PYTHONPATH=os.pathsep.join(paths))
+        self.process = subprocess.Popen([sys.executable, "-u", "-c", prologue + textwrap.dedent(script)],
+                                        stdin=subprocess.PIPE, stdout=subprocess.PIPE, stderr=subprocess.PIPE,
+                                        text=True, env=environment)
+        self.limit = limit
+
+    def line(self):
+        """The next line the peer prints (empty when it ended)."""
+        return self.process.stdout.readline().strip()
+
+    def say(self, text):
+        self.process.stdin.write(text + "\n")
+        self.process.stdin.flush()
+
+    def finish(self):
+        """Waits for the peer to end; its remaining output and return code."""
+        try:
+            out, err = self.process.communicate(timeout=self.limit)
+        except subprocess.TimeoutExpired:
+            self.process.kill()
+            out, err = self.process.communicate()
+            raise AssertionError("the peer did not end within %d s: %s" % (self.limit, err))
+        assert self.process.returncode == 0, err
+        return out
+
+    def kill(self):
+        self.process.kill()
+        self.process.communicate()

@@ -1,0 +1,192 @@
+"""Two processes on one segment: a long exchange in both directions at once,
+a writer blocked on a full queue, and peers that die at the worst moments."""
+import signal
+import time
+
+import _renderlib
+from segments import Peer, serve
+
+E = _renderlib
+QUEUE = 1 << 15
+LARGEST = QUEUE - 64
+MESSAGES = 50_000  # each way
+
+
+# Both sides send MESSAGES messages of sizes drawn at random (mostly small,
+# some of the largest size, some empty), half written, half reserved and
+# committed, each with its sequence number and checksum in its description.
+# Each side can make the other's messages too, so it checks every message it
+# receives byte for byte, empty ones included. Neither may block: a blocking
+# call would keep this process's interpreter lock while the other side waits.
+EXCHANGE = """
+import random, zlib
+
+
+def message(seed, number, largest):
+    rng = random.Random(seed * 1000003 + number)
+    size = rng.choice([0, largest, int(largest * rng.random() ** 8)])
+    body = rng.randbytes(size) if hasattr(rng, "randbytes") else bytes(rng.getrandbits(8) for _ in range(size))
+    return body, "%d %08x" % (number, zlib.crc32(body))
+
+
+def exchange(transport, count, largest, seed, their_seed, peer_alive=lambda: True):
+    sent = received = 0
+    errors = []
+    outgoing = message(seed, 0, largest)
+    deadline = time.monotonic() + 120
+    while (sent < count or received < count) and time.monotonic() < deadline and not errors:
+        if (sent + received) % 1024 == 0 and not peer_alive():
+            errors.append("the peer ended")
+        if sent < count:
+            body, desc = outgoing
+            if sent % 2:
+                view = transport.try_reserve_pybuf(len(body), desc)
+                if view is not None:
+                    view[:] = body
+                ok = view is not None and transport.commit()
+            else:
+                ok = transport.try_write_pybuf(body, desc)
+            if ok:
+                sent += 1
+                outgoing = message(seed, sent, largest)
+            elif transport.get_last_error() != 4:
+                errors.append("send %d: error %d" % (sent, transport.get_last_error()))
+        if received < count:
+            header = transport.get_msg_header()
+            view = transport.try_read_pybuf()
+            if view is None and transport.get_last_error() != 0:
+                continue  # nothing has arrived
+            body = bytes(view) if view is not None else b""
+            expected, desc = message(their_seed, received, largest)
+            if body != expected or (header is not None and header.desc != desc):
+                errors.append("message %d arrived as %r (%d bytes)" % (received, header and header.desc, len(body)))
+            received += 1
+    return sent, received, errors
+"""
+
+
+def test_a_long_exchange_in_both_directions(name):
+    server = serve(name, QUEUE, QUEUE)
+    peer = Peer(EXCHANGE + """
+transport = _renderlib.ShmemManager_connect(name)
+print(exchange(transport, %d, %d, 2, 1))
+""" % (MESSAGES, LARGEST), name, limit=300)
+    namespace = {"time": time}
+    exec(EXCHANGE, namespace)
+    sent, received, errors = namespace["exchange"](server, MESSAGES, LARGEST, 1, 2, lambda: peer.process.poll() is None)
+    assert (sent, received, errors) == (MESSAGES, MESSAGES, [])
+    assert peer.finish().strip() == str((MESSAGES, MESSAGES, []))
+    server.remove()
+
+
+def test_a_blocked_writer_resumes_when_the_reader_drains(name):
+    server = serve(name, QUEUE, QUEUE)
+    peer = Peer("""
+transport = _renderlib.ShmemManager_connect(name)
+while transport.try_write_pybuf(bytes(1000)):
+    pass
+print("full", flush=True)
+start = time.monotonic()
+print(transport.write_pybuf(b"last".ljust(1000)), round(time.monotonic() - start, 2))
+""", name)
+    assert peer.line() == "full"
+    time.sleep(0.3)
+    count = 0
+    while True:
+        view = server.timed_read_pybuf(2.0)
+        if view is None:
+            break
+        count += 1
+        if bytes(view).startswith(b"last"):
+            break
+    ok, waited = peer.finish().split()
+    assert ok == "True" and float(waited) >= 0.25 and count > 10
+    server.remove()
+
+
+def test_a_peer_killed_holding_the_lock(name):
+    server = serve(name, QUEUE, QUEUE)
+    peer = Peer("""
+from engine_probe import EngineProbe
+transport = _renderlib.ShmemManager_connect(name)
+assert transport.write_pybuf(b"committed before")
+print("holding", flush=True)
+EngineProbe().lib.tarsel_probe_shmem_stall_holding_lock(int(transport.this), 1)
+""", name)
+    assert peer.line() == "holding"
+    time.sleep(0.1)  # the peer now sleeps with the client-to-server queue's lock
+    peer.process.send_signal(signal.SIGKILL)
+    peer.process.wait(5)
+    start = time.perf_counter()
+    first = server.timed_read_pybuf(1.0)
+    assert time.perf_counter() - start < 0.1
+    assert bytes(first) == b"committed before"
+    assert server.try_read_pybuf() is None  # exactly once
+    # A restarted client works again.
+    restarted = Peer("""
+transport = _renderlib.ShmemManager_connect(name)
+print(transport.write_pybuf(b"again"), bytes(transport.timed_read_pybuf(5.0)))
+""", name)
+    time.sleep(0.2)
+    assert server.write_pybuf(b"welcome back")
+    assert bytes(server.timed_read_pybuf(5.0)) == b"again"
+    assert restarted.finish().strip() == "True b'welcome back'"
+    server.remove()
+
+
+def test_a_peer_killed_with_a_reservation_open(name):
+    server = serve(name, QUEUE, QUEUE)
+    peer = Peer("""
+transport = _renderlib.ShmemManager_connect(name)
+for i in range(3):
+    assert transport.write_pybuf(b"message %d" % i)
+view = transport.reserve_pybuf(100, "never committed")
+view[:] = b"u" * 100
+print("reserved", flush=True)
+time.sleep(60)
+""", name)
+    assert peer.line() == "reserved"
+    peer.process.send_signal(signal.SIGKILL)
+    peer.process.wait(5)
+    got = []
+    while True:
+        view = server.timed_read_pybuf(0.1)
+        if view is None:
+            break
+        got.append(bytes(view))
+    assert got == [b"message 0", b"message 1", b"message 2"]
+    assert server.get_last_error() in (E.ShmemError_TIMEOUT, E.ShmemError_RETRY)
+    server.remove()
+
+
+def test_a_dead_peer_ends_a_blocking_wait(name):
+    server = serve(name, QUEUE, QUEUE)
+    peer = Peer("""
+transport = _renderlib.ShmemManager_connect(name)
+print("connected", flush=True)
+time.sleep(60)
+""", name)
+    assert peer.line() == "connected"
+    peer.process.send_signal(signal.SIGKILL)
+    peer.process.wait(5)
+    start = time.perf_counter()
+    assert server.read_pybuf() is None  # would wait for ever for a live peer
+    assert server.get_last_error() == E.ShmemError_RETRY
+    assert time.perf_counter() - start < 1.0
+    server.remove()
+
+
+def test_the_segment_removed_under_a_blocked_reader(name):
+    server = serve(name, QUEUE, QUEUE)
+    peer = Peer("""
+transport = _renderlib.ShmemManager_connect(name)
+print("reading", flush=True)
+start = time.monotonic()
+view = transport.read_pybuf()
+print(view, transport.get_last_error(), round(time.monotonic() - start, 2))
+""", name)
+    assert peer.line() == "reading"
+    time.sleep(0.3)
+    assert server.remove()
+    view, error, waited = peer.finish().split()
+    assert view == "None" and int(error) == E.ShmemError_INVALID_SEGMENT and float(waited) < 1.5

@@ -34,6 +34,10 @@ class EngineProbe:
         lib.tarsel_probe_set_render_immediate_return.argtypes = [ctypes.c_int]
         lib.tarsel_probe_last_render_seconds.restype = ctypes.c_double
         lib.tarsel_probe_set_version_text.argtypes = [ctypes.c_char_p]
+        for name in ("stall_holding_lock", "abandon_lock", "break_lock"):
+            function = getattr(lib, "tarsel_probe_shmem_" + name)
+            function.argtypes = [ctypes.c_void_p, ctypes.c_int]
+            function.restype = ctypes.c_int
         lib.tarsel_probe_time_frame_requests.restype = ctypes.c_double
         lib.tarsel_probe_time_frame_requests.argtypes = [ctypes.c_int, ctypes.c_int, ctypes.c_int]
 

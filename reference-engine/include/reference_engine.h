@@ -489,12 +489,13 @@
 //   null, reset does nothing.
 //   serve(name, size1, size2): size1 is the capacity in bytes of the queue
 //   from server to client, size2 of the queue from client to server, each
-//   rounded down to a multiple of 64 and then 4096 to 1 GiB (else null); the
-//   segment takes 4096 + both capacities. A name in use is reclaimed when it
-//   holds a segment of this layout whose server process is dead (that one is
-//   marked removed, so ends still attached to it see INVALID_SEGMENT, and
-//   unlinked); a live server's segment, or anything else under the name, is
-//   refused (null). A segment is never reused: reclaiming makes a new one.
+//   rounded down to a multiple of 64, which must then lie within 4096 and
+//   1 GiB (else null); the segment takes 4096 + both capacities. A name in
+//   use is reclaimed when it holds a segment of this layout whose server
+//   process is dead (that one is marked removed, so ends still attached to
+//   it see INVALID_SEGMENT, and unlinked); a live server's segment, or
+//   anything else under the name, is refused (null). A segment is never
+//   reused: reclaiming makes a new one.
 //   connect(name): null unless the segment is of this layout, not removed,
 //   its server process alive and no other client attached. One client at a
 //   time: a client that frees its end leaves the place free; a dead client's
@@ -523,8 +524,8 @@
 //   and the peer: when the peer process has ended (for a server, its
 //   connected client's; for a client, the server's) the wait ends with
 //   RETRY, so a survivor never hangs. A server with no client connected
-//   waits for one. Calls that do not wait make no system call (wake-ups go
-//   to sleepers only).
+//   waits for one. Reads, reservations and writes that need not wait make
+//   no system call (wake-ups go to sleepers only).
 //   Reads: read(&data, &header) takes the next message and returns its body
 //   size, *data pointing to its body and *header to its header, both inside
 //   the segment (read only); either may be null. The message's space stays
@@ -575,8 +576,9 @@
 //                      is freed, so a removed segment never faults.
 //   remove(): marks the segment removed, wakes every sleeper and unlinks the
 //   name; true when it did; false (INVALID_SEGMENT) when the segment was
-//   removed already. is_segment_valid(): the header reads as a segment of
-//   this layout with the capacities this end mapped, not removed.
+//   removed already or its name leads elsewhere. is_segment_valid(): the
+//   header reads as a segment of this layout with the capacities this end
+//   mapped, not removed.
 //   get_server_pid(): the serving process as the segment records it (also
 //   after the server freed its end). client_pid_exists(): a client is
 //   attached and its process exists (kill(pid, 0) succeeds or fails with

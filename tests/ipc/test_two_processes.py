@@ -111,10 +111,13 @@ from engine_probe import EngineProbe
 transport = _renderlib.ShmemManager_connect(name)
 assert transport.write_pybuf(b"committed before")
 print("holding", flush=True)
-EngineProbe().lib.tarsel_probe_shmem_stall_holding_lock(int(transport.this), 1)
+print(EngineProbe().lib.tarsel_probe_shmem_stall_holding_lock(int(transport.this), 1), flush=True)  # never returns
 """, name)
     assert peer.line() == "holding"
-    time.sleep(0.1)  # the peer now sleeps with the client-to-server queue's lock
+    time.sleep(0.2)  # the peer now sleeps with the client-to-server queue's lock
+    assert peer.process.poll() is None, "the peer did not stay holding the lock"
+    assert server.try_read_pybuf() is None  # the lock is taken: a try_ read would wait
+    assert server.get_last_error() == E.ShmemError_RETRY
     peer.process.send_signal(signal.SIGKILL)
     peer.process.wait(5)
     start = time.perf_counter()

@@ -293,6 +293,21 @@ class Channel:
         pass
 
 
+def timed_round_trips(send, receive, payload):
+    """Round-trip times in ns of send(payload) then receive(), warm-up
+    excluded; a receive that gives None ends the run."""
+    clock = time.perf_counter_ns
+    times = [0] * (WARMUP_ROUND_TRIPS + ROUND_TRIPS)
+    for i in range(WARMUP_ROUND_TRIPS + ROUND_TRIPS):
+        start = clock()
+        send(payload)
+        answer = receive()
+        times[i] = clock() - start
+        if answer is None:
+            raise RuntimeError("round trip %d got no answer" % i)
+    return times[WARMUP_ROUND_TRIPS:]
+
+
 def check_count(received, sent):
     if received != sent:
         raise RuntimeError("the peer received %d bytes of %d" % (received, sent))
@@ -361,17 +376,12 @@ class TransportChannel(Channel):
 
     def round_trips(self, payload):
         self.command(b"echo-reserve" if self.reserve else b"echo")
-        send, read, clock = self.send_function(), self.transport.read_pybuf, time.perf_counter_ns
-        times = [0] * (WARMUP_ROUND_TRIPS + ROUND_TRIPS)
-        for i in range(WARMUP_ROUND_TRIPS + ROUND_TRIPS):
-            start = clock()
-            send(payload)
-            answer = read()
-            times[i] = clock() - start
-            if answer is None:
-                raise RuntimeError("round trip failed: %s" % self.transport.get_last_error())
+        try:
+            times = timed_round_trips(self.send_function(), self.transport.read_pybuf, payload)
+        except RuntimeError as error:
+            raise RuntimeError("%s: error %s" % (error, self.transport.get_last_error()))
         self.command(STOP)
-        return times[WARMUP_ROUND_TRIPS:]
+        return times
 
     def stream(self, payload, seconds):
         self.command(b"sink")
@@ -406,15 +416,9 @@ class PipeChannel(Channel):
     def round_trips(self, payload):
         connection = self.connection
         connection.send_bytes(b"echo")
-        send, receive, clock = connection.send_bytes, connection.recv_bytes, time.perf_counter_ns
-        times = [0] * (WARMUP_ROUND_TRIPS + ROUND_TRIPS)
-        for i in range(WARMUP_ROUND_TRIPS + ROUND_TRIPS):
-            start = clock()
-            send(payload)
-            receive()
-            times[i] = clock() - start
-        send(STOP)
-        return times[WARMUP_ROUND_TRIPS:]
+        times = timed_round_trips(connection.send_bytes, connection.recv_bytes, payload)
+        connection.send_bytes(STOP)
+        return times
 
     def stream(self, payload, seconds):
         self.connection.send_bytes(b"sink")
@@ -447,15 +451,9 @@ class QueueChannel(Channel):
 
     def round_trips(self, payload):
         self.inbox.put("echo")
-        put, get, clock = self.inbox.put, self.outbox.get, time.perf_counter_ns
-        times = [0] * (WARMUP_ROUND_TRIPS + ROUND_TRIPS)
-        for i in range(WARMUP_ROUND_TRIPS + ROUND_TRIPS):
-            start = clock()
-            put(payload)
-            get()
-            times[i] = clock() - start
-        put(None)
-        return times[WARMUP_ROUND_TRIPS:]
+        times = timed_round_trips(self.inbox.put, self.outbox.get, payload)
+        self.inbox.put(None)
+        return times
 
     def stream(self, payload, seconds):
         self.inbox.put("sink")
@@ -491,16 +489,14 @@ class SharedMemoryChannel(Channel):
         connection, memory, size = self.connection, self.memory, len(payload)
         connection.send_bytes(b"echo")
         note = size.to_bytes(8, "little")
-        send, receive, clock = connection.send_bytes, connection.recv_bytes, time.perf_counter_ns
-        times = [0] * (WARMUP_ROUND_TRIPS + ROUND_TRIPS)
-        for i in range(WARMUP_ROUND_TRIPS + ROUND_TRIPS):
-            start = clock()
+        send_note = connection.send_bytes
+
+        def send(payload):
             memory[0:size] = payload
-            send(note)
-            receive()
-            times[i] = clock() - start
-        send(bytes(8))
-        return times[WARMUP_ROUND_TRIPS:]
+            send_note(note)
+        times = timed_round_trips(send, connection.recv_bytes, payload)
+        send_note(bytes(8))
+        return times
 
     def stream(self, payload, seconds):
         connection, memory, size = self.connection, self.memory, len(payload)

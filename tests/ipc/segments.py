@@ -43,8 +43,8 @@ def connect(name):
 
 class Peer:
     """Another Python process running `script` (with `name`, `_renderlib`
-    and `renderlib` at hand). It may report on stdout; it is killed when the
-    test ends, at the latest after `limit` seconds."""
+    and `renderlib` at hand). It may report on stdout and read lines from
+    stdin; finish() waits for it, killing it after `limit` seconds."""
 
     def __init__(self, script, name, limit=60):
         prologue = "import os, sys, time, zlib\nimport _renderlib, renderlib\nname = %r\n" % name
@@ -75,5 +75,6 @@ class Peer:
         return out
 
     def kill(self):
+        """Ends the peer with SIGKILL, wherever it is, and waits for it."""
         self.process.kill()
         self.process.communicate()

@@ -1,6 +1,5 @@
 """Two processes on one segment: a long exchange in both directions at once,
 a writer blocked on a full queue, and peers that die at the worst moments."""
-import signal
 import time
 
 import _renderlib
@@ -118,8 +117,7 @@ print(EngineProbe().lib.tarsel_probe_shmem_stall_holding_lock(int(transport.this
     assert peer.process.poll() is None, "the peer did not stay holding the lock"
     assert server.try_read_pybuf() is None  # the lock is taken: a try_ read would wait
     assert server.get_last_error() == E.ShmemError_RETRY
-    peer.process.send_signal(signal.SIGKILL)
-    peer.process.wait(5)
+    peer.kill()
     start = time.perf_counter()
     first = server.timed_read_pybuf(1.0)
     assert time.perf_counter() - start < 0.1
@@ -149,8 +147,7 @@ print("reserved", flush=True)
 time.sleep(60)
 """, name)
     assert peer.line() == "reserved"
-    peer.process.send_signal(signal.SIGKILL)
-    peer.process.wait(5)
+    peer.kill()
     got = []
     while True:
         view = server.timed_read_pybuf(0.1)
@@ -170,8 +167,7 @@ print("connected", flush=True)
 time.sleep(60)
 """, name)
     assert peer.line() == "connected"
-    peer.process.send_signal(signal.SIGKILL)
-    peer.process.wait(5)
+    peer.kill()
     start = time.perf_counter()
     assert server.read_pybuf() is None  # would wait for ever for a live peer
     assert server.get_last_error() == E.ShmemError_RETRY

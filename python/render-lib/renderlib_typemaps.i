@@ -16,6 +16,9 @@
 // | CharValueResult        | none: points into a static table    | nothing to free                        |
 // | RasterImageBytes       | the UTF-8 copy of the str           | the wrapper, on every path             |
 // | WidgetResult           | the engine's result, by value       | the wrapper, after conversion          |
+// | NameList               | the library's array of names        | the library; the module frees nothing  |
+// | LiveDisplay, LiveImage,| none: checks against the module's   | nothing to free                        |
+// | LiveImageOrNone        | record of objects it handed out     |                                        |
 
 // char *EngineHeapText
 // A text member that the engine releases with free(). Assignment frees the old
@@ -191,4 +194,85 @@
     PyTuple_SET_ITEM(changed.get(), (Py_ssize_t)i, entry);
   }
   $result = Py_BuildValue("(iN)", interaction.first, changed.release());
+}
+
+// const char ***NameList
+// An operation that points a library-owned array at its argument and returns
+// the number of names in it: the count (the wrapper's result) and the array
+// become one list of str (UTF-8). Nothing is freed.
+%typemap(in, numinputs=0, noblock=1) const char ***NameList (const char **names = 0) {
+  $1 = ($1_ltype)&names;
+}
+%typemap(argout, noblock=1) const char ***NameList {
+  {
+    const Py_ssize_t count = result > 0 ? (Py_ssize_t)result : 0;
+    PyOwned list(PyList_New(count));
+    if (!list.get())
+      SWIG_fail;
+    for (Py_ssize_t i = 0; i < count; ++i) {
+      const char *name = *$1 ? (const char *)(*$1)[i] : NULL;
+      if (!name)
+        SWIG_exception_fail(SWIG_SystemError, "in method '$symname': the library listed a null name");
+      PyObject *text = PyUnicode_FromString(name);
+      if (!text)
+        SWIG_fail;
+      PyList_SET_ITEM(list.get(), i, text);
+    }
+    Py_DECREF($result);
+    $result = list.release();
+  }
+}
+
+%{
+#include <unordered_set>
+#include "qrv/external_monitor.h"
+
+// Displays and images that the module handed out and that are still alive.
+// A display lives from EM_DisplayInit to release_external_monitor, an image
+// from EM_XIImageWrapper to the removeRef that leaves no reference; a proxy
+// used after that is refused instead of followed into freed memory. The
+// interpreter lock guards both sets: no monitor function runs without it.
+struct MonitorObjects {
+  std::unordered_set<const void *> displays, images;
+};
+static MonitorObjects &monitor_objects()
+{
+  static MonitorObjects *objects = new MonitorObjects;  // outlives module teardown
+  return *objects;
+}
+%}
+
+// EM_Display *LiveDisplay
+// A display from EM_DisplayInit that release_external_monitor has not
+// destroyed; None, or a released display, is refused with ValueError.
+%typemap(check, noblock=1) EM_Display *LiveDisplay {
+  if (!$1 || !monitor_objects().displays.count($1))
+    SWIG_exception_fail(SWIG_ValueError, "in method '$symname', argument $argnum of type '$1_type': "
+                        "no display (None, or released by release_external_monitor)");
+}
+// EM_Display * (a result): recorded as alive.
+%typemap(ret, noblock=1) EM_Display * {
+  if ($1)
+    monitor_objects().displays.insert($1);
+}
+
+// EM_XIImage *LiveImage
+// An image from EM_XIImageWrapper with a reference left; None, or an image
+// whose last reference was removed, is refused with ValueError.
+%typemap(check, noblock=1) EM_XIImage *LiveImage {
+  if (!$1 || !monitor_objects().images.count($1))
+    SWIG_exception_fail(SWIG_ValueError, "in method '$symname', argument $argnum of type '$1_type': "
+                        "no image (None, or its last reference was removed)");
+}
+// EM_XIImage *LiveImageOrNone
+// As LiveImage, but None passes as null (the library answers it with a status).
+%typemap(check, noblock=1) EM_XIImage *LiveImageOrNone {
+  if ($1 && !monitor_objects().images.count($1))
+    SWIG_exception_fail(SWIG_ValueError, "in method '$symname', argument $argnum of type '$1_type': "
+                        "its last reference was removed");
+}
+// EM_XIImage * (a result): recorded as alive.
+%typemap(ret, noblock=1) EM_XIImage * {
+  if ($1)
+    monitor_objects().images.insert($1);
 }

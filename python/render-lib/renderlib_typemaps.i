@@ -43,6 +43,15 @@
 #include <vector>
 %}
 
+// SWIGTYPE *self
+// The object a method is called on. A pointer argument accepts None as null,
+// and a member call through null would crash the interpreter, so a None (or
+// null) self is refused the way a null reference is.
+%typemap(check, noblock=1) SWIGTYPE *self, SWIGTYPE const *self {
+  if (!$1)
+    SWIG_exception_fail(SWIG_ValueError, "invalid null reference in method '$symname', argument $argnum of type '$1_type'");
+}
+
 // RawImage pixels
 // Any object exporting the buffer protocol; its start address goes to the
 // engine. The view (PyBUF_ND: contiguous, writability not requested) is

@@ -9,8 +9,10 @@
 // The library's 32-bit signed integer.
 typedef int32_t EM_SInt32;
 
-// Status codes of the display operations.
-enum EM_error {
+// Status codes of the display operations. Both enumerations are 32-bit with
+// a fixed underlying type, so any 32-bit value a caller passes is a valid
+// value to compare (a library must not assume only the named ones arrive).
+enum EM_error : int32_t {
   EM_errorNone = 0,      // success
   EM_errorParam = 1,     // an argument is not valid
   EM_errorNotFound = 2,  // no such device or mode
@@ -20,7 +22,7 @@ enum EM_error {
 };
 
 // Pixel layout of an image handed to a display.
-enum EM_ImageFormat {
+enum EM_ImageFormat : int32_t {
   EM_ImageFormat_32BitIntBGRA = 0,  // 32-bit pixels, bytes B, G, R, A
   EM_ImageFormat_32BitIntARGB = 1   // 32-bit pixels, bytes A, R, G, B
 };

@@ -6,7 +6,6 @@ import pytest
 from PIL import Image
 
 import _renderlib as rl
-from monitor_probe import address
 
 WIDTH, HEIGHT = 640, 360
 

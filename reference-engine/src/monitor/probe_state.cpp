@@ -155,7 +155,7 @@ int qrv_probe_preview_frame(const void *display, void *bgra, int capacity, int *
   live->read_preview([&](const PreviewDevice &preview) {
     const std::vector<uint8_t> &frame = preview.last_frame();
     bytes = int(frame.size());
-    if (bgra && capacity >= bytes)
+    if (bgra && bytes > 0 && capacity >= bytes)
       std::memcpy(bgra, frame.data(), frame.size());
     const Mode *mode = preview.mode();
     if (width)

@@ -48,7 +48,9 @@ def saved_text(instance, changes=None):
 
 def recreate(instance, changes=None):
     """A new instance of the same effect with the same values, `changes`
-    applied; None when the engine refuses a value's text."""
+    applied; None when the engine refuses the saved text as a whole. A value
+    text the engine cannot read is left at the effect's default with an
+    Err_Warning message (renderlib.rendering.effect_instance refuses it)."""
     return _renderlib.init_tarsel_effect_from_string(saved_text(instance, changes))
 
 

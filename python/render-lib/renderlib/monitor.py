@@ -58,7 +58,10 @@ class Monitor:
         height 32-bit pixels in `format`, top row first unless `bottom_up`."""
         if self._display is None:
             raise ValueError("the monitor is closed")
-        size = memoryview(pixels).nbytes
+        view = memoryview(pixels)
+        if not view.c_contiguous:
+            raise ValueError("the frame's pixels are not C-contiguous")
+        size = view.nbytes
         if size < self.width * self.height * 4:
             raise ValueError("a %dx%d frame needs %d bytes, the buffer has %d"
                              % (self.width, self.height, self.width * self.height * 4, size))

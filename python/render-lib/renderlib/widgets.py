@@ -48,7 +48,7 @@ class SvgDrawing(renderlib.GfxInterface):
 
     def get_text_length_in_pixels(self, text):
         self._record("get_text_length_in_pixels", text)
-        return self.char_width * len(text)
+        return self.char_width * len(text or "")
 
     def operations(self):
         """The names of the recorded calls, in order."""
@@ -57,6 +57,32 @@ class SvgDrawing(renderlib.GfxInterface):
     def svg(self, width, height, backdrop="#404040"):
         """The recorded drawing as an SVG document of width x height pixels."""
         return _Svg(self.char_width).document(self.calls, width, height, backdrop)
+
+    def paint(self, image):
+        """Draws the recorded calls over a Pillow image (RGB or RGBA), in place."""
+        from PIL import ImageDraw
+        draw = ImageDraw.Draw(image)
+        state = _Svg(self.char_width)
+        for name, args in self.calls:
+            state.replay(name, args)
+            colour, width = state.colour, max(1, round(state.width))
+            if name == "line":
+                draw.line(args, fill=colour, width=width)
+            elif name == "lines":
+                draw.line(list(zip(*args)), fill=colour, width=width)
+            elif name == "circle":
+                x, y, r = args
+                draw.ellipse((x - r, y - r, x + r, y + r), outline=colour, width=width)
+            elif name == "dot":
+                x, y, size = args
+                draw.ellipse((x - size / 2, y - size / 2, x + size / 2, y + size / 2), fill=colour)
+            elif name == "rect_filled":
+                x1, y1, x2, y2 = args
+                draw.rectangle((min(x1, x2), min(y1, y2), max(x1, x2), max(y1, y2)), fill=colour)
+            elif name == "draw_text":
+                text, x, y = args
+                draw.text((x, y), text, fill=colour, anchor="ls")
+        return image
 
 
 class _Svg:

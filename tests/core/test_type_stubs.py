@@ -1,0 +1,225 @@
+"""The type stubs installed with the package: _renderlib-stubs for the
+extension module, and the .pyi files and py.typed of the renderlib package.
+
+mypy's stubtest compares them with the modules as installed; mypy checks a
+typed host (which also runs here) and must find nothing wrong with it; and it
+checks a host's mistakes, every one of which it must report and every one of
+which fails at run time too. tools/make_stubs.py --check says whether the
+stubs are still what the interface gives."""
+import os
+import pathlib
+import pkgutil
+import re
+import subprocess
+import sys
+import textwrap
+
+import pytest
+
+import _renderlib
+import renderlib
+
+# The test extra installs mypy only where it runs (Python 3.10 and later).
+pytest.importorskip("mypy")
+
+HERE = pathlib.Path(__file__).resolve().parent
+REPO = HERE.parents[1]
+ALLOWLIST = HERE / "stubtest_allowlist.txt"
+
+# A host written against the stubs: every line must type-check under --strict,
+# and the assert_type lines pin what the stubs say the binding gives.
+TYPED_HOST = '''
+from typing_extensions import assert_type
+
+import _renderlib
+import renderlib
+from renderlib import effects
+
+
+def catalogue_names(builder: bool) -> list[str]:
+    count = _renderlib.get_n_tarsel_builder_effects() if builder else _renderlib.get_n_tarsel_effects()
+    entry_at = _renderlib.get_tarsel_builder_info_i if builder else _renderlib.get_tarsel_plugin_info_i
+    names = []
+    for index in range(count):
+        entry = entry_at(index)
+        assert_type(entry, renderlib.Plugin_Info | None)
+        if entry is not None and entry.plugin_name is not None:
+            names.append(entry.plugin_name)
+    return names
+
+
+def parameter_texts(name: str) -> dict[str, str | None]:
+    instance = _renderlib.init_tarsel_effect(name, False)
+    assert_type(instance, renderlib.EffectGlobals_t | None)
+    assert instance is not None
+    try:
+        genotype = instance.effect_genotype
+        assert genotype is not None
+        assert_type(genotype.input_names, tuple[str, ...])
+        texts = {}
+        for param in genotype.params:
+            assert param is not None
+            lower, upper, _start, _end = param.get_limits()
+            assert_type(lower, float | None)
+            assert_type(param.flags.screen_mode, int)
+            texts[param.get_canonical_name() or param.name or ""] = param.to_string(None)
+        return texts
+    finally:
+        _renderlib.free_tarsel_effect(instance)
+
+
+def render_gradient(width: int, height: int) -> bytearray:
+    info = renderlib.T_RasterInfo()
+    info.pixel_type = renderlib.pixel_rgba8
+    size = _renderlib.make_tarsel_raster_info(info, width, height)
+    assert_type(size, int)
+    assert_type(info.ds_xsize, int)
+    assert_type(info.x_origin_float, float)
+    pixels = bytearray(size)
+    gradient = _renderlib.init_tarsel_effect("T_Gradient", False)
+    rasters = [info]
+    rendered = _renderlib.render_tarsel_effect_to_native_image(
+        gradient, "", pixels, 0, 0, 1, 1, rasters, [None], 1.0, len(rasters), 1.0, 0, 0, 0, 25, False,
+        "srgb", "srgb", "linear")
+    assert_type(rendered, bool)
+    again = effects.render(gradient, (info, pixels), frame=1, colorspace="srgb")
+    _renderlib.free_tarsel_effect(gradient)
+    assert rendered and again
+    return pixels
+
+
+def messages_of(name: str) -> list[str]:
+    seen: list[str] = []
+    _renderlib.set_error_handler(lambda level, text: seen.append("%d: %s" % (level, text)))
+    try:
+        _renderlib.init_tarsel_effect(name, False)
+    finally:
+        _renderlib.set_error_handler(None)
+    return seen
+'''
+
+# A host's mistakes, after a correct start: (statement, mypy's error code,
+# the exception the binding raises for it).
+MISTAKES_START = '''
+import _renderlib
+import renderlib
+
+info = renderlib.T_RasterInfo()
+pixels = bytearray(64)
+'''
+MISTAKES = [
+    # A bool argument takes True and False only.
+    ('_renderlib.init_tarsel_effect("T_Gradient", 1)', "arg-type", TypeError),
+    # The flat functions take positional arguments only.
+    ('_renderlib.init_tarsel_effect(name="T_Gradient", builder=False)', "call-arg", TypeError),
+    ("_renderlib.make_tarsel_raster_info(info, 64)", "call-arg", TypeError),
+    # An int field takes no float.
+    ("info.ds_xsize = 2.5", "assignment", TypeError),
+    # A read-only field.
+    ("info.background_pixel = info.background_pixel", "misc", AttributeError),
+    # Records the engine makes have no constructor.
+    ("renderlib.EffectGlobals_t()", "call-arg", AttributeError),
+    # Pixels are a buffer, not text.
+    ('_renderlib.render_tarsel_effect_to_native_image(None, "", "pixels", 0, 0, 1, 1, [info], [pixels], 1.0, 1,'
+     ' 1.0, 0, 0, 0, 25, False, "srgb", "srgb", "linear")', "arg-type", TypeError),
+    # A catalogue entry may be None (past the end, here).
+    ("_renderlib.get_tarsel_plugin_info_i(1 << 20).plugin_name", "union-attr", AttributeError),
+]
+
+MYPY_LINE = re.compile(r"^(?P<file>[^:]+):(?P<line>\d+): error: (?P<message>.*)\[(?P<code>[\w-]+)\]$")
+
+
+def run(command, cwd, strip_preload=False):
+    env = dict(os.environ)
+    if strip_preload:
+        # A static check loads nothing of the binding: no sanitizer runtime needed.
+        for name in ("LD_PRELOAD", "ASAN_OPTIONS", "UBSAN_OPTIONS", "PYTHONMALLOC"):
+            env.pop(name, None)
+    return subprocess.run([str(part) for part in command], cwd=cwd, env=env, capture_output=True, text=True,
+                          timeout=300)
+
+
+def mypy(tmp_path, name, source):
+    path = tmp_path / ("%s.py" % name)
+    path.write_text(textwrap.dedent(source))
+    result = run([sys.executable, "-m", "mypy", "--strict", "--warn-unreachable", "--no-error-summary",
+                  "--show-error-codes", "--no-pretty", "--cache-dir", tmp_path / "mypy-cache", path.name],
+                 tmp_path, strip_preload=True)
+    errors = []
+    for line in result.stdout.splitlines():
+        match = MYPY_LINE.match(line)
+        if match:
+            errors.append((int(match["line"]), match["code"], match["message"].strip()))
+        elif ": error:" in line:
+            raise AssertionError("an error mypy reported in a form not understood:\n" + result.stdout)
+    return result, errors
+
+
+def test_stubtest_finds_the_stubs_true_to_the_installed_modules(tmp_path):
+    # From an empty folder, so that the installed modules and stubs are what
+    # is checked, not anything in the working directory.
+    result = run([sys.executable, "-m", "mypy.stubtest", "_renderlib", "renderlib", "--allowlist", ALLOWLIST],
+                 tmp_path)
+    report = result.stdout + result.stderr
+    assert result.returncode == 0, report
+    checked = re.search(r"Success: no issues found in (\d+) modules", report)
+    assert checked, report
+    # Every module of the package was compared, not just the two named (the
+    # count also takes in the engine's folder, renderlib/lib).
+    submodules = [m.name for m in pkgutil.walk_packages(renderlib.__path__, "renderlib.")]
+    assert "renderlib.effects" in submodules
+    assert int(checked.group(1)) >= 2 + len(submodules), report
+
+
+def test_the_stubs_are_installed_as_the_typing_standard_asks():
+    site = pathlib.Path(renderlib.__file__).parent
+    assert (site / "py.typed").is_file()
+    assert (site / "__init__.pyi").is_file()
+    stub_only = pathlib.Path(_renderlib.__file__).parent / "_renderlib-stubs" / "__init__.pyi"
+    assert stub_only.is_file(), "the stub-only package goes beside the extension module"
+    for module in pkgutil.iter_modules(renderlib.__path__):
+        if module.name != "__main__":
+            assert (site / ("%s.pyi" % module.name)).is_file(), module.name
+
+
+def test_a_typed_host_checks_clean_and_runs(tmp_path):
+    result, errors = mypy(tmp_path, "typed_host", TYPED_HOST)
+    assert result.returncode == 0 and not errors, result.stdout + result.stderr
+
+    # The host is a working one: what was checked is what a host does.
+    namespace = {}
+    exec(compile(textwrap.dedent(TYPED_HOST), "typed_host", "exec"), namespace)
+    names = namespace["catalogue_names"](False)
+    assert "T_Gradient" in names and all(isinstance(name, str) for name in names)
+    assert namespace["catalogue_names"](True)
+    texts = namespace["parameter_texts"]("T_Blur")
+    assert texts and all(isinstance(text, str) for text in texts.values())
+    pixels = namespace["render_gradient"](16, 8)
+    assert len(pixels) == 16 * 8 * 4 and any(pixels)
+    messages = namespace["messages_of"]("T_NoSuchEffect")
+    assert any(m.startswith("%d: " % _renderlib.Err_Error) and "T_NoSuchEffect" in m for m in messages), messages
+
+
+def test_every_mistake_is_reported_and_fails_at_run_time(tmp_path):
+    start = textwrap.dedent(MISTAKES_START)
+    first_line = start.count("\n") + 1
+    source = start + "".join("%s\n" % statement for statement, _code, _error in MISTAKES)
+    result, errors = mypy(tmp_path, "mistakes", source)
+    expected = {(first_line + n, code) for n, (_statement, code, _error) in enumerate(MISTAKES)}
+    reported = {(line, code) for line, code, _message in errors}
+    missing = sorted(expected - reported)
+    assert not missing, "mypy let these through: %s\n%s" % (
+        [MISTAKES[line - first_line][0] for line, _code in missing], result.stdout)
+    # Nothing else: the correct start is not reported.
+    assert all(line >= first_line for line, _code, _message in errors), result.stdout
+
+    for statement, _code, error in MISTAKES:
+        namespace = {}
+        exec(start, namespace)
+        with pytest.raises(error):
+            exec(statement, namespace)
+
+
+def test_the_stubs_are_what_the_interface_gives_now():
+    result = run([sys.executable, REPO / "tools" / "make_stubs.py", "--check"], REPO, strip_preload=True)
+    assert result.returncode == 0, "run tools/make_stubs.py:\n" + result.stdout + result.stderr

@@ -50,6 +50,7 @@ static void renderlib_initialize_threads()
   }
 }
 
+%include "engine_dll_path.i"
 %include "conventions.i"
 %include "renderlib_typemaps.i"
 %include "abort_translation.i"

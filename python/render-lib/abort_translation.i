@@ -13,6 +13,17 @@
 // consequences of the same abort.
 static PyObject *failed_callback_exception = NULL;
 
+// Whether the interpreter is shutting down (then no thread state may be made
+// or dropped from a foreign thread).
+static bool interpreter_finalizing()
+{
+#if PY_VERSION_HEX >= 0x030D0000
+  return Py_IsFinalizing();
+#else
+  return _Py_IsFinalizing();
+#endif
+}
+
 // Takes the interpreter lock for a scope and gives it back on every path out,
 // an exception unwinding into the engine included.
 class GilHeld {

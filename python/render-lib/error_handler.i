@@ -33,6 +33,9 @@ static void forward_engine_message(int level, const char *message)
 {
   if (!installed_error_handler)
     return;
+  EngineCallbackEntry entry;
+  if (!entry.open())
+    return;  // the interpreter is ending: the message has nowhere to go
   PyGILState_STATE gil = PyGILState_Ensure();
   // Read again under the lock: the handler may have been removed meanwhile.
   if (installed_error_handler)

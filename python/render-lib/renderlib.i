@@ -54,6 +54,7 @@ static void renderlib_initialize_threads()
 %include "conventions.i"
 %include "renderlib_typemaps.i"
 %include "abort_translation.i"
+%include "callbacks/engine_threads.i"
 
 // Product identity and build configuration, fixed when the module is built.
 %{

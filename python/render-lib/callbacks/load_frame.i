@@ -60,17 +60,6 @@ static void *frame_pixels_for_engine(PyObject *pixels, const T_RasterInfo &info)
   return PyByteArray_AS_STRING(pixels);
 }
 
-// Whether the interpreter is shutting down (then no thread state may be made
-// or dropped from a foreign thread).
-static bool interpreter_finalizing()
-{
-#if PY_VERSION_HEX >= 0x030D0000
-  return Py_IsFinalizing();
-#else
-  return _Py_IsFinalizing();
-#endif
-}
-
 // An engine thread that makes frame requests keeps its Python thread state
 // from its first request until it ends: making and dropping one per request
 // would cost more than the request itself. Kept by holding one extra count
@@ -109,6 +98,9 @@ static thread_local EngineThreadState engine_thread_state;
 static void *load_frame_for_engine(void *render_state, int input, int frame, unsigned char,
                                    void *, void *, T_RasterInfo *out_info)
 {
+  EngineCallbackEntry entry;
+  if (!entry.open())
+    park_engine_thread();
   GilHeld gil;
   engine_thread_state.keep();
   LoadFrameInterface *loader = installed_frame_loader;

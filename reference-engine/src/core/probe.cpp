@@ -13,6 +13,7 @@
 #include <unistd.h>
 
 #include "core/abort.h"
+#include "core/thread_end.h"
 #include "core/entry.h"
 #include "core/messages.h"
 #include "core/probe_state.h"
@@ -150,7 +151,7 @@ double tarsel_probe_time_frame_requests(int count, int width, int height) {
       const auto start = std::chrono::steady_clock::now();
       for (int i = 0; i < count; ++i) fun(&state, 0, i, 0, nullptr, nullptr, &answer);
       seconds = std::chrono::duration<double>(std::chrono::steady_clock::now() - start).count();
-    } catch (...) {
+    } TARSEL_LET_THREAD_END catch (...) {
       seconds = -1.0;
     }
   });

@@ -7,6 +7,7 @@
 #include <thread>
 
 #include "core/abort.h"
+#include "core/thread_end.h"
 #include "core/entry.h"
 #include "render/kernels/kernel.h"
 #include "tarsel/errors.h"
@@ -93,7 +94,7 @@ std::shared_ptr<const WorkImage> FrameRequests::request(int input, int frame, un
   const std::function<void()> work = [&] {
     try {
       pixels = fun_(&state_, input, frame, flag, instance_, const_cast<Genotype *>(&genotype_), &info);
-    } catch (...) {
+    } TARSEL_LET_THREAD_END catch (...) {
       threw = true;
     }
   };

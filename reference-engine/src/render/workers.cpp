@@ -11,6 +11,7 @@
 #include <vector>
 
 #include "core/abort.h"
+#include "core/thread_end.h"
 
 namespace tarsel_ref {
 namespace {
@@ -34,7 +35,7 @@ struct Job {
       if (failed.load(std::memory_order_relaxed)) continue;
       try {
         (*task)(i);
-      } catch (...) {
+      } TARSEL_LET_THREAD_END catch (...) {
         std::lock_guard<std::mutex> lock(error_mutex);
         if (!error) error = std::current_exception();
         failed.store(true);
@@ -132,8 +133,10 @@ struct PoolHolder {
 };
 
 PoolHolder &holder() {
-  static PoolHolder instance;
-  return instance;
+  // Never destroyed: at process exit a render may still hold pool threads
+  // (one waiting on a host that is gone), and joining them would never end.
+  static PoolHolder *instance = new PoolHolder;
+  return *instance;
 }
 
 std::shared_ptr<Pool> acquire_pool() {

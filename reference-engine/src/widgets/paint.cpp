@@ -5,10 +5,7 @@
 // is asked of the host, and the entry point leaves with TarselAbortException.
 #include <cmath>
 
-#if defined(__GLIBCXX__)
-#include <cxxabi.h>
-#endif
-
+#include "core/thread_end.h"
 #include "tarsel/errors.h"
 #include "widgets/widgets.h"
 
@@ -54,11 +51,7 @@ private:
   static void guard(Call call) {
     try {
       call();
-#if defined(__GLIBCXX__)
-    } catch (abi::__forced_unwind &) {
-      throw;  // a thread being cancelled must keep unwinding
-#endif
-    } catch (...) {
+    } TARSEL_LET_THREAD_END catch (...) {
       throw TarselAbortException();
     }
   }

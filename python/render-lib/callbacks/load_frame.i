@@ -76,8 +76,11 @@ public:
   }
   ~EngineThreadState()
   {
-    if (!kept_ || !Py_IsInitialized() || interpreter_finalizing())
+    if (!kept_ || !Py_IsInitialized())
       return;
+    EngineCallbackEntry entry;
+    if (!entry.open())
+      return;  // the interpreter is ending: the state goes with it
     PyGILState_STATE taken = PyGILState_Ensure();
     PyGILState_Release(state_);  // the kept count; the lock stays
     PyGILState_Release(taken);   // the last count: the state goes, the lock with it

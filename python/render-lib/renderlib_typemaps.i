@@ -13,6 +13,10 @@
 // |                        | buffer                              | on every path                          |
 // | (TYPEMAP, SIZE)        | none: the caller's buffer           | nobody; the view is released at once   |
 // | ByteCount32            | an output on the wrapper's stack    | nothing to free                        |
+// | ZeroedOutput           | an output on the wrapper's stack    | nothing to free                        |
+// | RequiredRecord,        | none: refuses None                  | nothing to free                        |
+// | RequiredText           |                                     |                                        |
+// | %vector_element_access | none: refuses an empty vector       | nothing to free                        |
 // | CharValueResult        | none: points into a static table    | nothing to free                        |
 // | RasterImageBytes       | the UTF-8 copy of the str           | the wrapper, on every path             |
 // | WidgetResult           | the engine's result, by value       | the wrapper, after conversion          |
@@ -162,6 +166,47 @@
 %typemap(in, numinputs=0) size_t *ByteCount32 (size_t count = 0) "$1 = &count;"
 %typemap(argout) size_t *ByteCount32 {
   $result = SWIG_Python_AppendOutput($result, SWIG_From_int((int)(uint32_t)*$1));
+}
+
+// T_RasterInfo *RequiredRecord, char const *RequiredText
+// An argument the function reads or writes through without a null check of
+// its own: None is refused the way a null reference is, instead of crashing.
+%typemap(check, noblock=1) T_RasterInfo *RequiredRecord, char const *RequiredText {
+  if (!$1)
+    SWIG_exception_fail(SWIG_ValueError, "invalid null reference in method '$symname', argument $argnum of type '$1_type'");
+}
+
+// std::vector<TYPE> *self (%vector_element_access(TYPE))
+// The vector a container method is called on. front, back and pop_back of an
+// empty vector would read or shrink past its storage: they raise IndexError.
+%{
+static bool vector_method_needs_element(const char *symname)
+{
+  const char *ends[] = {"_front", "_back", "_pop_back"};
+  const size_t length = std::strlen(symname);
+  for (const char *end : ends) {
+    const size_t size = std::strlen(end);
+    if (length >= size && std::strcmp(symname + length - size, end) == 0)
+      return true;
+  }
+  return false;
+}
+%}
+%define %vector_element_access(TYPE)
+%typemap(check, noblock=1) std::vector< TYPE > *self, std::vector< TYPE > const *self {
+  if (!$1)
+    SWIG_exception_fail(SWIG_ValueError, "invalid null reference in method '$symname', argument $argnum of type '$1_type'");
+  if ($1->empty() && vector_method_needs_element("$symname"))
+    SWIG_exception_fail(SWIG_IndexError, "in method '$symname': the vector is empty");
+}
+%enddef
+
+// int *ZeroedOutput
+// An int output appended to the result, starting at 0: an engine that fails
+// without writing it gives 0, never whatever the wrapper's stack held.
+%typemap(in, numinputs=0) int *ZeroedOutput (int value = 0) "$1 = &value;"
+%typemap(argout) int *ZeroedOutput {
+  $result = SWIG_Python_AppendOutput($result, SWIG_From_int(*$1));
 }
 
 // uchar_t CharValueResult

@@ -44,3 +44,13 @@ def test_value_map_rules():
     del values["radius"]
     with pytest.raises(IndexError, match="^key not found$"):
         del values["radius"]
+
+
+@pytest.mark.parametrize("vector", [renderlib.bool_vector, renderlib.string_vector, renderlib.float_vector,
+                                    renderlib.genotype_vector, renderlib.param_vector])
+def test_an_empty_vector_has_no_front_back_or_last_element_to_pop(vector):
+    empty = vector()
+    for method in ("front", "back", "pop_back"):
+        with pytest.raises(IndexError, match="in method '%s_%s': the vector is empty" % (vector.__name__, method)):
+            getattr(empty, method)()
+    assert len(empty) == 0

@@ -80,3 +80,9 @@ def test_a_lens_flare_draws_and_a_texture_element_uses_the_store(store, instance
     ok, with_texture = render_flare(textured)
     _renderlib.free_tarsel_effect(textured)
     assert ok and with_texture != plain and any(with_texture)
+
+
+def test_a_missing_texture_reports_zero_sizes():
+    _renderlib.tarsel_free_all_flare_textures()
+    status, *sizes = _renderlib.tarsel_get_texture_info(12345)
+    assert status != 0 and sizes == [0, 0, 0, 0, 0]

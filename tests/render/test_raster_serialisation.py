@@ -95,3 +95,15 @@ def test_the_decoder_writes_into_the_callers_bytes(shared_registry):
     assert untouched == bytearray(b"\xee" * 4)  # a length of 0 touches nothing
     with pytest.raises(TypeError, match=r"^in method 'base64decode', argument 2 of type 'uchar_t \*'$"):
         _renderlib.base64decode("QUJD", dest, 4)
+
+
+@pytest.mark.parametrize("call, position, ctype", [
+    (lambda: _renderlib.make_tarsel_raster_info_from_base64(None, "AAAA"), 1, "T_RasterInfo *"),
+    (lambda: _renderlib.make_tarsel_raster_info_from_base64(renderlib.T_RasterInfo(), None), 2, "char const *"),
+    (lambda: _renderlib.make_tarsel_raster_info_from_bits(None, "A" * 104), 1, "T_RasterInfo *"),
+    (lambda: _renderlib.raster_info_to_bytearray(None), 1, "T_RasterInfo *"),
+])
+def test_none_for_a_record_or_text_is_refused(call, position, ctype):
+    with pytest.raises(ValueError, match=r"^invalid null reference in method '\w+', argument %d of type '%s'$"
+                       % (position, ctype.replace("*", r"\*"))):
+        call()

@@ -9,6 +9,12 @@
 class Genotype;
 class Param;
 
+%vector_element_access(bool)
+%vector_element_access(std::string)
+%vector_element_access(float)
+%vector_element_access(Genotype *)
+%vector_element_access(Param *)
+
 %template(bool_vector) std::vector<bool>;
 %template(string_vector) std::vector<std::string>;
 %template(float_vector) std::vector<float>;

@@ -13,7 +13,7 @@ const char *tarsel_get_flare_texture_error();
 int tarsel_register_flare_texture(int xsize, int ysize, int n_channels, int bytes_per_channel, RawImage pixels);
 
 // [result, xsize, ysize, n_channels, bytes_per_channel, n_bytes]
-%apply int *OUTPUT { int *xsize, int *ysize, int *n_channels, int *bytes_per_channel };
+%apply int *ZeroedOutput { int *xsize, int *ysize, int *n_channels, int *bytes_per_channel };
 %apply size_t *ByteCount32 { size_t *n_bytes };
 int tarsel_get_texture_info(int index, int *xsize, int *ysize, int *n_channels, int *bytes_per_channel,
                             size_t *n_bytes);

@@ -88,10 +88,15 @@ static PyObject *raster_info_to_bytearray(T_RasterInfo *info)
 %}
 
 %apply char const *RasterImageBytes { char const *bits };
+%apply T_RasterInfo *RequiredRecord { T_RasterInfo *info };
+%apply char const *RequiredText { char const *text };
 
 void make_tarsel_raster_info_from_bits(T_RasterInfo *info, char const *bits);
 PyObject *raster_info_to_bytearray(T_RasterInfo *info);
 void make_tarsel_raster_info_from_base64(T_RasterInfo *info, char const *text);
+%clear char const *text;
 void base64decode(char const *text, uchar_t *dest, int length);
 %apply uchar_t CharValueResult { uchar_t DEC };
 uchar_t DEC(uchar_t c);
+%clear T_RasterInfo *info;
+

@@ -14,8 +14,6 @@
 # renders), segment (C++). Name some to run only those.
 #
 # FUZZ_JOBS=N runs N targets at once (default 1), at low priority.
-# RENDERLIB_FUZZ_KNOWN_FAULTS=1 adds the inputs that reach faults already
-# reported (tests/fuzz/reproducers/); those runs end in a crash.
 # Each run keeps its corpus in build-fuzz/corpus/TARGET (seeded from
 # tests/fuzz/corpus/TARGET), its log in build-fuzz/logs/TARGET.log, the
 # functions it covered in build-fuzz/logs/TARGET.coverage and any crashing

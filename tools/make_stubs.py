@@ -31,7 +31,8 @@ Type rules, as the wrapper behaves:
   displays and images); a char * argument takes a str or None.
 - A pointer result is None when the engine returns null, so it is Optional,
   except where the wrapper cannot make a null (the address of a member, a new
-  object, SWIG's container helpers and iterators).
+  object, SWIG's container helpers and iterators, an allocator or process id
+  the module keeps).
 - A char * result is str or None; char arrays and std::string are str.
 - bool arguments take True and False only; integer arguments take int only;
   float arguments take int or float.
@@ -543,6 +544,10 @@ class Wrapper:
             return "SwigPyIterator[%s]" % self.iterated(ctype, name)
         if line.startswith("resultobj = SWIG_NewPointerObj(byte_value(result)"):
             return "_p_uchar_t"  # CharValueResult: a pointer into the module's table
+        kept = re.match(r"resultobj = SWIG_NewPointerObj\((?:interned_process_id\(result\)|&shared_allocator), "
+                        r"SWIGTYPE_(p_\w+), 0\);", line)
+        if kept:
+            return self.class_of(kept.group(1))  # the module's own copy: never null
         pointer = re.match(r"resultobj = SWIG_NewPointerObj\((.*), SWIGTYPE_(p_\w+|\w+),\s*(.*)\);", line)
         if pointer is None:
             pointer = re.match(r"resultobj = SWIG_NewPointerObj\((.*), (swig::SwigPyIterator::descriptor\(\)),\s*(.*)\);",

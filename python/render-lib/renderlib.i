@@ -117,6 +117,7 @@ static void renderlib_initialize_threads()
 // constants and classes at import.
 %include "std_except.i"
 %include "std_string.i"
+%include "model/container_iterators.i"
 %include "std_vector.i"
 %include "std_map.i"
 %include "callbacks/load_frame.i"

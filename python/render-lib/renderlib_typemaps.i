@@ -9,15 +9,19 @@
 // | RawImage               | none: the caller's buffer, by       | nobody; the view is released at once   |
 // |                        | address                             |                                        |
 // | RasterInfoList         | the array of descriptor pointers    | the wrapper, on every path             |
-// | RawImageList           | the address array and one view per  | the wrapper: views after the call,     |
-// |                        | buffer                              | on every path                          |
+// |                        | and a snapshot of the list          |                                        |
+// | RawImageList           | the address array, one view per     | the wrapper: views after the call,     |
+// |                        | buffer and a snapshot of the list   | on every path                          |
 // | (TYPEMAP, SIZE)        | none: the caller's buffer           | nobody; the view is released at once   |
 // | ByteCount32            | an output on the wrapper's stack    | nothing to free                        |
 // | ZeroedOutput           | an output on the wrapper's stack    | nothing to free                        |
 // | RequiredRecord,        | none: refuses None                  | nothing to free                        |
-// | RequiredText           |                                     |                                        |
+// | RequiredText,          |                                     |                                        |
+// | DecodeText/Dest/Length |                                     |                                        |
 // | %vector_element_access | none: refuses an empty vector       | nothing to free                        |
 // | CharValueResult        | none: points into a static table    | nothing to free                        |
+// | InternedProcessId      | one pid_t per distinct value        | nobody: kept for the process's life    |
+// | get_allocator          | none: one static allocator per type | nothing to free                        |
 // | RasterImageBytes       | the UTF-8 copy of the str           | the wrapper, on every path             |
 // | WidgetResult           | the engine's result, by value       | the wrapper, after conversion          |
 // | NameList               | the library's array of names        | the library; the module frees nothing  |
@@ -79,22 +83,62 @@
   }
 }
 
+%{
+// A copy of a list argument's items, each referenced, so that Python code run
+// while the items convert (a property, a buffer export) can neither shorten
+// the list under the conversion nor free an item the engine is given.
+static PyObject *list_argument_snapshot(PyObject *input)
+{
+  return PyList_GetSlice(input, 0, PY_SSIZE_T_MAX);
+}
+
+// The wrapped pointer object at the end of `item`'s chain of `this`
+// attributes (a new reference), or null if there is none within a few steps.
+// SWIG's own conversion follows the chain without end, so an object naming
+// itself as its `this` would never come back, and it lets go of an
+// attribute's value before using it.
+static PyObject *wrapped_this(PyObject *item)
+{
+  PyObject *object = item;
+  Py_INCREF(object);
+  for (int step = 0; step < 8 && object; ++step) {
+    if (SwigPyObject_Check(object))
+      return object;
+    PyObject *next = PyObject_GetAttr(object, SWIG_This());
+    if (!next)
+      PyErr_Clear();
+    Py_DECREF(object);
+    object = next;
+  }
+  Py_XDECREF(object);
+  return NULL;
+}
+%}
+
 // T_RasterInfo **RasterInfoList
 // A list (or list subclass) of T_RasterInfo proxies and None, passed as an
 // array of record pointers (null for None); an empty list passes a null
 // array. Items are recognised by their class name "T_RasterInfo", not by
-// inheritance.
-%typemap(in) T_RasterInfo **RasterInfoList (std::vector<T_RasterInfo *> rasters) {
+// inheritance. The items are held (a snapshot of the list) until the call
+// has returned.
+%typemap(in) T_RasterInfo **RasterInfoList (std::vector<T_RasterInfo *> rasters, PyObject *held = NULL) {
   if (!PyList_Check($input)) {
     PyErr_SetString(PyExc_TypeError, "in $symname, arg $argnum of type T_RasterInfo **: expected list.");
     SWIG_fail;
   }
-  rasters.resize((size_t)PyList_GET_SIZE($input));
+  held = list_argument_snapshot($input);
+  if (!held)
+    SWIG_fail;
+  rasters.resize((size_t)PyList_GET_SIZE(held));
   for (size_t i = 0; i < rasters.size(); ++i) {
-    PyObject *item = PyList_GET_ITEM($input, (Py_ssize_t)i);
+    PyObject *item = PyList_GET_ITEM(held, (Py_ssize_t)i);
     if (std::strcmp(Py_TYPE(item)->tp_name, "T_RasterInfo") == 0) {
       void *pointer = 0;
-      int res = SWIG_ConvertPtr(item, &pointer, $*1_descriptor, 0);
+      PyObject *wrapped = wrapped_this(item);
+      int res = wrapped ? SWIG_ConvertPtr(wrapped, &pointer, $*1_descriptor, 0) : SWIG_ERROR;
+      if (wrapped && PyList_Append(held, wrapped) != 0)  // held too: a `this` made on the spot
+        res = SWIG_ERROR;
+      Py_XDECREF(wrapped);
       if (!SWIG_IsOK(res))
         SWIG_exception_fail(SWIG_ArgError(res), "in method '$symname', argument $argnum of type 'T_RasterInfo **': cannot convert to T_RasterInfo");
       rasters[i] = static_cast<T_RasterInfo *>(pointer);
@@ -107,22 +151,28 @@
   }
   $1 = rasters.empty() ? NULL : rasters.data();
 }
+%typemap(freearg) T_RasterInfo **RasterInfoList {
+  Py_XDECREF(held$argnum);
+}
 
 // RawImage *RawImageList
 // A list of writable buffer exporters and None, passed as an array of start
 // addresses (null for None); an empty list passes a null array. Unlike a
 // single RawImage, each view (PyBUF_WRITABLE) is held until the engine call
 // has returned, so these buffers cannot be resized meanwhile.
-%typemap(in) RawImage *RawImageList (std::vector<void *> addresses, std::vector<Py_buffer> views) {
+%typemap(in) RawImage *RawImageList (std::vector<void *> addresses, std::vector<Py_buffer> views, PyObject *held = NULL) {
   if (!PyList_Check($input)) {
     PyErr_SetString(PyExc_TypeError, "in $symname, arg $argnum of type RawImage *: expected list.");
     SWIG_fail;
   }
-  const Py_ssize_t count = PyList_GET_SIZE($input);
+  held = list_argument_snapshot($input);
+  if (!held)
+    SWIG_fail;
+  const Py_ssize_t count = PyList_GET_SIZE(held);
   addresses.assign((size_t)count, NULL);
   views.reserve((size_t)count);
   for (Py_ssize_t i = 0; i < count; ++i) {
-    PyObject *item = PyList_GET_ITEM($input, i);
+    PyObject *item = PyList_GET_ITEM(held, i);
     if (PyObject_CheckBuffer(item)) {
       Py_buffer view;
       if (PyObject_GetBuffer(item, &view, PyBUF_WRITABLE) != 0) {
@@ -143,7 +193,20 @@
   for (size_t i = 0; i < views$argnum.size(); ++i)
     PyBuffer_Release(&views$argnum[i]);
   views$argnum.clear();
+  Py_XDECREF(held$argnum);
 }
+
+// int n_rasters (%render_list_count(RASTERS, IMAGES))
+// The number of entries the engine reads from each of the two lists (the
+// arguments numbered RASTERS and IMAGES); more than a non-empty list holds
+// would have it read past the list's array.
+%define %render_list_count(RASTERS, IMAGES)
+%typemap(check, noblock=1) int n_rasters {
+  if ($1 > 0 && ((!rasters##RASTERS.empty() && (size_t)$1 > rasters##RASTERS.size()) ||
+                 (!addresses##IMAGES.empty() && (size_t)$1 > addresses##IMAGES.size())))
+    SWIG_exception_fail(SWIG_ValueError, "in method '$symname', argument $argnum of type 'int': more entries than the rasters or images list holds");
+}
+%enddef
 
 // (void *BufferAddress, size_t BufferSize)
 // Any object with a buffer, by address and length, as the read-only buffer
@@ -174,6 +237,19 @@
 %typemap(check, noblock=1) T_RasterInfo *RequiredRecord, char const *RequiredText {
   if (!$1)
     SWIG_exception_fail(SWIG_ValueError, "invalid null reference in method '$symname', argument $argnum of type '$1_type'");
+}
+
+// (char const *DecodeText, uchar_t *DecodeDest, int DecodeLength)
+// A decode of `length` bytes reads the text and writes the destination, so
+// both must be there unless the length is 0 (which touches neither); a
+// negative length would zero (size_t)length bytes.
+%typemap(check, noblock=1) (char const *DecodeText, uchar_t *DecodeDest, int DecodeLength) {
+  if ($3 < 0)
+    SWIG_exception_fail(SWIG_ValueError, "in method '$symname', argument 3 of type 'int' must not be negative");
+  if ($3 > 0 && !$1)
+    SWIG_exception_fail(SWIG_ValueError, "invalid null reference in method '$symname', argument 1 of type 'char const *'");
+  if ($3 > 0 && !$2)
+    SWIG_exception_fail(SWIG_ValueError, "invalid null reference in method '$symname', argument 2 of type 'uchar_t *'");
 }
 
 // std::vector<TYPE> *self (%vector_element_access(TYPE))
@@ -213,6 +289,35 @@ static bool vector_method_needs_element(const char *symname)
 // A byte value returned as a uchar_t pointer proxy into a static table of the
 // 256 values (byte_value), so that no result ever needs freeing.
 %typemap(out) uchar_t CharValueResult "$result = SWIG_NewPointerObj(byte_value($1), $&1_descriptor, 0);"
+
+// pid_t InternedProcessId
+// A process identifier returned as an opaque pid_t pointer proxy. SWIG would
+// give the proxy a new pid_t to own, which it cannot free (pid_t has no
+// destructor); instead each distinct value is kept once by the module for the
+// life of the process and the proxy points at that copy, owning nothing.
+%{
+#include <map>
+#include <memory>
+static pid_t *interned_process_id(pid_t pid)
+{
+  // Never destroyed: a proxy may outlive the module's static destructors.
+  static auto *ids = new std::map<pid_t, std::unique_ptr<pid_t>>;
+  std::unique_ptr<pid_t> &id = (*ids)[pid];
+  if (!id)
+    id.reset(new pid_t(pid));
+  return id.get();
+}
+%}
+%typemap(out) pid_t InternedProcessId "$result = SWIG_NewPointerObj(interned_process_id($1), $&1_descriptor, 0);"
+
+// SWIGTYPE get_allocator
+// A container's allocator. std::allocator has no state, so one shared
+// instance per container type stands for every one of them and the proxy
+// owns nothing; SWIG would hand it a new allocator it has no destructor for.
+%typemap(out, noblock=1) SWIGTYPE get_allocator {
+  static $1_ltype shared_allocator;
+  $result = SWIG_NewPointerObj(&shared_allocator, $&1_descriptor, 0);
+}
 
 // char const *RasterImageBytes
 // The 104-byte image of a raster descriptor, by the text rule of every

@@ -977,8 +977,8 @@ def shared_memory(call, helpers, tmp_path):
 
 @family
 def server_process_id(call, helpers, tmp_path):
-    # The one transport wrapper that hands out an owned pointer of a type
-    # SWIG knows no destructor for.
+    # An opaque pid_t pointer: SWIG would hand out a new pid_t it has no
+    # destructor for; the module's interned copy is owned by nobody.
     name = text("rlleak-%d-pid" % os.getpid())
     server = _renderlib.ShmemManager_serve(name, 1 << 16, 1 << 16)
 
@@ -1237,8 +1237,8 @@ def containers(call, helpers, tmp_path):
 
 @family
 def container_allocators(call, helpers, tmp_path):
-    # SWIG's get_allocator hands out a new allocator in an owning pointer
-    # object of a type it knows no destructor for.
+    # SWIG would hand out a new allocator it has no destructor for; the
+    # module's shared one is owned by nobody.
     kinds = ["bool_vector", "float_vector", "string_vector", "genotype_vector", "param_vector", "value_map"]
     containers = [getattr(renderlib, kind)() for kind in kinds]
 
@@ -1252,8 +1252,7 @@ def container_allocators(call, helpers, tmp_path):
 
 @family
 def parameters_as_json(call, helpers, tmp_path):
-    # The engine's cJSON tree comes back as a pointer nobody owns, and
-    # nothing in the module frees it.
+    # Each Param keeps only its latest cJSON tree: the one before is freed.
     effect = call("init_tarsel_effect", text("T_Glow"), False)
     param = effect.effect_genotype._get_params()[1]
 
@@ -1268,11 +1267,14 @@ def parameters_as_json(call, helpers, tmp_path):
 
 @family
 def iterator_minus_a_number(call, helpers, tmp_path):
-    # `iterator - n` makes a new iterator that no pointer object owns.
+    # `iterator - n` and `iterator + n` past either end make a copy and then
+    # stop: the copy is freed.
     vector = renderlib.float_vector([1.0, 2.0, 3.0])
 
     def step():
         call("SwigPyIterator___sub__", vector.end(), 1)
+        call("SwigPyIterator___sub__", vector.begin(), 1)
+        call("SwigPyIterator___add__", vector.begin(), 5)
 
     return step, [vector], nothing
 
@@ -1280,7 +1282,7 @@ def iterator_minus_a_number(call, helpers, tmp_path):
 @family
 def sequences_refused_midway(call, helpers, tmp_path):
     # A list whose first element converts and a later one does not: the
-    # std::vector SWIG made for the conversion is not freed when it gives up.
+    # container made for the conversion is freed when it gives up.
     flare = call("init_tarsel_effect", text("T_LensFlare"), False)
     empty, key = text(""), text("radius")
     view = (96, 54, 0.0, 0.0, 0.5, 0.5)
@@ -1294,6 +1296,7 @@ def sequences_refused_midway(call, helpers, tmp_path):
         call.fails(TypeError, "tarsel_widget_draw", flare, empty, *view, floats)
         call.fails(TypeError, "tarsel_widget_mouse_event", flare, empty, *view, floats, 10, 10, 0)
         call.fails(TypeError, "value_map___setitem__", mapping, key, floats)
+        call.fails(TypeError, "new_value_map", {"radius": [1.0], "size": floats})
         for kind, elements in lists.items():
             call.fails(TypeError, "new_" + kind, elements)
 
@@ -1432,27 +1435,8 @@ def quiet_engine():
     _renderlib.set_error_handler(None)
 
 
-KNOWN_LEAKS = {
-    "parameters_as_json": "Param_to_json returns the engine's new cJSON tree as a pointer nobody owns or frees",
-    "iterator_minus_a_number": "SwigPyIterator___sub__(iterator, n) returns a new iterator without handing it to "
-                               "its pointer object",
-    "sequences_refused_midway": "a std::vector argument converted from a list leaks the vector SWIG allocated when a "
-                                "later element fails to convert",
-    "container_allocators": "the containers' get_allocator returns a new allocator that its owning pointer object "
-                            "never frees (SWIG reports 'no destructor found' as it drops it)",
-    "server_process_id": "ShmemTransport_get_server_pid returns a new pid_t that its owning pointer object never "
-                         "frees (SWIG reports 'no destructor found' as it drops it)",
-}
-
-
 @pytest.mark.parametrize("name", sorted(FAMILIES))
 def test_a_family_of_wrappers_leaks_nothing(name, shared_registry, tmp_path):
-    if name in KNOWN_LEAKS and MEASURE_MEMORY:
-        # Everything else about the family holds; once the leak is fixed,
-        # this fails until the family leaves KNOWN_LEAKS.
-        with pytest.raises(AssertionError, match="the C heap grew"):
-            check_flat(name, FAMILIES[name], shared_registry, tmp_path)
-        pytest.xfail(KNOWN_LEAKS[name])
     check_flat(name, FAMILIES[name], shared_registry, tmp_path)
 
 

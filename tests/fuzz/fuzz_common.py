@@ -21,9 +21,6 @@ TESTS_DIR = FUZZ_DIR.parent
 if str(TESTS_DIR) not in sys.path:
     sys.path.insert(0, str(TESTS_DIR))
 
-# Inputs that reach faults already reported (see tests/fuzz/reproducers/) are
-# left out unless this is set, so that a long run explores everything else.
-KNOWN_FAULTS = os.environ.get("RENDERLIB_FUZZ_KNOWN_FAULTS") == "1"
 
 
 class ByteReader:

@@ -7,10 +7,9 @@ generated inputs, each checked as in a long run), the C++ target built with
 g++ under AddressSanitizer and UndefinedBehaviorSanitizer with a replaying
 main. tools/fuzz.sh does the long, coverage-guided runs.
 
-The faults the fuzzing found and reported are reproduced by
-reproducers/reproduce.py; they are expected to fail until fixed (strict: a
-fixed one fails here until its mark is removed and the fuzz targets take
-those inputs again)."""
+The faults the fuzzing found are replayed one by one by
+reproducers/reproduce.py, each in a process of its own, since before their
+fixes they crashed or hung."""
 import os
 import pathlib
 import re
@@ -20,7 +19,6 @@ import sys
 import pytest
 
 from native_build import REPO, run
-from process_memory import UNDER_ADDRESS_SANITIZER
 
 FUZZ = pathlib.Path(__file__).resolve().parent
 CORPUS = FUZZ / "corpus"
@@ -28,7 +26,7 @@ SEED = int(os.environ.get("RENDERLIB_FUZZ_SEED", "1"))
 
 
 def target_environment(helpers=None):
-    env = {k: v for k, v in os.environ.items() if k != "RENDERLIB_FUZZ_KNOWN_FAULTS"}
+    env = dict(os.environ)
     if helpers:
         env["RENDERLIB_FUZZ_HELPERS"] = str(helpers)
     return env
@@ -73,16 +71,16 @@ def test_segment(tmp_path):
     check_replay([str(binary)], "segment", 20000, env, timeout=120)
 
 
-# Reproducers that fail the same way with or without a sanitizer, and those
-# only a sanitizer shows (the sanitizer run of tools/sanitize.sh).
-REPORTED = ["decode_dest_none", "decode_text_none", "decode_negative_length", "render_list_cleared", "render_this_loop"]
-SANITIZER_SHOWS = ["render_list_replaced", "render_count_past_lists", "echo_frame_overflow"]
+# Each fault that once crashed, hung or went wrong quietly; the sanitizer run
+# (tools/sanitize.sh) shows the quiet ones if they come back.
+FOUND = ["decode_dest_none", "decode_text_none", "decode_negative_length", "render_list_cleared", "render_this_loop",
+         "render_list_replaced", "render_count_past_lists", "echo_frame_overflow", "time_blur_frame_overflow"]
 
 
-@pytest.mark.xfail(strict=True, reason="a reported fault of the module or engine, not fixed yet")
-@pytest.mark.parametrize("case", REPORTED + (SANITIZER_SHOWS if UNDER_ADDRESS_SANITIZER else []))
-def test_reported_fault(case, shared_registry):
+@pytest.mark.parametrize("case", FOUND)
+def test_found_fault_stays_fixed(case, shared_registry):
     env = target_environment(pathlib.Path(shared_registry.__file__).parent)
     result = subprocess.run([sys.executable, str(FUZZ / "reproducers" / "reproduce.py"), case], env=env,
-                            capture_output=True, text=True, timeout=10 if case == "render_this_loop" else 60)
-    assert result.returncode == 0 and not re.search(r"ERROR: \w+Sanitizer|runtime error:", result.stderr), result.stderr[-4000:]
+                            capture_output=True, text=True, timeout=60)
+    assert result.returncode == 0 and not re.search(r"ERROR: \w+Sanitizer|runtime error:", result.stderr), \
+        result.stdout[-2000:] + result.stderr[-4000:]

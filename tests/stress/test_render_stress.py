@@ -11,7 +11,6 @@ import threading
 import time
 
 import numpy
-import pytest
 
 import _renderlib
 import renderlib

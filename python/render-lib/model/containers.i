@@ -9,6 +9,53 @@
 class Genotype;
 class Param;
 
+// SWIG converts a Python sequence (a list, a dict's items) into a new
+// container element by element, and drops that container when a later
+// element fails to convert. These specialisations of its conversion do the
+// same and free it, for the vectors and the map below.
+%fragment("ContainerConversionFreesOnFailure", "header", fragment="StdSequenceTraits") %{
+#include <memory>
+namespace swig {
+template <class Seq, class T>
+struct container_from_sequence {
+  static int asptr(PyObject *obj, Seq **seq) {
+    if (obj == Py_None || SWIG_Python_GetSwigThis(obj)) {
+      Seq *p;
+      swig_type_info *descriptor = swig::type_info<Seq>();
+      if (descriptor && SWIG_IsOK(::SWIG_ConvertPtr(obj, (void **)&p, descriptor, 0))) {
+        if (seq)
+          *seq = p;
+        return SWIG_OLDOBJ;
+      }
+    } else if (PySequence_Check(obj)) {
+      try {
+        SwigPySequence_Cont<T> items(obj);
+        if (!seq)
+          return items.check() ? SWIG_OK : SWIG_ERROR;
+        std::unique_ptr<Seq> made(new Seq());
+        assign(items, made.get());
+        *seq = made.release();
+        return SWIG_NEWOBJ;
+      } catch (std::exception &e) {
+        if (seq && !PyErr_Occurred())
+          PyErr_SetString(PyExc_TypeError, e.what());
+        return SWIG_ERROR;
+      }
+    }
+    return SWIG_ERROR;
+  }
+};
+
+template <class T, class A>
+struct traits_asptr_stdseq<std::vector<T, A>, T> : container_from_sequence<std::vector<T, A>, T> {};
+
+template <class K, class T, class C, class A>
+struct traits_asptr_stdseq<std::map<K, T, C, A>, std::pair<K, T> >
+    : container_from_sequence<std::map<K, T, C, A>, std::pair<K, T> > {};
+}
+%}
+%fragment("ContainerConversionFreesOnFailure");
+
 %vector_element_access(bool)
 %vector_element_access(std::string)
 %vector_element_access(float)

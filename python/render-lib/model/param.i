@@ -3,10 +3,53 @@
 // effect descriptor belongs to the engine and lives as long as that descriptor.
 
 %{
+#include <map>
 #include <string>
 #include <vector>
+#ifdef _WIN32
+#include <windows.h>
+#else
+#include <dlfcn.h>
+#endif
+#include "tarsel/effect.h"
 #include "tarsel/param.h"
 #include "tarsel/param_queries.h"
+
+// The engine's own cJSON_Delete, so that a tree goes back to the allocator it
+// came from: an export of the engine library or, on POSIX, of a library it
+// depends on. Null when there is none.
+typedef void (*DeleteJson)(cJSON *);
+static DeleteJson engine_delete_json()
+{
+#ifdef _WIN32
+  HMODULE engine = GetModuleHandleA("tarsel_ps.dll");
+  return engine ? reinterpret_cast<DeleteJson>(GetProcAddress(engine, "cJSON_Delete")) : NULL;
+#else
+  Dl_info where;
+  if (!dladdr(reinterpret_cast<void *>(&init_tarsel_effect), &where) || !where.dli_fname)
+    return NULL;
+  void *engine = dlopen(where.dli_fname, RTLD_LAZY | RTLD_NOLOAD);
+  if (!engine)
+    return NULL;
+  DeleteJson found = reinterpret_cast<DeleteJson>(dlsym(engine, "cJSON_Delete"));
+  dlclose(engine);
+  return found;
+#endif
+}
+
+// A to_json tree belongs to its Param until that Param's next to_json, as a
+// to_string text does: the module keeps each Param's latest tree and frees
+// the one before. Without an engine cJSON_Delete the trees are left alone.
+static cJSON *keep_latest_json(Param *param, cJSON *tree)
+{
+  static const DeleteJson delete_json = engine_delete_json();
+  static auto *latest = new std::map<Param *, cJSON *>;  // never destroyed: its trees live to the end
+  cJSON *&kept = (*latest)[param];
+  if (kept && kept != tree && delete_json)
+    delete_json(kept);
+  kept = tree;
+  return tree;
+}
 
 // A parameter is a point when it shows two channels in one of the screen
 // modes that place it in the image; screen_mode_screen_center0 deliberately
@@ -61,6 +104,9 @@ static PyObject *bound_or_none(float bound, float no_limit)
 enum const_format_tag {};
 
 %apply char *EngineHeapText { char *name };
+
+// The tree handed out is the one the Param now keeps (arg1 is the Param).
+%typemap(out) cJSON *to_json "$result = SWIG_NewPointerObj(keep_latest_json(arg1, $1), $1_descriptor, 0);"
 
 class Param {
 public:

@@ -95,6 +95,7 @@ void make_tarsel_raster_info_from_bits(T_RasterInfo *info, char const *bits);
 PyObject *raster_info_to_bytearray(T_RasterInfo *info);
 void make_tarsel_raster_info_from_base64(T_RasterInfo *info, char const *text);
 %clear char const *text;
+%apply (char const *DecodeText, uchar_t *DecodeDest, int DecodeLength) { (char const *text, uchar_t *dest, int length) };
 void base64decode(char const *text, uchar_t *dest, int length);
 %apply uchar_t CharValueResult { uchar_t DEC };
 uchar_t DEC(uchar_t c);

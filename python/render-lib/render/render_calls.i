@@ -16,6 +16,7 @@ typedef void *RawImage;
 %threadallow render_tarsel_lensflare_to_native_image;
 
 // The engine answers non-zero for a rendered frame.
+%render_list_count(8, 9)
 bool render_tarsel_effect_to_native_image(EffectGlobals_t *instance, char const *descriptor, RawImage dest,
                                           int frame, int field, int downsample, int quality,
                                           T_RasterInfo **rasters, RawImage *images, float mix, int n_rasters,
@@ -23,6 +24,7 @@ bool render_tarsel_effect_to_native_image(EffectGlobals_t *instance, char const 
                                           bool premultiplied, char const *input_colorspace,
                                           char const *output_colorspace, char const *working_colorspace);
 
+%render_list_count(10, 11)
 bool render_tarsel_lensflare_to_native_image(EffectGlobals_t *instance, char const *descriptor, float center_x,
                                              float center_y, RawImage dest, int frame, int field, int downsample,
                                              int quality, T_RasterInfo **rasters, RawImage *images,
@@ -33,3 +35,4 @@ bool render_tarsel_lensflare_to_native_image(EffectGlobals_t *instance, char con
 
 %clear T_RasterInfo **rasters;
 %clear RawImage *images;
+%clear int n_rasters;

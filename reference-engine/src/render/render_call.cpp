@@ -200,7 +200,7 @@ std::shared_ptr<const WorkImage> rebuild_previous(const RenderCall &call, const 
   written.line_bytes = image_bytes(*dest.layout, dest.width, 1, 0);
   written.flip = false;
   std::shared_ptr<const WorkImage> previous;
-  for (int frame = ctx.frame - history; frame < ctx.frame; ++frame) {
+  for (int frame = offset_frame(ctx.frame, -history); frame < ctx.frame; ++frame) {
     KernelContext step = ctx;
     step.frame = frame;
     step.previous = std::move(previous);

@@ -1,15 +1,12 @@
-"""Reproducers of the faults the fuzz targets found in the module and engine.
+"""The faults the fuzz targets found in the module and engine, one call each.
 
     python tests/fuzz/reproducers/reproduce.py CASE
 
-Each case makes the one call that goes wrong and exits 0 only if the call
-ends in a Python exception or a proper result. Until the fault is fixed the
-process crashes, hangs or exits 1. The cases marked "sanitizer" read or write
-memory they must not without always crashing; run them in the fuzzing
-environment of tools/fuzz.sh (or under tools/sanitize.sh's preloads) to see
-the report.
-
-The fuzz targets leave these inputs out unless RENDERLIB_FUZZ_KNOWN_FAULTS=1."""
+Each case makes the call that once went wrong and exits 0 only if it now
+ends in the exception or result it should. Before the fixes they crashed,
+hung, or (the cases marked "sanitizer") read or wrote memory they must not
+without always crashing: the suite runs those under tools/sanitize.sh too,
+where such an access is reported."""
 import pathlib
 import sys
 
@@ -22,21 +19,23 @@ import renderlib  # noqa: E402
 NAME = "render_tarsel_effect_to_native_image"
 
 
-def answered(call, *args):
-    """For faults a sanitizer shows: any exception or result is an answer."""
-    try:
-        print("returned %r" % (call(*args),))
-    except Exception as error:  # noqa: BLE001
-        print("refused: %s: %s" % (type(error).__name__, error))
+def returns(expected, call, *args):
+    """Exit 0 when the call returns `expected`."""
+    result = call(*args)
+    print("returned %r" % (result,))
+    if result is not expected:
+        sys.exit(1)
 
 
-def refused(call, *args):
-    """Exit 0 when the call raises an ordinary Python exception."""
+def refused(error_type, message, call, *args):
+    """Exit 0 when the call raises `error_type` with `message` in its text."""
     try:
         result = call(*args)
-    except (TypeError, ValueError, OverflowError) as error:
+    except Exception as error:  # noqa: BLE001  (any other exception is the wrong answer)
         print("refused: %s: %s" % (type(error).__name__, error))
-        return
+        if type(error) is error_type and message in str(error):
+            return
+        sys.exit(1)
     print("returned %r" % (result,))
     sys.exit(1)
 
@@ -58,22 +57,25 @@ def render_arguments(rasters, images, n_rasters):
 # None as the decoder's text or destination (read and written through), and
 # a negative length (memset of (size_t)-1 bytes).
 def decode_dest_none():
-    refused(_renderlib.base64decode, "QUJD", None, 3)
+    refused(ValueError, "argument 2 of type 'uchar_t *'", _renderlib.base64decode, "QUJD", None, 3)
 
 
 def decode_text_none():
     helpers = fuzz_common.byte_address_module()
-    refused(_renderlib.base64decode, None, helpers.byte_address(bytearray(8), 0), 3)
+    refused(ValueError, "argument 1 of type 'char const *'", _renderlib.base64decode, None,
+            helpers.byte_address(bytearray(8), 0), 3)
 
 
 def decode_negative_length():
     helpers = fuzz_common.byte_address_module()
-    refused(_renderlib.base64decode, "QUJD", helpers.byte_address(bytearray(8), 0), -1)
+    refused(ValueError, "argument 3 of type 'int' must not be negative", _renderlib.base64decode, "QUJD",
+            helpers.byte_address(bytearray(8), 0), -1)
 
 
 # A T_RasterInfo look-alike in the rasters list whose `this` attribute clears
-# the list while it is converted: the typemap keeps reading the list's items
-# by the length it had (a null or freed item array).
+# the list while it is converted: the typemap read on by the length the list
+# had (a null or freed item array). It now converts the items the list held
+# when the call began; the look-alike's empty record makes the engine refuse.
 def render_list_cleared():
     rasters = []
     keep = renderlib.T_RasterInfo()
@@ -89,12 +91,12 @@ def render_list_cleared():
     rasters.extend([T_RasterInfo()] + [renderlib.T_RasterInfo() for _ in range(8)])
     args = render_arguments(None, None, 1)
     args[7] = rasters
-    refused(getattr(_renderlib, NAME), *args)
+    returns(False, getattr(_renderlib, NAME), *args)
 
 
-# The same look-alike replacing the records after the first: their proxies
-# die, and the pointers already taken from them dangle into the render
-# (sanitizer: heap-use-after-free in the engine).
+# The same look-alike replacing the destination's record: its proxy died and
+# the pointer already taken from it dangled into the render (sanitizer:
+# heap-use-after-free in the engine). The input's empty record is refused.
 def render_list_replaced():
     keep = renderlib.T_RasterInfo()
 
@@ -109,34 +111,64 @@ def render_list_replaced():
     args = render_arguments(None, None, 2)
     args[7] = [args[7][0], T_RasterInfo()]
     args[8] = [None, bytearray(16)]
-    answered(getattr(_renderlib, NAME), *args)
+    returns(False, getattr(_renderlib, NAME), *args)
 
 
-# An object whose `this` is itself: the pointer conversion follows `this`
+# An object whose `this` is itself: the pointer conversion followed `this`
 # for ever (a hang, or a stack overflow in an unoptimised build).
 def render_this_loop():
     looped = type("T_RasterInfo", (), {})()
     looped.this = looped
     args = render_arguments(None, None, 1)
     args[7] = [looped]
-    refused(getattr(_renderlib, NAME), *args)
+    refused(TypeError, "argument 8 of type 'T_RasterInfo **'", getattr(_renderlib, NAME), *args)
 
 
-# n_rasters larger than the lists: the binding passes both lists' arrays and
-# the count unchecked, and the engine reads past the arrays (sanitizer:
+# n_rasters larger than the lists: the binding passed both lists' arrays and
+# the count unchecked, and the engine read past the arrays (sanitizer:
 # heap-buffer-overflow in render()).
 def render_count_past_lists():
     args = render_arguments(None, None, 3)
-    answered(getattr(_renderlib, NAME), *args)
+    refused(ValueError, "argument 11 of type 'int': more entries than the rasters or images list holds",
+            getattr(_renderlib, NAME), *args)
 
 
-# Frame -2**31 (a valid int argument) renders an echo of frame - 1: signed
+# Frame -2**31 (a valid int argument) rendered an echo of frame - 1: signed
 # overflow in render_echo (sanitizer: UndefinedBehaviorSanitizer, echo.cpp).
+# An echo before the first frame is a frame the host does not have.
 def echo_frame_overflow():
     from renderlib import effects
     echo = _renderlib.init_tarsel_effect("T_Echo", False)
     dest, source = effects.raster(4, 2, 2), effects.raster(4, 2, 2)
-    answered(effects.render, echo, dest, [source], None, -2 ** 31)
+    returns(True, effects.render, echo, dest, [source], None, -2 ** 31)
+
+
+# The same at the other end for the frames around the last one: the time
+# blur's run of frames after 2**31 - 1 overflowed int (time_blur.cpp).
+def time_blur_frame_overflow():
+    from renderlib import effects
+
+    class Frames(renderlib.LoadFrameInterface):
+        asked, kept = [], []  # the pixels stay referenced until the render returns
+
+        def load_frame(self, input, frame, width, height):
+            self.asked.append(frame)
+            self.info, pixels = effects.raster(4, width, height)
+            self.kept.append(pixels)
+            return pixels
+
+        def current_raster_info(self, input):
+            return self.info
+
+    source = Frames()
+    _renderlib.set_load_frame_impl(source)
+    blur = effects.recreate(_renderlib.init_tarsel_effect("T_TimeBlur", False), {"frames_after": "3"})
+    dest, image = effects.raster(4, 2, 2), effects.raster(4, 2, 2)
+    returns(True, effects.render, blur, dest, [image], None, 2 ** 31 - 1)
+    print("frames asked for: %s" % sorted(set(source.asked)))
+    if sorted(set(source.asked)) != [2 ** 31 - 3, 2 ** 31 - 2]:  # the two before; none after the last
+        sys.exit(1)
+    _renderlib.set_load_frame_impl(None)
 
 
 CASES = {
@@ -148,6 +180,7 @@ CASES = {
     "render_list_replaced": render_list_replaced,  # sanitizer
     "render_count_past_lists": render_count_past_lists,  # sanitizer
     "echo_frame_overflow": echo_frame_overflow,  # sanitizer
+    "time_blur_frame_overflow": time_blur_frame_overflow,  # sanitizer
 }
 
 if __name__ == "__main__":

@@ -2,6 +2,7 @@
 // each weighted by the decay once more than the one before it.
 #include <algorithm>
 #include <cmath>
+#include <limits>
 #include <memory>
 #include <vector>
 
@@ -28,11 +29,13 @@ int render_echo(const KernelContext &ctx, WorkImage &out) {
   const double step = p.number("frame_step");
   const int combine = std::clamp(p.whole("combine"), 0, 3);
 
-  std::vector<int> frames;  // echo k shows frames[k] at weights[k]
+  // Echo k shows frames[k] at weights[k]. Counted wide: an echo before the
+  // first or after the last frame an int can name is a frame the host lacks.
+  std::vector<long long> frames;
   std::vector<float> weights;
   float weight = 1.0f;
   for (int k = 0; k < echoes; ++k, weight *= decay) {
-    frames.push_back(ctx.frame + static_cast<int>(std::lround(k * step)));
+    frames.push_back(static_cast<long long>(ctx.frame) + std::llround(k * step));
     weights.push_back(weight);
   }
   const std::size_t n = static_cast<std::size_t>(ctx.width) * 4;
@@ -77,13 +80,14 @@ int render_echo(const KernelContext &ctx, WorkImage &out) {
   };
 
   // Neighbouring echoes can show the same frame: it is fetched once.
-  int last_frame = 0;
+  long long last_frame = 0;
   std::shared_ptr<const WorkImage> last;
   for (int j = 0; j < echoes; ++j) {
     const std::size_t k = static_cast<std::size_t>(combine == kOver ? echoes - 1 - j : j);
     if (j == 0 || frames[k] != last_frame) {
       last.reset();
-      last = fetch_frame(ctx, 0, frames[k]);
+      if (frames[k] >= std::numeric_limits<int>::min() && frames[k] <= std::numeric_limits<int>::max())
+        last = fetch_frame(ctx, 0, static_cast<int>(frames[k]));
       last_frame = frames[k];
     }
     if (last) add(last, weights[k]);

@@ -8,7 +8,9 @@
 // frame square whose top-left corner is (x0 + x, y0 + y).
 #pragma once
 
+#include <algorithm>
 #include <functional>
+#include <limits>
 #include <memory>
 #include <vector>
 
@@ -27,6 +29,13 @@ struct FlareCall {
 };
 
 class FrameRequests;  // render/frame_requests.h
+
+// frame + offset, kept within the frames an int can name: a run of frames
+// around the first or last one stops there instead of wrapping.
+inline int offset_frame(int frame, long long offset) {
+  return static_cast<int>(std::clamp<long long>(frame + offset, std::numeric_limits<int>::min(),
+                                                std::numeric_limits<int>::max()));
+}
 
 struct KernelContext {
   const Genotype *genotype = nullptr;

@@ -22,7 +22,9 @@ int render_time_blur(const KernelContext &ctx, WorkImage &out) {
   // `out`, the matte's luma (within 0..1) in `matte`.
   FloatBuffer matte = acquire_floats(static_cast<std::size_t>(ctx.width) * static_cast<std::size_t>(ctx.height));
   int n_frames = 0, n_mattes = 0;
-  for (int frame = ctx.frame - before; frame <= ctx.frame + after; ++frame) {
+  const int first_frame = offset_frame(ctx.frame, -before), last_frame = offset_frame(ctx.frame, after);
+  for (long long f = first_frame; f <= last_frame; ++f) {
+    const int frame = static_cast<int>(f);
     std::shared_ptr<const WorkImage> source = ctx.other_frame(0, frame);
     if (!source) continue;
     const bool initial = n_frames++ == 0;

@@ -139,7 +139,7 @@ def _is_sequence(pattern):
     return frame_path(pattern, 0) != frame_path(pattern, 1)
 
 
-def _inputs(paths, width, height):
+def _inputs(paths):
     """One frame function per input file (a sequence pattern or a still)."""
     from renderlib.images import read_image
     sources = []
@@ -154,7 +154,7 @@ def _inputs(paths, width, height):
 
 def _renderer(args, width, height):
     from renderlib.rendering import EffectRenderer, card_frame
-    sources = _inputs(args.input, width, height)
+    sources = _inputs(args.input)
     renderer = EffectRenderer(args.effect, dict(args.param), colorspace=args.colorspace)
     if len(sources) > renderer.n_inputs:
         renderer.close()

@@ -3,7 +3,6 @@
 #include <chrono>
 #include <cinttypes>
 #include <cstdio>
-#include <deque>
 #include <mutex>
 #include <string>
 #include <thread>
@@ -13,6 +12,7 @@
 #include <unistd.h>
 
 #include "core/abort.h"
+#include "core/call_log.h"
 #include "core/thread_end.h"
 #include "core/entry.h"
 #include "core/messages.h"
@@ -30,14 +30,9 @@
 namespace tarsel_ref {
 namespace {
 
-struct CallLog {
-  std::mutex mutex;
-  std::deque<std::string> entries;
-  std::string returned;  // keeps the text handed out by tarsel_probe_call alive
-};
-
 CallLog &call_log() {
-  static CallLog *log = new CallLog;  // never destroyed: entry calls may come during process exit
+  // Never destroyed: entry calls may come during process exit.
+  static CallLog *log = new CallLog(TARSEL_PROBE_LOG_CAPACITY);
   return *log;
 }
 
@@ -78,12 +73,7 @@ std::atomic<bool> log_enabled{true};
 bool call_log_enabled() { return log_enabled.load(std::memory_order_relaxed); }
 
 void record_entry(const char *name, std::string arguments, bool may_abort) {
-  if (call_log_enabled()) {
-    CallLog &log = call_log();
-    std::lock_guard<std::mutex> lock(log.mutex);
-    if (log.entries.size() == TARSEL_PROBE_LOG_CAPACITY) log.entries.pop_front();
-    log.entries.push_back(std::string(name) + "(" + arguments + ")");
-  }
+  if (call_log_enabled()) call_log().append(std::string(name) + "(" + arguments + ")");
   // A plain load first: the exchange, a locked write to a shared cache line,
   // is paid only while the switch is armed.
   if (may_abort && abort_next_call.load(std::memory_order_relaxed) && abort_next_call.exchange(false))
@@ -99,23 +89,11 @@ std::optional<std::string> probe::version_text_override() {
 
 using tarsel_ref::call_log;
 
-int tarsel_probe_call_count(void) {
-  std::lock_guard<std::mutex> lock(call_log().mutex);
-  return static_cast<int>(call_log().entries.size());
-}
+int tarsel_probe_call_count(void) { return call_log().count(); }
 
-const char *tarsel_probe_call(int index) {
-  auto &log = call_log();
-  std::lock_guard<std::mutex> lock(log.mutex);
-  if (index < 0 || static_cast<std::size_t>(index) >= log.entries.size()) return nullptr;
-  log.returned = log.entries[static_cast<std::size_t>(index)];
-  return log.returned.c_str();
-}
+const char *tarsel_probe_call(int index) { return call_log().at(index); }
 
-void tarsel_probe_clear_calls(void) {
-  std::lock_guard<std::mutex> lock(call_log().mutex);
-  call_log().entries.clear();
-}
+void tarsel_probe_clear_calls(void) { call_log().clear(); }
 
 void tarsel_probe_set_call_log(int on) { tarsel_ref::log_enabled.store(on != 0); }
 

@@ -3,10 +3,10 @@
 
 #include <atomic>
 #include <cstring>
-#include <deque>
 #include <map>
 #include <mutex>
 
+#include "core/call_log.h"
 #include "monitor/display.h"
 #include "monitor/image.h"
 #include "monitor/preview_device.h"
@@ -17,9 +17,8 @@ namespace {
 
 struct ProbeState {
   std::mutex mutex;
-  std::deque<std::string> calls;
-  std::string returned;  // keeps the text handed out by qrv_probe_call alive
-  int made = 0;          // objects numbered so far
+  tarsel_ref::CallLog calls{QRV_PROBE_LOG_CAPACITY};
+  int made = 0;  // objects numbered so far
   std::map<const void *, int> displays, images;  // live objects and their numbers
 };
 
@@ -34,15 +33,13 @@ std::atomic<bool> init_fails_switch{false}, no_devices_switch{false};
 
 void log_call(const void *object, const std::string &text) {
   ProbeState &probe = state();
-  std::lock_guard<std::mutex> hold(probe.mutex);
+  std::lock_guard<std::mutex> hold(probe.mutex);  // numbers and log in one order
   std::string entry = "object?";
   if (auto display = probe.displays.find(object); display != probe.displays.end())
     entry = "display" + std::to_string(display->second);
   else if (auto image = probe.images.find(object); image != probe.images.end())
     entry = "image" + std::to_string(image->second);
-  probe.calls.push_back(entry + "." + text);
-  if (probe.calls.size() > QRV_PROBE_LOG_CAPACITY)
-    probe.calls.pop_front();
+  probe.calls.append(entry + "." + text);
 }
 
 int register_display(ReferenceDisplay *display) {
@@ -103,24 +100,11 @@ using namespace qrv_ref;
 
 extern "C" {
 
-int qrv_probe_call_count(void) {
-  std::lock_guard<std::mutex> hold(state().mutex);
-  return int(state().calls.size());
-}
+int qrv_probe_call_count(void) { return state().calls.count(); }
 
-const char *qrv_probe_call(int index) {
-  ProbeState &probe = state();
-  std::lock_guard<std::mutex> hold(probe.mutex);
-  if (index < 0 || size_t(index) >= probe.calls.size())
-    return nullptr;
-  probe.returned = probe.calls[size_t(index)];
-  return probe.returned.c_str();
-}
+const char *qrv_probe_call(int index) { return state().calls.at(index); }
 
-void qrv_probe_clear_calls(void) {
-  std::lock_guard<std::mutex> hold(state().mutex);
-  state().calls.clear();
-}
+void qrv_probe_clear_calls(void) { state().calls.clear(); }
 
 int qrv_probe_live_displays(void) {
   std::lock_guard<std::mutex> hold(state().mutex);

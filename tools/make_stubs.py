@@ -524,7 +524,7 @@ class Wrapper:
             return "str"  # HeaderText
         if line.startswith("resultobj = SWIG_FromCharPtr("):
             if name.endswith("___repr__"):
-                helper = re.search(r"result = \(char \*\)(\w+)\(arg1\)", body)
+                helper = re.search(r"result = \(char \*\)(\w+)\((?:\([^)]*\))?arg1\)", body)
                 helper_body = self.source[self.source.index("SWIGINTERN char const *%s(" % helper.group(1)):]
                 if "static char text[" in helper_body[:helper_body.index("\n}\n")]:
                     return "str"  # %record_repr: the class's buffer, never null

@@ -7,11 +7,17 @@
 // __cause__, so the host sees what went wrong in its code.
 
 %{
+#include <atomic>
+
 // The exception of a host callback that failed on an engine thread, kept
 // until the render call that the engine ends as an abort collects it. Guarded
 // by the interpreter lock. Only the first failure is kept: later ones are
 // consequences of the same abort.
 static PyObject *failed_callback_exception = NULL;
+
+// Set when a frame request was refused because the interpreter is ending, so
+// that the render the engine ends as an abort says why.
+static std::atomic<bool> frame_request_refused_at_exit(false);
 
 // Whether the interpreter is shutting down (then no thread state may be made
 // or dropped from a foreign thread).
@@ -76,6 +82,8 @@ static void raise_tarsel_abort()
     cause = failed_callback_exception;
     failed_callback_exception = NULL;
   }
+  if (frame_request_refused_at_exit.exchange(false) && !cause)
+    cause = PyObject_CallFunction(PyExc_RuntimeError, "s", "a frame request was refused: the interpreter is ending");
   PyErr_SetString(PyExc_RuntimeError, "Tarsel Abort");
   if (!cause)
     return;

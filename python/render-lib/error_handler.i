@@ -23,6 +23,30 @@ enum ErrLevel {
 };
 
 %{
+// A proxy made while an exception is pending (a handler that raised during
+// the engine call whose result it is) would lose that exception: making the
+// proxy calls into Python. The exception is set aside and put back, so the
+// call surfaces it as every other call does (a SystemError caused by it),
+// and the result goes with the failed call.
+static PyObject *new_pointer_object(void *pointer, swig_type_info *type, int flags)
+{
+  if (!PyErr_Occurred())
+    return SWIG_Python_NewPointerObj(NULL, pointer, type, flags);
+  PyObject *error_type, *value, *traceback;
+  PyErr_Fetch(&error_type, &value, &traceback);
+  PyObject *object = SWIG_Python_NewPointerObj(NULL, pointer, type, flags);
+  if (object) {
+    PyErr_Restore(error_type, value, traceback);
+  } else {
+    Py_XDECREF(error_type);
+    Py_XDECREF(value);
+    Py_XDECREF(traceback);
+  }
+  return object;
+}
+#undef SWIG_NewPointerObj
+#define SWIG_NewPointerObj(pointer, type, flags) new_pointer_object(pointer, type, flags)
+
 // The installed handler, or null. The module owns one reference to it.
 static PyObject *installed_error_handler = NULL;
 

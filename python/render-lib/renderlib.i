@@ -55,6 +55,7 @@ static void renderlib_initialize_threads()
 %include "renderlib_typemaps.i"
 %include "abort_translation.i"
 %include "callbacks/engine_threads.i"
+%include "render/instance_uses.i"
 
 // Product identity and build configuration, fixed when the module is built.
 %{

@@ -5,6 +5,7 @@ import threading
 import pytest
 
 import _renderlib
+from isolated import run_cleanly
 
 
 def test_messages_from_an_engine_worker_reach_the_handler_in_order(probe, error_handler_removed):
@@ -108,3 +109,45 @@ def test_abort_request_is_set_and_cleared_by_the_engine(probe):
     assert probe.abort_requested()
     _renderlib.tarsel_clear_abort()
     assert not probe.abort_requested()
+
+
+
+def test_a_handler_exception_surfaces_from_the_call_whatever_it_returns():
+    """Each call raises SystemError caused by the handler's exception, as the
+    interpreter reports a result returned with an exception set. A fresh
+    process: the first proxy of a class the module makes is the case that
+    lost the exception."""
+    out = run_cleanly("""
+        import _renderlib
+        from engine_probe import EngineProbe
+        from renderlib import effects
+
+        def handler(level, message):
+            raise ValueError(message)
+
+        probe = EngineProbe()
+        made = probe.live_instances()
+        calls = {
+            "proxy": lambda: _renderlib.init_tarsel_effect_from_string(
+                '{"effect": "T_Glow", "params": {"no_such": "1"}}'),
+            "None": lambda: _renderlib.init_tarsel_effect("T_NoSuchEffect", False),
+            "bool": lambda: effects.render(glow, effects.raster(_renderlib.pixel_rgba8, 4, 4), [None],
+                                           colorspace="cmyk"),
+            "tuple": lambda: _renderlib.tarsel_widget_mouse_event(glow, "no_such", 960, 540, 0.0, 0.0, 0.5, 0.5,
+                                                                  [], 0, 0, 0),
+        }
+        glow = None
+        _renderlib.set_error_handler(handler)
+        for kind, call in calls.items():
+            try:
+                print(kind, "returned", call())
+            except SystemError as error:
+                print(kind, type(error.__cause__).__name__)
+            if glow is None:
+                _renderlib.set_error_handler(None)
+                glow = _renderlib.init_tarsel_effect("T_Glow", False)
+                _renderlib.set_error_handler(handler)
+        # The instance the failed call made went with its result.
+        print(probe.live_instances() - made)
+    """)
+    assert out.splitlines() == ["proxy ValueError", "None ValueError", "bool ValueError", "tuple ValueError", "1"]

@@ -1,6 +1,8 @@
 """The interpreter ends cleanly while engine threads are inside host
-callbacks (a frame source busy in Python, messages from engine workers):
-every run exits with status 0 within 5 seconds.
+callbacks (a frame source busy in Python, messages from engine workers) and
+while a Python thread draws widgets: every run exits with status 0 within
+5 seconds. A render on the thread that ends the interpreter, after the
+module's exit step, ends as an abort instead of waiting for ever.
 
 RENDERLIB_SHUTDOWN_RUNS sets the number of runs (100 by default; the audit
 runs 1,000)."""
@@ -9,6 +11,10 @@ import os
 import pathlib
 import subprocess
 import sys
+
+import pytest
+
+from isolated import ending, run_cleanly, run_python
 
 RUNS = int(os.environ.get("RENDERLIB_SHUTDOWN_RUNS", "100"))
 SCRIPT = pathlib.Path(__file__).with_name("shutdown_script.py")
@@ -32,3 +38,86 @@ def test_the_interpreter_ends_cleanly_with_engine_threads_in_callbacks():
     with concurrent.futures.ThreadPoolExecutor(max_workers=4) as pool:
         failures = [(i, what) for i, what in pool.map(run_once, range(RUNS)) if what]
     assert failures == [], "%d of %d runs failed, first: %s" % (len(failures), RUNS, failures[:3])
+
+
+# A daemon thread drawing widgets in a loop through a Python drawing object
+# while the main thread ends the interpreter.
+DRAWING_AT_EXIT = """
+import threading
+import _renderlib
+from renderlib.widgets import SvgDrawing
+
+drawing = SvgDrawing(char_width=4)
+_renderlib.tarsel_set_gfx_impl(drawing)
+flare = _renderlib.init_tarsel_effect("T_LensFlare", False)
+drawn = threading.Event()
+
+def draw_forever():
+    while True:
+        drawing.calls.clear()
+        _renderlib.tarsel_widget_draw(flare, "", 960, 540, 0.0, 0.0, 0.5, 0.5, [1920, 1080, 0])
+        drawn.set()
+
+threading.Thread(target=draw_forever, daemon=True).start()
+drawn.wait(5)
+"""
+
+
+def test_the_interpreter_ends_cleanly_with_a_thread_drawing_widgets():
+    def run(index):
+        done = run_python(DRAWING_AT_EXIT, timeout=10)
+        return None if done.returncode == 0 else "%s: %s" % (ending(done), done.stderr.strip()[-300:])
+
+    runs = max(RUNS // 4, 10)
+    with concurrent.futures.ThreadPoolExecutor(max_workers=4) as pool:
+        failures = [what for what in pool.map(run, range(runs)) if what]
+    assert failures == [], "%d of %d runs failed, first: %s" % (len(failures), runs, failures[:2])
+
+
+# A render whose frame requests come after the exit step, on the thread that
+# ends the interpreter. The way each scenario gets there comes first; the
+# render is the same.
+RENDER_ON_ENDING_THREAD = """
+import os, sys
+{before}
+import _renderlib
+import renderlib
+from renderlib import effects
+
+class Frames(renderlib.LoadFrameInterface):
+    def load_frame(self, input, frame, width, height):
+        self.info, self.pixels = effects.raster(_renderlib.pixel_rgbaf, width, height)
+        return self.pixels
+    def current_raster_info(self, input):
+        return self.info
+
+frames = Frames()
+_renderlib.set_load_frame_impl(frames)
+echo = effects.recreate(_renderlib.init_tarsel_effect("T_Echo", False), {{"echoes": "3"}})
+dest, source = effects.raster(_renderlib.pixel_rgbaf, 16, 8), effects.raster(_renderlib.pixel_rgbaf, 16, 8)
+
+def render_late(render=effects.render, write=os.write):
+    try:
+        render(echo, dest, [source])
+        write(1, b"rendered\\n")
+    except RuntimeError as error:
+        write(1, ("%s: %s\\n" % (error, error.__cause__)).encode())
+{after}
+"""
+ENDING_THREAD_SCENARIOS = {
+    # an atexit function registered before the module's own exit step
+    "atexit": ("import atexit\natexit.register(lambda: render_late())", ""),
+    # a finalizer run by the interpreter's exit, registered before the module
+    "finalize": ("import weakref\nclass Anchor: pass\nanchor = Anchor()\nweakref.finalize(anchor, lambda: None)",
+                 "weakref.finalize(anchor, render_late)"),
+    # a __del__ run while the interpreter tears its modules down
+    "del": ("", "class Late:\n    def __del__(self, render_late=render_late):\n        render_late()\n"
+                "late = Late()\nlate.cycle = late"),
+}
+
+
+@pytest.mark.parametrize("scenario", sorted(ENDING_THREAD_SCENARIOS))
+def test_a_render_on_the_ending_thread_ends_as_an_abort(scenario):
+    before, after = ENDING_THREAD_SCENARIOS[scenario]
+    out = run_cleanly(RENDER_ON_ENDING_THREAD.format(before=before, after=after), timeout=20)
+    assert out.splitlines() == ["Tarsel Abort: a frame request was refused: the interpreter is ending"]

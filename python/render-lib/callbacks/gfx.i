@@ -16,7 +16,71 @@ static void install_gfx_impl(GfxInterface *gfx)
   tarsel_set_gfx_impl(gfx);
   installed_drawing = gfx;
 }
+
+// A widget call, from its argument check to its return. The engine runs the
+// drawing object's Python methods on the calling thread inside the call, so
+// the thread counts as running host callbacks (refused once the interpreter
+// is ending), and the installed drawing object is held: a drawing method that
+// uninstalls it and drops the last reference, or another thread that replaces
+// it, does not free it while the engine draws through it.
+class WidgetCall {
+public:
+  WidgetCall() : drawing_(NULL) {}
+  ~WidgetCall() { Py_XDECREF(drawing_); }
+  bool begin()
+  {
+    if (!callbacks_.open())
+      return false;
+    Swig::Director *director = dynamic_cast<Swig::Director *>(installed_drawing);
+    drawing_ = director ? director->swig_get_self() : NULL;
+    Py_XINCREF(drawing_);
+    return true;
+  }
+  WidgetCall(const WidgetCall &) = delete;
+  WidgetCall &operator=(const WidgetCall &) = delete;
+private:
+  HostCallbacksOnThisThread callbacks_;
+  PyObject *drawing_;
+};
+
+// A vector of the engine's that a drawing method receives. The Python object
+// refers to the engine's own vector, which is gone once the method returns:
+// the object is then cut off (its pointer set to null), so a host that kept it
+// gets an error instead of reading freed memory.
+class LentToPython {
+public:
+  explicit LentToPython(PyObject *object) : object_(object) {}
+  ~LentToPython()
+  {
+    SwigPyObject *wrapped = object_ ? SWIG_Python_GetSwigThis(object_) : NULL;
+    if (wrapped)
+      wrapped->ptr = NULL;
+  }
+  LentToPython(const LentToPython &) = delete;
+  LentToPython &operator=(const LentToPython &) = delete;
+private:
+  PyObject *object_;
+};
 %}
+
+// EffectGlobals_t *WidgetInstance
+// The instance whose widgets a widget call draws or moves: held for the call
+// as every instance argument is, with the call itself (see WidgetCall).
+%typemap(check, noblock=1) EffectGlobals_t *WidgetInstance (InstanceUse use, WidgetCall call) {
+  if ($1 && !use.enter($1))
+    SWIG_exception_fail(SWIG_ValueError, "in method '$symname', argument $argnum of type '$1_type': "
+                        "no effect instance (freed by free_tarsel_effect)");
+  if (!call.begin())
+    SWIG_exception_fail(SWIG_RuntimeError, "in method '$symname': the interpreter is ending; "
+                        "widgets are drawn only on the thread that ends it");
+}
+
+// std::vector<float> &LentVector
+// A drawing method's view of an engine vector, cut off when the method returns.
+%typemap(directorin, noblock=1) std::vector<float> &LentVector {
+  $input = SWIG_NewPointerObj(SWIG_as_voidptr(&$1), $descriptor(std::vector<float> *), 0);
+  LentToPython lent_$1_name($input);
+}
 
 // Kinds of mouse event passed to an effect's on-screen widgets.
 enum class MouseEventType {
@@ -42,6 +106,7 @@ enum class MouseEventType {
   delete arg1;
 }
 
+%apply std::vector<float> &LentVector { std::vector<float> &xs, std::vector<float> &ys };
 class GfxInterface {
 public:
   virtual ~GfxInterface();
@@ -65,9 +130,12 @@ public:
   virtual long get_text_length_in_pixels(const char *text) = 0;
 };
 
+%clear std::vector<float> &xs, std::vector<float> &ys;
+
 %rename(tarsel_set_gfx_impl) install_gfx_impl;
 void install_gfx_impl(GfxInterface *gfx);
 
+%apply EffectGlobals_t *WidgetInstance { EffectGlobals_t *globals };
 void tarsel_widget_draw(EffectGlobals_t *globals, const char *param_name,
                         int view_xsize, int view_ysize,
                         float view_x, float view_y, float view_scale_x, float view_scale_y,
@@ -79,3 +147,4 @@ T_WidgetResult tarsel_widget_mouse_event(EffectGlobals_t *globals, const char *p
                                          float view_x, float view_y, float view_scale_x, float view_scale_y,
                                          std::vector<float> values,
                                          int mouse_x, int mouse_y, MouseEventType event);
+%clear EffectGlobals_t *globals;

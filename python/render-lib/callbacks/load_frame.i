@@ -37,8 +37,9 @@ public:
 %{
 // The address of a frame that load_frame returned, checked against the
 // descriptor that current_raster_info gave for it. The engine reads the
-// pixels after the interpreter lock is given back, so the bytearray must
-// outlive this request in the host's hands.
+// pixels after the interpreter lock is given back. The module holds the
+// bytearray for the engine calls under way, but a request can come from an
+// engine thread outside any module call, so the host must hold it too.
 static void *frame_pixels_for_engine(PyObject *pixels, const T_RasterInfo &info)
 {
   if (!PyByteArray_Check(pixels)) {
@@ -94,16 +95,21 @@ static thread_local EngineThreadState engine_thread_state;
 // The engine's frame request. Runs on an engine thread, takes the interpreter
 // lock for the whole request and gives it back on every path. The source's
 // Python object is held for the request, so a host that drops its last
-// reference meanwhile does not free it under the engine. A failure (the
-// host's exception, a wrong result) is kept for the render call, which the
-// engine ends as an abort, and goes on into the engine as the native
-// exception it is.
+// reference meanwhile does not free it under the engine, and the frame's
+// bytearray is held until the engine calls under way have returned, so a
+// source that lets go of it (or of itself) does not free the pixels the
+// engine reads. A failure (the host's exception, a wrong result) is kept for
+// the render call, which the engine ends as an abort, and goes on into the
+// engine as the native exception it is. Once the interpreter is ending, the
+// request fails without taking the lock.
 static void *load_frame_for_engine(void *render_state, int input, int frame, unsigned char,
                                    void *, void *, T_RasterInfo *out_info)
 {
   EngineCallbackEntry entry;
-  if (!entry.open())
-    park_engine_thread();
+  if (!entry.open()) {
+    frame_request_refused_at_exit = true;
+    throw InterpreterEnding();
+  }
   GilHeld gil;
   engine_thread_state.keep();
   LoadFrameInterface *loader = installed_frame_loader;
@@ -124,6 +130,7 @@ static void *load_frame_for_engine(void *render_state, int input, int frame, uns
     void *address = frame_pixels_for_engine(pixels.get(), *out_info);
     if (!address)
       throw Swig::DirectorMethodException();
+    calls_without_lock().keep(pixels.get());
     return address;
   } catch (const TarselAbortException &) {
     throw;  // the engine's own abort, raised inside the request: no host failure to report

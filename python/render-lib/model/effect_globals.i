@@ -31,9 +31,9 @@ struct EffectGlobals_t {
 %mutable;
 };
 
-%threadallow EffectGlobals_t::~EffectGlobals_t;
 %extend EffectGlobals_t {
-  ~EffectGlobals_t() { free_tarsel_effect($self); }
+  // Frees at once, or when the last call using the instance returns.
+  ~EffectGlobals_t() { free_effect_instance($self); }
 
   std::vector<Genotype *> _get_genotypes() {
     std::vector<Genotype *> genotypes;
@@ -71,4 +71,15 @@ struct EffectGlobals_t {
 }
 
 %record_identity(EffectGlobals_t)
-%record_repr(EffectGlobals_t, "Globals(\"%s\" @%p)", printable($self->plugin_name), (void *)$self)
+// A freed instance has no name left to print.
+%extend EffectGlobals_t {
+  const char *__repr__() const {
+    static char text[512];
+    EffectGlobals_t *instance = const_cast<EffectGlobals_t *>($self);
+    if (instance_records().live(instance))
+      std::snprintf(text, sizeof text, "Globals(\"%s\" @%p)", printable(instance->plugin_name), (void *)instance);
+    else
+      std::snprintf(text, sizeof text, "Globals(freed @%p)", (void *)instance);
+    return text;
+  }
+}

@@ -10,7 +10,6 @@
 %threadallow init_tarsel_effect_from_string;
 %threadallow tarsel_effect_is_time_varying;
 %threadallow tarsel_get_gpu_status;
-%threadallow free_tarsel_effect;
 
 %newobject init_tarsel_effect;
 %newobject init_tarsel_effect_from_string;
@@ -22,9 +21,12 @@ int tarsel_effect_is_time_varying(EffectGlobals_t *effect, char const *name, int
 const char *tarsel_get_gpu_status(EffectGlobals_t *effect);
 
 // The proxy stops owning the instance before the engine frees it, so dropping
-// the proxy later frees nothing twice.
+// the proxy later frees nothing twice. An instance another call is using is
+// freed when that call returns (instance_uses.i); the engine call runs
+// without the interpreter lock.
 %apply SWIGTYPE *DISOWN { EffectGlobals_t *instance };
-void free_tarsel_effect(EffectGlobals_t *instance);
+%rename(free_tarsel_effect) free_effect_instance;
+void free_effect_instance(EffectGlobals_t *instance);
 
 // An abort request ends the render in progress (and any render started before
 // the request is cleared) with RuntimeError "Tarsel Abort". Both keep the

@@ -57,7 +57,7 @@ void free_tarsel_effect(EffectGlobals_t *globals) {
 void generate_all_tarsel_effect_params(EffectGlobals_t *globals, T_ParamCollector collect, void *user_data) {
   auto scope = tarsel_ref::enter("generate_all_tarsel_effect_params", static_cast<const void *>(globals),
                                  reinterpret_cast<const void *>(collect), user_data);
-  tarsel_ref::EffectInstance *instance = tarsel_ref::live_instance(globals);
+  tarsel_ref::InstanceUse instance(globals);
   if (!instance || !collect) return;
   Genotype *genotype = instance->effect_genotype;
   for (int i = 0; i < genotype->n_params; ++i) {

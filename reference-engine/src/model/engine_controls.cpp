@@ -53,7 +53,7 @@ void set_tarsel_luts(const char *input_lut_path, const char *output_lut_path, fl
 int tarsel_effect_is_time_varying(EffectGlobals_t *globals, const char *param_values, int frame) {
   auto scope = tarsel_ref::enter("tarsel_effect_is_time_varying", static_cast<const void *>(globals), param_values,
                                  frame);
-  tarsel_ref::EffectInstance *instance = tarsel_ref::live_instance(globals);
+  tarsel_ref::InstanceUse instance(globals);
   if (!instance) return -1;
   const Genotype &genotype = *instance->effect_genotype;
   if (param_values && *param_values) {
@@ -68,7 +68,8 @@ int tarsel_effect_is_time_varying(EffectGlobals_t *globals, const char *param_va
 
 const char *tarsel_get_gpu_status(EffectGlobals_t *globals) {
   auto scope = tarsel_ref::enter("tarsel_get_gpu_status", static_cast<const void *>(globals));
-  if (tarsel_ref::EffectInstance *instance = tarsel_ref::live_instance(globals)) return instance->gpu_status.c_str();
+  // The text lives in the instance: valid until the instance is freed.
+  if (tarsel_ref::InstanceUse instance{globals}) return instance->gpu_status.c_str();
   return "CPU: the reference engine has no graphics-processor path";
 }
 

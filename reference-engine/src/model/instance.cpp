@@ -2,7 +2,7 @@
 
 #include <mutex>
 #include <stdexcept>
-#include <unordered_set>
+#include <unordered_map>
 
 #include "model/flare.h"
 #include "model/param_store.h"
@@ -11,9 +11,16 @@
 namespace tarsel_ref {
 namespace {
 
+// Every instance that exists, with the number of entry points using it and
+// whether it has been freed (it is then no longer handed to a new use).
+struct Registration {
+  int uses = 0;
+  bool freed = false;
+};
+
 struct Registry {
   std::mutex mutex;
-  std::unordered_set<const EffectGlobals_t *> live;
+  std::unordered_map<const EffectGlobals_t *, Registration> instances;
 };
 
 Registry &registry() {
@@ -57,19 +64,39 @@ EffectInstance *create_instance(const PluginDefinition &plugin) {
   instance->gpu_status = "CPU: the reference engine has no graphics-processor path (" + plugin.name + ")";
 
   std::lock_guard<std::mutex> lock(registry().mutex);
-  registry().live.insert(instance.get());
+  registry().instances[instance.get()] = Registration();
   return instance.release();
 }
 
-EffectInstance *live_instance(EffectGlobals_t *globals) {
+InstanceUse::InstanceUse(EffectGlobals_t *globals) : instance_(nullptr) {
   std::lock_guard<std::mutex> lock(registry().mutex);
-  return registry().live.count(globals) ? static_cast<EffectInstance *>(globals) : nullptr;
+  auto found = registry().instances.find(globals);
+  if (found == registry().instances.end() || found->second.freed) return;
+  ++found->second.uses;
+  instance_ = static_cast<EffectInstance *>(globals);
+}
+
+InstanceUse::~InstanceUse() {
+  if (!instance_) return;
+  {
+    std::lock_guard<std::mutex> lock(registry().mutex);
+    auto found = registry().instances.find(instance_);
+    if (--found->second.uses > 0 || !found->second.freed) return;
+    registry().instances.erase(found);
+  }
+  delete instance_;
 }
 
 bool destroy_instance(EffectGlobals_t *globals) {
   {
     std::lock_guard<std::mutex> lock(registry().mutex);
-    if (registry().live.erase(globals) == 0) return false;
+    auto found = registry().instances.find(globals);
+    if (found == registry().instances.end() || found->second.freed) return false;
+    if (found->second.uses > 0) {
+      found->second.freed = true;  // the last use deletes it
+      return true;
+    }
+    registry().instances.erase(found);
   }
   delete static_cast<EffectInstance *>(globals);
   return true;
@@ -77,7 +104,7 @@ bool destroy_instance(EffectGlobals_t *globals) {
 
 int live_instance_count() {
   std::lock_guard<std::mutex> lock(registry().mutex);
-  return static_cast<int>(registry().live.size());
+  return static_cast<int>(registry().instances.size());
 }
 
 }  // namespace tarsel_ref

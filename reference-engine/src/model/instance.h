@@ -32,13 +32,31 @@ struct EffectInstance : EffectGlobals_t {
 // Builds an instance of `plugin` and registers it as live; throws on failure.
 EffectInstance *create_instance(const PluginDefinition &plugin);
 
-// The live instance behind `globals`; null for null or for a pointer this
-// engine did not hand out (or has freed).
-EffectInstance *live_instance(EffectGlobals_t *globals);
+// An entry point's use of an instance, for as long as the entry point runs:
+// the instance is not deleted while any use of it lasts. Empty (false) for
+// null, for a pointer this engine did not hand out, or for an instance freed
+// already, even one whose deletion waits for a use to end.
+class InstanceUse {
+public:
+  explicit InstanceUse(EffectGlobals_t *globals);
+  ~InstanceUse();
+  InstanceUse(const InstanceUse &) = delete;
+  InstanceUse &operator=(const InstanceUse &) = delete;
+  EffectInstance *get() const { return instance_; }
+  EffectInstance *operator->() const { return instance_; }
+  explicit operator bool() const { return instance_ != nullptr; }
 
-// Unregisters and frees an instance; false when `globals` is not live.
+private:
+  EffectInstance *instance_;
+};
+
+// Unregisters an instance; it is deleted now, or when its last use ends if
+// an entry point is using it (a render freeing its own instance from a frame
+// request, another thread freeing it meanwhile). False when `globals` is not
+// live.
 bool destroy_instance(EffectGlobals_t *globals);
 
+// Instances that exist, freed ones waiting for their last use included.
 int live_instance_count();
 
 }  // namespace tarsel_ref

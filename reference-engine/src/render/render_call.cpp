@@ -236,7 +236,8 @@ std::shared_ptr<const WorkImage> rebuild_previous(const RenderCall &call, const 
 }  // namespace
 
 bool render(const RenderCall &call, std::string *error) {
-  EffectInstance *instance = live_instance(call.instance);
+  const InstanceUse use(call.instance);  // the instance outlives this render, whoever frees it meanwhile
+  EffectInstance *instance = use.get();
   if (!instance) {
     *error = "not a live effect instance of this engine";
     return false;

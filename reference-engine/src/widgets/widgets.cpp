@@ -7,6 +7,7 @@
 #include <cstdint>
 #include <cstdio>
 #include <cstring>
+#include <optional>
 #include <string>
 
 #include "core/abort.h"
@@ -49,6 +50,7 @@ std::string values_text(const std::vector<float> &values) {
 // view and the one parameter asked about. False, with the message sent, when
 // the call does nothing.
 struct Call {
+  std::optional<InstanceUse> use;  // the instance outlives the call, whoever frees it meanwhile
   EffectInstance *instance = nullptr;
   const Genotype *genotype = nullptr;
   const Param *only = nullptr;
@@ -58,7 +60,8 @@ struct Call {
 bool prepare(const char *entry, EffectGlobals_t *globals, const char *param_name, int view_xsize, int view_ysize,
              float view_x, float view_y, float scale_x, float scale_y, const std::vector<float> &values, Call *call) {
   throw_if_aborted();
-  call->instance = live_instance(globals);
+  call->use.emplace(globals);
+  call->instance = call->use->get();
   if (!call->instance || !call->instance->effect_genotype) {
     emit_message(Err_Error, (std::string(entry) + ": not a live effect instance of this engine").c_str());
     return false;

@@ -1,0 +1,166 @@
+"""Host callback objects that let go of themselves, or of what they handed the
+engine, while the engine is still using it; callback classes a host writes
+as null objects; engine vectors a drawing method keeps. Each runs in a
+process of its own: the faults these guard against crash the interpreter."""
+import pytest
+
+from isolated import run_cleanly
+
+DRAW = 'draw = lambda effect: _renderlib.tarsel_widget_draw(effect, "", 960, 540, 0.0, 0.0, 0.5, 0.5, [1920, 1080, 0])'
+
+
+def test_a_drawing_object_that_uninstalls_and_drops_itself_mid_draw_lives_to_the_end_of_the_call():
+    out = run_cleanly("""
+        import gc, weakref, _renderlib
+        from renderlib.widgets import SvgDrawing
+        %s
+        class Quitter(SvgDrawing):
+            def start_drawing(self, mode):
+                global drawing
+                _renderlib.tarsel_set_gfx_impl(None)
+                drawing = None
+                gc.collect()
+                super().start_drawing(mode)
+
+        drawing = Quitter()
+        gone = weakref.ref(drawing)
+        calls = drawing.calls
+        _renderlib.tarsel_set_gfx_impl(drawing)
+        draw(_renderlib.init_tarsel_effect("T_LensFlare", False))
+        print(calls[-1][0], gone() is None)
+    """ % DRAW)
+    # The engine drew the whole pass through the object it started with.
+    assert out.split() == ["end_drawing", "True"]
+
+
+def test_replacing_the_drawing_object_from_another_thread_during_draws():
+    out = run_cleanly("""
+        import threading, time, _renderlib
+        from renderlib.widgets import SvgDrawing
+        %s
+        passes = []  # (start or end, drawing object): each pass ends on the object it began with
+
+        class Slow(SvgDrawing):
+            def start_drawing(self, mode):
+                passes.append(("start", id(self)))
+            def end_drawing(self):
+                passes.append(("end", id(self)))
+            def line(self, *args):
+                time.sleep(0.0002)  # lets the other thread in
+                super().line(*args)
+
+        flare = _renderlib.init_tarsel_effect("T_LensFlare", False)
+        installed = [Slow()]
+        _renderlib.tarsel_set_gfx_impl(installed[0])
+        done = threading.Event()
+
+        def replace():
+            while not done.is_set():
+                drawing = Slow()
+                _renderlib.tarsel_set_gfx_impl(drawing)
+                installed[0] = drawing  # the one before loses its last reference, mid-draw
+                time.sleep(0.0001)
+
+        replacer = threading.Thread(target=replace)
+        replacer.start()
+        for _ in range(200):
+            draw(flare)
+        done.set()
+        replacer.join()
+        _renderlib.tarsel_set_gfx_impl(None)
+        whole = all(a == ("start", b[1]) and b[0] == "end" for a, b in zip(passes[::2], passes[1::2]))
+        print(len(passes), whole)
+    """ % DRAW, timeout=60)
+    assert out.split() == ["400", "True"]
+
+
+def test_a_frame_source_that_lets_go_of_itself_in_load_frame_keeps_its_frame_for_the_render():
+    out = run_cleanly("""
+        import gc, weakref, numpy, _renderlib, renderlib
+        from renderlib import effects
+
+        class Leaving(renderlib.LoadFrameInterface):
+            def load_frame(self, input, frame, width, height):
+                global source
+                self.info, self.pixels = effects.raster(_renderlib.pixel_rgbaf, width, height)
+                numpy.frombuffer(self.pixels, numpy.float32)[:] = 0.25
+                _renderlib.set_load_frame_impl(None)
+                source = None  # the last reference but the module's
+                gc.collect()
+                return self.pixels
+            def current_raster_info(self, input):
+                return self.info
+
+        source = Leaving()
+        gone = weakref.ref(source)
+        _renderlib.set_load_frame_impl(source)
+        # The frame before at full weight over an empty current frame: the
+        # result is the requested frame. Its pixels (512 KiB) would be given
+        # back to the system at once, were they freed.
+        echo = effects.recreate(_renderlib.init_tarsel_effect("T_Echo", False),
+                                {"echoes": "2", "decay": "1", "frame_step": "-1", "combine": "Maximum"})
+        dest, current = effects.raster(_renderlib.pixel_rgbaf, 256, 128), effects.raster(_renderlib.pixel_rgbaf, 256, 128)
+        assert effects.render(echo, dest, [current], frame=10)
+        print(sorted(set(numpy.frombuffer(dest[1], numpy.float32).tolist())), gone() is None)
+    """)
+    assert out.split() == ["[0.25]", "True"]
+
+
+@pytest.mark.parametrize("interface", ["GfxInterface", "LoadFrameInterface"])
+def test_a_callback_class_with_a_catch_all_getattr_is_made_and_installed(interface):
+    out = run_cleanly("""
+        import _renderlib, renderlib
+        class Null(renderlib.%s):
+            def __getattr__(self, name):
+                return lambda *args: 0
+        null = Null()
+        installed = {"GfxInterface": _renderlib.tarsel_set_gfx_impl, "LoadFrameInterface": _renderlib.set_load_frame_impl}
+        installed["%s"](null)
+        installed["%s"](None)
+        print(type(null.this).__name__, repr(null).startswith("<__main__.Null; proxy of <Swig Object"))
+    """ % ((interface,) * 3))
+    assert out.split() == ["SwigPyObject", "True"]
+
+
+def test_objects_whose_this_is_made_on_the_spot_or_is_themselves_are_refused():
+    out = run_cleanly("""
+        import _renderlib
+        class Anything:
+            def __getattr__(self, name):
+                return lambda *args: 0
+        class Itself:
+            @property
+            def this(self):
+                return self
+        for thing in (Anything(), Itself()):
+            try:
+                _renderlib.tarsel_set_gfx_impl(thing)
+            except TypeError as error:
+                print(error)
+    """)
+    assert out.splitlines() == ["in method 'tarsel_set_gfx_impl', argument 1 of type 'GfxInterface *'"] * 2
+
+
+def test_engine_vectors_kept_past_the_drawing_call_refuse_use():
+    out = run_cleanly("""
+        import _renderlib
+        from renderlib.widgets import SvgDrawing
+        %s
+        class Keeping(SvgDrawing):
+            def lines(self, xs, ys):
+                self.kept.append((xs, ys, list(xs)))
+                super().lines(xs, ys)
+        drawing = Keeping()
+        drawing.kept = []
+        _renderlib.tarsel_set_gfx_impl(drawing)
+        draw(_renderlib.init_tarsel_effect("T_Gradient", False))
+        xs, ys, copy = drawing.kept[0]
+        print(len(copy) > 0)
+        for use in (len, lambda v: v[0], list, lambda v: v.append(1.0), lambda v: v.size()):
+            try:
+                use(xs)
+                print("used")
+            except ValueError as error:
+                print(str(error).startswith("invalid null reference in method 'float_vector_"))
+    """ % DRAW)
+    assert out.split() == ["True"] * 6

@@ -67,7 +67,7 @@ private:
 // The instance whose widgets a widget call draws or moves: held for the call
 // as every instance argument is, with the call itself (see WidgetCall).
 %typemap(check, noblock=1) EffectGlobals_t *WidgetInstance (InstanceUse use, WidgetCall call) {
-  if ($1 && !use.enter($1))
+  if ($1 && !use.enter($1, proxy$argnum))
     SWIG_exception_fail(SWIG_ValueError, "in method '$symname', argument $argnum of type '$1_type': "
                         "no effect instance (freed by free_tarsel_effect)");
   if (!call.begin())

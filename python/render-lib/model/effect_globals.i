@@ -31,9 +31,11 @@ struct EffectGlobals_t {
 %mutable;
 };
 
+// Frees at once, or when the last call using the instance returns (see
+// instance_uses.i: use1 is the call's use of its argument).
+%feature("action") EffectGlobals_t::~EffectGlobals_t "use1.free_instance();"
 %extend EffectGlobals_t {
-  // Frees at once, or when the last call using the instance returns.
-  ~EffectGlobals_t() { free_effect_instance($self); }
+  ~EffectGlobals_t();
 
   std::vector<Genotype *> _get_genotypes() {
     std::vector<Genotype *> genotypes;
@@ -76,7 +78,7 @@ struct EffectGlobals_t {
   const char *__repr__() const {
     static char text[512];
     EffectGlobals_t *instance = const_cast<EffectGlobals_t *>($self);
-    if (instance_records().live(instance))
+    if (instance_records().live(instance, NULL))
       std::snprintf(text, sizeof text, "Globals(\"%s\" @%p)", printable(instance->plugin_name), (void *)instance);
     else
       std::snprintf(text, sizeof text, "Globals(freed @%p)", (void *)instance);

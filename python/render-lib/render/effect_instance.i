@@ -24,9 +24,17 @@ const char *tarsel_get_gpu_status(EffectGlobals_t *effect);
 // the proxy later frees nothing twice. An instance another call is using is
 // freed when that call returns (instance_uses.i); the engine call runs
 // without the interpreter lock.
-%apply SWIGTYPE *DISOWN { EffectGlobals_t *instance };
-%rename(free_tarsel_effect) free_effect_instance;
-void free_effect_instance(EffectGlobals_t *instance);
+%typemap(in, noblock=1) EffectGlobals_t *instance (void *argp = 0, int res = 0, SwigPyObject *proxy = 0) {
+  res = SWIG_ConvertPtr($input, &argp, $descriptor, SWIG_POINTER_DISOWN | %convertptr_flags);
+  if (!SWIG_IsOK(res)) {
+    %argument_fail(res, "$type", $symname, $argnum);
+  }
+  $1 = %reinterpret_cast(argp, $ltype);
+  proxy = $input == Py_None ? NULL : SWIG_Python_GetSwigThis($input);
+}
+%feature("action") free_tarsel_effect "use1.free_instance();"
+void free_tarsel_effect(EffectGlobals_t *instance);
+%clear EffectGlobals_t *instance;
 
 // An abort request ends the render in progress (and any render started before
 // the request is cleared) with RuntimeError "Tarsel Abort". Both keep the

@@ -3,13 +3,16 @@
 // freed it, and every wrapper that passes an instance to the engine, or reads
 // it, holds a use of it for its whole length. Freeing an instance that is in
 // use (from another thread, or from a callback of the very call that uses it)
-// only marks it freed; the last use frees it in the engine. A freed instance
-// is refused wherever it is passed, instead of followed into freed memory.
-// Everything here runs with the interpreter lock held, which guards the
-// record.
+// only marks it freed; the last use frees it in the engine.
+//
+// A freed instance is refused wherever it is passed. The proxy it was freed
+// through is marked as well: its address may be handed out again for a new
+// instance, and the old proxy must not reach that one. Everything here runs
+// with the interpreter lock held, which guards both records.
 
 %{
 #include <unordered_map>
+#include <unordered_set>
 #include "tarsel/effect.h"
 
 struct InstanceRecord {
@@ -20,18 +23,24 @@ struct InstanceRecord {
 
 class InstanceRecords {
 public:
-  void handed_out(EffectGlobals_t *instance)
+  // A new instance and the pointer object of its proxy (which may sit where a
+  // freed proxy's did).
+  void handed_out(EffectGlobals_t *instance, const void *proxy)
   {
     InstanceRecord &record = records_[instance];
     record.serial = ++serials_;
     record.uses = 0;
     record.freed = false;
+    freed_proxies_.erase(proxy);
   }
-  // The live record of `instance`, or null.
-  InstanceRecord *live(EffectGlobals_t *instance)
+  // The live record of `instance` reached through `proxy` (null for a bare
+  // address), or null.
+  InstanceRecord *live(EffectGlobals_t *instance, const void *proxy)
   {
     auto found = records_.find(instance);
-    return found == records_.end() || found->second.freed ? NULL : &found->second;
+    if (found == records_.end() || found->second.freed || (proxy && freed_proxies_.count(proxy)))
+      return NULL;
+    return &found->second;
   }
   InstanceRecord *find(EffectGlobals_t *instance, unsigned long long serial)
   {
@@ -39,8 +48,16 @@ public:
     return found == records_.end() || found->second.serial != serial ? NULL : &found->second;
   }
   void forget(EffectGlobals_t *instance) { records_.erase(instance); }
+  void proxy_freed(const void *proxy)
+  {
+    if (proxy)
+      freed_proxies_.insert(proxy);
+  }
 private:
   std::unordered_map<EffectGlobals_t *, InstanceRecord> records_;
+  // Pointer objects of proxies an instance was freed through, until another
+  // instance's proxy takes the same place.
+  std::unordered_set<const void *> freed_proxies_;
   unsigned long long serials_ = 0;
 };
 static InstanceRecords &instance_records()
@@ -65,7 +82,7 @@ static void free_in_engine(EffectGlobals_t *instance, bool report_abort)
 // One wrapper's use of an instance, from its argument check to its return.
 class InstanceUse {
 public:
-  InstanceUse() : instance_(NULL), serial_(0) {}
+  InstanceUse() : instance_(NULL), proxy_(NULL), serial_(0) {}
   ~InstanceUse()
   {
     InstanceRecord *record = instance_ ? instance_records().find(instance_, serial_) : NULL;
@@ -74,65 +91,79 @@ public:
     instance_records().forget(instance_);
     free_in_engine(instance_, false);
   }
-  // False for an instance the module did not hand out or that is freed.
-  bool enter(EffectGlobals_t *instance)
+  // False for an instance the module did not hand out or that is freed, and
+  // for a proxy an instance was freed through.
+  bool enter(EffectGlobals_t *instance, const void *proxy)
   {
-    InstanceRecord *record = instance_records().live(instance);
+    InstanceRecord *record = instance_records().live(instance, proxy);
     if (!record)
       return false;
     ++record->uses;
     instance_ = instance;
+    proxy_ = proxy;
     serial_ = record->serial;
     return true;
+  }
+  // Frees the instance this use holds: at once when no other call uses it,
+  // otherwise when the last one returns. This use is given back here.
+  void free_instance()
+  {
+    InstanceRecord *record = instance_ ? instance_records().find(instance_, serial_) : NULL;
+    if (!record)
+      return;
+    EffectGlobals_t *instance = instance_;
+    const void *proxy = proxy_;
+    instance_ = NULL;
+    instance_records().proxy_freed(proxy);
+    if (--record->uses > 0) {
+      record->freed = true;  // the last use frees
+      return;
+    }
+    instance_records().forget(instance);
+    try {
+      free_in_engine(instance, true);
+    } catch (const TarselAbortException &) {
+      instance_records().handed_out(instance, proxy);  // not freed: the host may try again
+      throw;
+    }
   }
   InstanceUse(const InstanceUse &) = delete;
   InstanceUse &operator=(const InstanceUse &) = delete;
 private:
   EffectGlobals_t *instance_;
+  const void *proxy_;
   unsigned long long serial_;
 };
-
-// Frees an instance the caller holds one use of: at once when no other call
-// uses it, otherwise when the last one returns. The caller's own use is
-// given back here.
-static void free_effect_instance(EffectGlobals_t *instance)
-{
-  InstanceRecord *record = instance_records().live(instance);
-  if (!record)
-    return;
-  if (record->uses > 1) {
-    record->freed = true;
-    return;  // the caller's use ends with its wrapper; the last use frees
-  }
-  instance_records().forget(instance);  // the caller's use finds no record and does nothing
-  try {
-    free_in_engine(instance, true);
-  } catch (const TarselAbortException &) {
-    instance_records().handed_out(instance);  // not freed: the host may try again
-    throw;
-  }
-}
 %}
 
-// EffectGlobals_t *self, EffectGlobals_t *
-// An instance passed to a method (None refused) or to a function (None passes
-// as null): held for the call; a freed instance is refused with ValueError.
+// EffectGlobals_t *
+// An instance argument: converted as SWIG does, remembering the pointer
+// object it came through, and held for the call; a freed instance is refused
+// with ValueError. None passes as null to a function, and is refused as the
+// object of a method. The identity methods (comparison, hash, repr) read no
+// engine memory and take a freed instance too.
+%typemap(in, noblock=1) EffectGlobals_t * (void *argp = 0, int res = 0, SwigPyObject *proxy = 0) {
+  res = SWIG_ConvertPtr($input, &argp, $descriptor, $disown | %convertptr_flags);
+  if (!SWIG_IsOK(res)) {
+    %argument_fail(res, "$type", $symname, $argnum);
+  }
+  $1 = %reinterpret_cast(argp, $ltype);
+  proxy = $input == Py_None ? NULL : SWIG_Python_GetSwigThis($input);
+}
 %typemap(check, noblock=1) EffectGlobals_t *self (InstanceUse use) {
   if (!$1)
     SWIG_exception_fail(SWIG_ValueError, "invalid null reference in method '$symname', argument $argnum of type '$1_type'");
-  if (!use.enter($1))
+  if (!use.enter($1, proxy$argnum))
     SWIG_exception_fail(SWIG_ValueError, "in method '$symname', argument $argnum of type '$1_type': "
                         "no effect instance (freed by free_tarsel_effect)");
 }
-// EffectGlobals_t const *self
-// The identity methods (comparison, hash, repr) read no engine memory: they
-// work on a freed instance too.
 %typemap(check, noblock=1) EffectGlobals_t const *self {
+  (void)proxy$argnum;
   if (!$1)
     SWIG_exception_fail(SWIG_ValueError, "invalid null reference in method '$symname', argument $argnum of type '$1_type'");
 }
 %typemap(check, noblock=1) EffectGlobals_t * (InstanceUse use) {
-  if ($1 && !use.enter($1))
+  if ($1 && !use.enter($1, proxy$argnum))
     SWIG_exception_fail(SWIG_ValueError, "in method '$symname', argument $argnum of type '$1_type': "
                         "no effect instance (freed by free_tarsel_effect)");
 }
@@ -140,5 +171,5 @@ static void free_effect_instance(EffectGlobals_t *instance)
 // EffectGlobals_t * (a result): recorded as handed out.
 %typemap(ret, noblock=1) EffectGlobals_t * {
   if ($1)
-    instance_records().handed_out($1);
+    instance_records().handed_out($1, SWIG_Python_GetSwigThis($result));
 }

@@ -130,3 +130,22 @@ def test_every_call_refuses_a_freed_instance():
         print(effect == effect, hash(effect) == hash(effect), repr(effect).startswith("Globals(freed @0x"))
     """)
     assert out.split() == ["True", "True", "True"]
+
+
+def test_a_freed_proxy_stays_refused_when_its_address_is_handed_out_again():
+    out = run_cleanly("""
+        import _renderlib, renderlib
+        for _ in range(100):
+            old = _renderlib.init_tarsel_effect("T_Blur", False)
+            _renderlib.free_tarsel_effect(old)
+            new = _renderlib.init_tarsel_effect("T_Blur", False)
+            if int(old.this) == int(new.this):
+                break
+        else:
+            raise SystemExit("the engine never reused an address")
+        try:
+            _renderlib.free_tarsel_effect(old)
+        except ValueError:
+            print("refused", new.plugin_name)
+    """)
+    assert out.split() == ["refused", "T_Blur"]

@@ -18,10 +18,8 @@ import sys
 import threading
 import time
 
-import numpy
-
 import _renderlib
-import renderlib
+import stress_frames
 from engine_probe import EngineProbe
 from process_memory import resident_kib
 from renderlib import effects
@@ -42,31 +40,6 @@ counts = {"renders": 0, "aborted": 0, "refused": 0, "draws": 0, "draws refused":
 faults = []
 
 
-def colour(input, frame):
-    return (0.1 + 0.1 * frame, 0.5 - 0.05 * frame, 0.2 + 0.3 * input, 1.0)
-
-
-class Frames(renderlib.LoadFrameInterface):
-    """Frames of one colour per (input, frame); several renders ask at once,
-    so the descriptor of a request is kept per engine thread."""
-
-    def __init__(self):
-        super().__init__()
-        self.current = {}
-        self.lock = threading.Lock()
-
-    def load_frame(self, input, frame, width, height):
-        info, pixels = effects.raster(_renderlib.pixel_rgbaf, width, height)
-        numpy.frombuffer(pixels, numpy.float32).reshape(-1, 4)[:] = colour(input, frame)
-        with self.lock:
-            self.current[(threading.get_ident(), input)] = (info, pixels)
-        return pixels
-
-    def current_raster_info(self, input):
-        with self.lock:
-            return self.current[(threading.get_ident(), input)][0]
-
-
 class Drawing(SvgDrawing):
     """Draws nothing anywhere; now and then frees the instance it draws."""
 
@@ -84,18 +57,14 @@ def make(name, params):
 
 
 def render(instance, frame):
-    dest = effects.raster(_renderlib.pixel_rgbaf, WIDTH, HEIGHT)
-    source = effects.raster(_renderlib.pixel_rgbaf, WIDTH, HEIGHT)
-    numpy.frombuffer(source[1], numpy.float32).reshape(-1, 4)[:] = colour(0, frame)
-    ok = effects.render(instance, dest, [source], frame=frame)
-    return ok, bytes(dest[1])
+    return stress_frames.render(instance, frame, WIDTH, HEIGHT)
 
 
 def expected_error(error, *texts):
     return any(str(error).startswith(text) or str(error).endswith(text) for text in texts)
 
 
-installed = {"frames": Frames(), "drawing": Drawing()}
+installed = {"frames": stress_frames.SharedFrameSource(), "drawing": Drawing()}
 _renderlib.set_load_frame_impl(installed["frames"])
 _renderlib.tarsel_set_gfx_impl(installed["drawing"])
 _renderlib.set_error_handler(lambda level, text: None)
@@ -171,7 +140,7 @@ def swapper():
         # Each new object is installed first; the one before then loses its
         # last reference, often while the engine is using it.
         if choice == 0:
-            frames = Frames()
+            frames = stress_frames.SharedFrameSource()
             _renderlib.set_load_frame_impl(frames)
             installed["frames"] = frames
             counts["sources swapped"] += 1

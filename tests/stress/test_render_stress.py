@@ -10,10 +10,8 @@ import random
 import threading
 import time
 
-import numpy
-
 import _renderlib
-import renderlib
+import stress_frames
 from engine_probe import EngineProbe
 from process_memory import UNDER_ADDRESS_SANITIZER, resident_kib
 from renderlib import effects
@@ -25,47 +23,14 @@ EFFECTS = [("T_Echo", {"echoes": "3"}), ("T_TimeBlur", {"frames_before": "2", "f
            ("T_Echo", {"combine": "Maximum", "frame_step": "2"}), ("T_TimeBlur", {"amount": "0.5"})]
 
 
-def colour(input, frame):
-    return (0.1 + 0.1 * (frame % 8), 0.5 - 0.05 * (frame % 8), 0.2 + 0.3 * input, 1.0)
-
-
-class SharedFrameSource(renderlib.LoadFrameInterface):
-    """One source for every render: a request's descriptor is kept per
-    engine thread, since several renders ask at once."""
-
-    def __init__(self):
-        super().__init__()
-        self.current = {}
-        self.kept = {}
-        self.lock = threading.Lock()
-
-    def load_frame(self, input, frame, width, height):
-        info, pixels = effects.raster(_renderlib.pixel_rgbaf, width, height)
-        numpy.frombuffer(pixels, numpy.float32).reshape(-1, 4)[:] = colour(input, frame)
-        key = (threading.get_ident(), input)
-        with self.lock:
-            self.current[key] = info
-            self.kept[key] = pixels  # referenced until this thread's next request
-        return pixels
-
-    def current_raster_info(self, input):
-        with self.lock:
-            return self.current[(threading.get_ident(), input)]
-
-
 def render(instance, frame):
-    """(True, pixels) or (False, engine messages are the caller's) for one frame."""
-    dest = effects.raster(_renderlib.pixel_rgbaf, WIDTH, HEIGHT)
-    source = effects.raster(_renderlib.pixel_rgbaf, WIDTH, HEIGHT)
-    numpy.frombuffer(source[1], numpy.float32).reshape(-1, 4)[:] = colour(0, frame)
-    ok = effects.render(instance, dest, [source], frame=frame)
-    return ok, bytes(dest[1])
+    return stress_frames.render(instance, frame, WIDTH, HEIGHT)
 
 
 def test_renders_aborts_messages_and_instances_all_at_once():
     probe = EngineProbe()
     instances_before = probe.live_instances()
-    source = SharedFrameSource()
+    source = stress_frames.SharedFrameSource()
     messages = [0]  # counted, not kept: a list of every message would grow by megabytes
 
     def count_message(level, text):

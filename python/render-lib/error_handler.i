@@ -62,8 +62,14 @@ static void forward_engine_message(int level, const char *message)
     return;  // the interpreter is ending: the message has nowhere to go
   PyGILState_STATE gil = PyGILState_Ensure();
   // Read again under the lock: the handler may have been removed meanwhile.
-  if (installed_error_handler)
-    PyObject_CallFunction(installed_error_handler, "(is)", level, message);
+  // Held for the call, which may replace it (the handler itself, or another
+  // thread while the handler runs) and so drop the module's reference.
+  PyObject *handler = installed_error_handler;
+  if (handler) {
+    Py_INCREF(handler);
+    PyObject_CallFunction(handler, "(is)", level, message);
+    Py_DECREF(handler);
+  }
   PyGILState_Release(gil);
 }
 

@@ -7,6 +7,7 @@ import pathlib
 import subprocess
 import sys
 import textwrap
+import time
 
 import _renderlib
 import renderlib  # noqa: F401  (registers the proxy classes)
@@ -74,7 +75,23 @@ class Peer:
         assert self.process.returncode == 0, err
         return out
 
-    def kill(self):
-        """Ends the peer with SIGKILL, wherever it is, and waits for it."""
+    def kill(self, reap=True):
+        """Ends the peer with SIGKILL, wherever it is, and waits for it, or
+        leaves it unreaped (a zombie) until reap() when `reap` is false."""
         self.process.kill()
+        if reap:
+            self.reap()
+        else:
+            while not self.dead():
+                time.sleep(0.001)
+
+    def dead(self):
+        """Whether the peer has died, reaped or not."""
+        try:
+            with open("/proc/%d/stat" % self.process.pid) as stat:
+                return stat.read().rsplit(")", 1)[1].split()[0] in "ZX"
+        except FileNotFoundError:
+            return True
+
+    def reap(self):
         self.process.communicate()

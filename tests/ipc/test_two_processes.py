@@ -2,7 +2,10 @@
 a writer blocked on a full queue, and peers that die at the worst moments."""
 import time
 
+import pytest
+
 import _renderlib
+from isolated import run_cleanly
 from segments import Peer, serve
 
 E = _renderlib
@@ -159,20 +162,53 @@ time.sleep(60)
     server.remove()
 
 
-def test_a_dead_peer_ends_a_blocking_wait(name):
-    server = serve(name, QUEUE, QUEUE)
-    peer = Peer("""
-transport = _renderlib.ShmemManager_connect(name)
-print("connected", flush=True)
-time.sleep(60)
-""", name)
-    assert peer.line() == "connected"
-    peer.kill()
+# The host starts its peer itself, so a killed peer stays a zombie until the
+# host reaps it, and a host blocked in a transport call cannot: dead is dead,
+# reaped or not. The host runs in a process of its own, since a wait that
+# never ends would hang whoever runs it.
+DEAD_PEER = """
+import subprocess, sys, time
+import _renderlib, renderlib
+from segments import Peer
+
+name, reaped, side = sys.argv[1], sys.argv[2] == "reaped", sys.argv[3]
+if side == "client":  # the peer connects; this process serves
+    here = _renderlib.ShmemManager_serve(name, %(queue)d, %(queue)d)
+    peer = Peer("t = _renderlib.ShmemManager_connect(name); print('ready', flush=True); time.sleep(60)", name)
+else:  # the peer serves; this process connects
+    peer = Peer("t = _renderlib.ShmemManager_serve(name, %(queue)d, %(queue)d); print('ready', flush=True); "
+                "time.sleep(60)", name)
+    assert peer.line() == "ready"
+    here = _renderlib.ShmemManager_connect(name)
+assert side == "server" or peer.line() == "ready"
+while here.try_write_pybuf(bytes(1000)):
+    pass  # full: a write or a reservation waits for the peer to read
+peer.kill(reap=reaped)
+waits = {"read": here.read_pybuf, "timed read": lambda: here.timed_read_pybuf(5.0),
+         "write": lambda: here.write_pybuf(bytes(1000)), "reserve": lambda: here.reserve_pybuf(1000)}
+for what, wait in waits.items():
     start = time.perf_counter()
-    assert server.read_pybuf() is None  # would wait for ever for a live peer
-    assert server.get_last_error() == E.ShmemError_RETRY
-    assert time.perf_counter() - start < 1.0
-    server.remove()
+    result = wait()
+    print(what, bool(result), here.get_last_error(), time.perf_counter() - start < 0.25)
+if side == "server":
+    again = _renderlib.ShmemManager_serve(name, %(queue)d, %(queue)d)  # the dead server's segment is taken back
+    print("served again", again is not None)
+    again.remove()
+else:
+    print("client alive", here.client_pid_exists())
+    here.remove()
+peer.reap()
+""" % {"queue": QUEUE}
+
+
+@pytest.mark.parametrize("reaped", ["reaped", "not reaped"])
+@pytest.mark.parametrize("side", ["client", "server"], ids=["dead client", "dead server"])
+def test_a_dead_peer_ends_every_blocking_wait(name, side, reaped):
+    out = run_cleanly(DEAD_PEER, timeout=30, args=[name, reaped, side]).splitlines()
+    # Nothing read or sent, RETRY, within one wait slice (50 ms) and a margin.
+    assert out[:4] == ["%s False %d True" % (what, E.ShmemError_RETRY)
+                       for what in ("read", "timed read", "write", "reserve")]
+    assert out[4] == ("served again True" if side == "server" else "client alive False")
 
 
 def test_the_segment_removed_under_a_blocked_reader(name):

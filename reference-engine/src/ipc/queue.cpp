@@ -2,6 +2,7 @@
 #include "ipc/queue.h"
 
 #include <errno.h>
+#include <fcntl.h>
 #include <linux/futex.h>
 #include <signal.h>
 #include <sys/syscall.h>
@@ -9,6 +10,7 @@
 
 #include <climits>
 #include <cmath>
+#include <cstdio>
 #include <cstring>
 
 namespace tarsel_ref {
@@ -216,7 +218,25 @@ void copy_description(char field[24], const char *desc) {
 
 bool process_exists(int32_t pid) {
   if (pid <= 0) return false;
-  return kill(pid, 0) == 0 || errno == EPERM;
+  if (kill(pid, 0) != 0 && errno != EPERM) return false;
+#if defined(__linux__)
+  // A process that has died but that its parent has not reaped yet (the host
+  // that started its helper, say) still answers kill(); its state in /proc is
+  // Z (zombie) or X (dead). The state follows the command name, whose closing
+  // parenthesis is the last in the line.
+  char path[32];
+  std::snprintf(path, sizeof path, "/proc/%d/stat", static_cast<int>(pid));
+  const int fd = open(path, O_RDONLY | O_CLOEXEC);
+  if (fd < 0) return errno != ENOENT;  // gone between the two looks
+  char stat[512];
+  const ssize_t length = read(fd, stat, sizeof stat - 1);
+  close(fd);
+  if (length <= 0) return true;
+  stat[length] = '\0';
+  const char *end_of_name = std::strrchr(stat, ')');
+  if (end_of_name && end_of_name[1] == ' ' && (end_of_name[2] == 'Z' || end_of_name[2] == 'X')) return false;
+#endif
+  return true;
 }
 
 }  // namespace ipc

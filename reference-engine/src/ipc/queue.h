@@ -161,7 +161,8 @@ private:
 // and zero-filled when shorter, all zeros for null.
 void copy_description(char field[24], const char *desc);
 
-// Whether a process of that id exists (it may belong to another user).
+// Whether a process of that id is alive (it may belong to another user); a
+// dead process that its parent has not reaped yet is not.
 bool process_exists(int32_t pid);
 
 }  // namespace ipc

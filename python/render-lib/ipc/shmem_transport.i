@@ -1,7 +1,7 @@
 // One end of a shared-memory message transport, made by ShmemManager. Reads
 // and reservations hand out memoryviews over the segment itself; writes pass
 // the caller's buffer to the engine as it is. Nothing here releases the
-// interpreter lock, also while a transport call waits.
+// interpreter lock, also while a transport call waits; a signal ends the wait.
 
 %{
 // A memoryview over engine memory with no owner object: read-only for
@@ -62,6 +62,28 @@ private:
   bool held_;
 };
 %}
+
+// The waiting calls: the blocking and timed forms.
+// The engine ends a wait early, with nothing taken or sent, when a signal
+// handler has run (Ctrl-C); the call then lets the interpreter run the
+// signal's Python handler, so KeyboardInterrupt (or whatever it raises) comes
+// from the call at once instead of after the wait. A handler that raises
+// nothing leaves the call's own answer: None or False, with RETRY.
+%typemap(ret, noblock=1) PyObject *SignalEndsWait {
+  if ($result == Py_None && !PyErr_Occurred() && PyErr_CheckSignals() < 0) {
+    Py_DECREF($result);
+    return NULL;  // the arguments are freed already: not SWIG_fail
+  }
+}
+%typemap(ret, noblock=1) bool SignalEndsWait {
+  if (!result && !PyErr_Occurred() && PyErr_CheckSignals() < 0) {
+    Py_DECREF($result);
+    return NULL;  // the arguments are freed already: not SWIG_fail
+  }
+}
+%apply PyObject *SignalEndsWait { PyObject *read_pybuf, PyObject *timed_read_pybuf, PyObject *read_pybuf_and_retry,
+                                  PyObject *reserve_pybuf, PyObject *timed_reserve_pybuf };
+%apply bool SignalEndsWait { bool write_pybuf, bool timed_write_pybuf, bool write_string, bool timed_write_string };
 
 namespace Tarsel {
 namespace IPC {

@@ -188,11 +188,13 @@ void Queue::release_read(PendingWakes *wakes) {
   }
 }
 
-void Queue::sleep(uint32_t *word, uint32_t seen, int64_t until) {
+bool Queue::sleep(uint32_t *word, uint32_t seen, int64_t until) {
   const timespec at = to_timespec(until);
   // Shared between processes, so not FUTEX_PRIVATE_FLAG; the bitset form
-  // takes an absolute CLOCK_MONOTONIC time.
-  syscall(SYS_futex, word, FUTEX_WAIT_BITSET, seen, &at, nullptr, FUTEX_BITSET_MATCH_ANY);
+  // takes an absolute CLOCK_MONOTONIC time. The kernel never restarts this
+  // wait after a signal handler: it answers EINTR.
+  return !(syscall(SYS_futex, word, FUTEX_WAIT_BITSET, seen, &at, nullptr, FUTEX_BITSET_MATCH_ANY) == -1 &&
+           errno == EINTR);
 }
 
 void Queue::wake_all(uint32_t *word) { syscall(SYS_futex, word, FUTEX_WAKE, INT_MAX, nullptr, nullptr, 0); }

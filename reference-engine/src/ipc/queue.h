@@ -141,8 +141,9 @@ public:
   // Releases the messages read so far (their space returns to the writer).
   void release_read(PendingWakes *wakes);
 
-  // Sleeps while `*word` holds `seen`, until `until` (CLOCK_MONOTONIC ns).
-  static void sleep(uint32_t *word, uint32_t seen, int64_t until);
+  // Sleeps while `*word` holds `seen`, until `until` (CLOCK_MONOTONIC ns);
+  // false when a signal handler ran meanwhile (the host may want to stop).
+  static bool sleep(uint32_t *word, uint32_t seen, int64_t until);
   // Wakes every thread asleep on `word`.
   static void wake_all(uint32_t *word);
   // Sends the wake-ups owed (the lock released).

@@ -39,6 +39,7 @@ struct ThreadOutcome {
 constexpr int kThreadOutcomes = 8;
 thread_local ThreadOutcome thread_outcomes[kThreadOutcomes];
 thread_local unsigned thread_outcome_next = 0;
+thread_local bool wait_interrupted = false;
 
 }  // namespace
 
@@ -137,6 +138,7 @@ bool Endpoint::peer_gone(int64_t now) {
 template <typename Ready>
 ShmemError Endpoint::wait_until(Queue &queue, bool for_data, const Deadline &deadline, PendingWakes *wakes,
                                 Ready ready) {
+  wait_interrupted = false;
   QueueControl &control = queue.control();
   uint32_t *word = for_data ? &control.data_seq : &control.space_seq;
   uint32_t *waiting = for_data ? &control.readers_waiting : &control.writers_waiting;
@@ -181,12 +183,18 @@ ShmemError Endpoint::wait_until(Queue &queue, bool for_data, const Deadline &dea
     __atomic_fetch_add(waiting, 1u, __ATOMIC_SEQ_CST);
     queue.unlock();
     queue.wake(wakes);
-    Queue::sleep(word, seen, deadline.slice_end(monotonic_nanoseconds()));
+    const bool slept = Queue::sleep(word, seen, deadline.slice_end(monotonic_nanoseconds()));
     __atomic_fetch_sub(waiting, 1u, __ATOMIC_SEQ_CST);
+    if (!slept) {
+      wait_interrupted = true;
+      return ShmemError::RETRY;  // the lock is not held: nothing to give back
+    }
     const ShmemError locked = queue.lock(deadline);
     if (locked != ShmemError::SHMEM_NO_ERROR) return locked;
   }
 }
+
+bool Endpoint::interrupted() { return wait_interrupted; }
 
 std::size_t Endpoint::receive(void **data, MessageHeader_t **header, const Deadline &deadline) {
   if (data) *data = nullptr;
@@ -220,12 +228,15 @@ std::size_t Endpoint::receive_retrying(void **data, MessageHeader_t **header, do
     const ShmemError error = last_error();
     if (error != ShmemError::RETRY && error != ShmemError::LOCK_ERROR) return size;
     const int64_t now = monotonic_nanoseconds();
-    if (deadline.passed(now)) return size;
+    if (deadline.passed(now) || interrupted()) return size;
     // Look again shortly; never past the deadline.
     const int64_t pause = 1000 * 1000;
     const int64_t until = deadline.kind == Deadline::kUntil && deadline.at < now + pause ? deadline.at : now + pause;
     timespec ts{static_cast<time_t>((until - now) / 1000000000), static_cast<long>((until - now) % 1000000000)};
-    nanosleep(&ts, nullptr);
+    if (nanosleep(&ts, nullptr) != 0 && errno == EINTR) {
+      wait_interrupted = true;
+      return size;
+    }
   }
 }
 

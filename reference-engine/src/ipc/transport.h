@@ -49,6 +49,9 @@ public:
   // The calling thread's last outcome on this transport; the transport's last
   // outcome on any thread when this thread has none recorded.
   ShmemError last_error() const;
+  // Whether the calling thread's last wait on any transport was ended by a
+  // signal.
+  static bool interrupted();
 
   // Leaves the mapping alone from now on (for an endpoint discarded before
   // use: its maker unmaps).
@@ -61,7 +64,9 @@ private:
   // Waits, the queue locked, until `ready` gives NO_ERROR (the lock is then
   // still held) or the operation fails (the lock is then released, `wakes`
   // sent). `for_data`: a reader waiting for a message, else a writer waiting
-  // for room.
+  // for room. A signal handler that runs while it sleeps ends the wait with
+  // RETRY, nothing taken or sent, so that a host can act on the signal
+  // (Ctrl-C) at once; interrupted() then says so.
   template <typename Ready>
   ShmemError wait_until(Queue &queue, bool for_data, const Deadline &deadline, PendingWakes *wakes, Ready ready);
   // Whether the process at the other end is gone (a client not yet connected

@@ -225,3 +225,37 @@ print(view, transport.get_last_error(), round(time.monotonic() - start, 2))
     assert server.remove()
     view, error, waited = peer.finish().split()
     assert view == "None" and int(error) == E.ShmemError_INVALID_SEGMENT and float(waited) < 1.5
+
+
+# Any process of the same user can shrink a segment's object under the
+# processes using it. Touching a lost page would end them with SIGBUS.
+TRUNCATED = """
+import os, sys, time
+import _renderlib, renderlib
+from segments import Peer, segment_file
+
+name, size = sys.argv[1], int(sys.argv[2])
+server = _renderlib.ShmemManager_serve(name, %(queue)d, %(queue)d)
+peer = Peer("t = _renderlib.ShmemManager_connect(name); t.write_pybuf(b'kept in view'); "
+            "print('reading', flush=True); "
+            "print(t.read_pybuf(), t.get_last_error(), t.is_segment_valid(), flush=True)", name)
+assert peer.line() == "reading"
+view = server.read_pybuf()
+time.sleep(0.2)  # the peer sleeps in its read
+os.truncate(str(segment_file(name)), size)
+print("valid", server.is_segment_valid())
+print("write", server.write_pybuf(b"x"), server.get_last_error())
+print("read", server.try_read_pybuf(), server.get_last_error())
+print("view", bytes(view) in (b"kept in view", bytes(12)))
+print("peer", peer.line())
+peer.finish()
+_renderlib.ShmemManager_reset(name, True)
+""" % {"queue": QUEUE}
+
+
+@pytest.mark.parametrize("size", [0, 4096], ids=["to nothing", "to its header"])
+def test_a_segment_truncated_under_its_transports(name, size):
+    out = run_cleanly(TRUNCATED, timeout=30, args=[name, size]).splitlines()
+    invalid = E.ShmemError_INVALID_SEGMENT
+    assert out == ["valid False", "write False %d" % invalid, "read None %d" % invalid, "view True",
+                   "peer None %d False" % invalid]

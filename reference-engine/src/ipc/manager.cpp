@@ -16,6 +16,7 @@
 #include "core/messages.h"
 #include "ipc/segment.h"
 #include "ipc/transport.h"
+#include "ipc/truncation.h"
 #include "tarsel/errors.h"
 #include "tarsel/ipc.h"
 
@@ -47,6 +48,8 @@ bool map_object(int fd, Mapping *mapping) {
   mapping->size = static_cast<std::size_t>(info.st_size);
   mapping->device = info.st_dev;
   mapping->inode = info.st_ino;
+  mapping->truncated = guard_mapping(bytes, mapping->size);
+  mapping->fd = fcntl(fd, F_DUPFD_CLOEXEC, 0);
   return true;
 }
 
@@ -60,7 +63,10 @@ bool open_object(const std::string &object, Mapping *mapping) {
 }
 
 void unmap(const Mapping &mapping) {
-  if (mapping.bytes) munmap(mapping.bytes, mapping.size);
+  if (!mapping.bytes) return;
+  unguard_mapping(mapping.bytes);
+  munmap(mapping.bytes, mapping.size);
+  if (mapping.fd >= 0) close(mapping.fd);
 }
 
 bool init_lock(pthread_mutex_t *lock) {

@@ -61,8 +61,9 @@ int64_t Deadline::slice_end(int64_t now) const {
   return kind == kUntil && at < end ? at : end;
 }
 
-Queue::Queue(SegmentHeader *header, int index, unsigned char *segment)
+Queue::Queue(SegmentHeader *header, int index, unsigned char *segment, const std::atomic<bool> *truncated)
     : header_(header),
+      truncated_(truncated),
       control_(&header->queue[index]),
       ring_(segment + header->ring_offset[index]),
       capacity_(header->capacity[index]) {}
@@ -99,6 +100,7 @@ ShmemError Queue::lock(const Deadline &deadline) {
 void Queue::unlock() { pthread_mutex_unlock(&control_->lock); }
 
 bool Queue::intact() const {
+  if (truncated_ && truncated_->load(std::memory_order_acquire)) return false;
   return load(header_->magic) == kSegmentMagic && load(header_->layout_version) == kLayoutVersion &&
          load(header_->removed) == 0;
 }

@@ -6,6 +6,7 @@
 #include <sched.h>
 #include <time.h>
 
+#include <atomic>
 #include <cstdint>
 
 #include "ipc/segment.h"
@@ -107,7 +108,8 @@ struct PendingWakes {
 
 class Queue {
 public:
-  Queue(SegmentHeader *header, int index, unsigned char *segment);
+  // `truncated`: the mapping's flag (truncation.h), null for a passing look.
+  Queue(SegmentHeader *header, int index, unsigned char *segment, const std::atomic<bool> *truncated = nullptr);
 
   SegmentHeader *header() const { return header_; }
   QueueControl &control() const { return *control_; }
@@ -121,7 +123,8 @@ public:
   ShmemError lock(const Deadline &deadline);
   void unlock();
 
-  // Whether the segment still carries its identity and is not removed.
+  // Whether the segment still carries its identity, is not removed and was
+  // not truncated under this process.
   bool intact() const;
 
   // Finds room for a message of `footprint` bytes: NO_ERROR and the
@@ -153,6 +156,7 @@ public:
 
 private:
   SegmentHeader *header_;
+  const std::atomic<bool> *truncated_;
   QueueControl *control_;
   unsigned char *ring_;
   uint64_t capacity_;

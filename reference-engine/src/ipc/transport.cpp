@@ -12,6 +12,7 @@
 #include <unordered_map>
 
 #include "core/entry.h"
+#include "ipc/truncation.h"
 
 namespace tarsel_ref {
 namespace ipc {
@@ -79,8 +80,8 @@ Endpoint::Endpoint(const Mapping &mapping, bool server, std::string object)
       server_(server),
       object_(std::move(object)),
       serial_(++endpoint_serials),
-      out_(mapping.header(), server ? kServerToClient : kClientToServer, mapping.bytes),
-      in_(mapping.header(), server ? kClientToServer : kServerToClient, mapping.bytes) {}
+      out_(mapping.header(), server ? kServerToClient : kClientToServer, mapping.bytes, mapping.truncated),
+      in_(mapping.header(), server ? kClientToServer : kServerToClient, mapping.bytes, mapping.truncated) {}
 
 Endpoint::~Endpoint() {
   if (!mapping_.bytes) return;
@@ -96,7 +97,9 @@ Endpoint::~Endpoint() {
     __atomic_compare_exchange_n(&mapping_.header()->client_pid, &own, 0, false, __ATOMIC_SEQ_CST,
                                 __ATOMIC_SEQ_CST);
   }
+  unguard_mapping(mapping_.bytes);
   munmap(mapping_.bytes, mapping_.size);
+  if (mapping_.fd >= 0) close(mapping_.fd);
 }
 
 void Endpoint::record(ShmemError error) {
@@ -135,6 +138,14 @@ bool Endpoint::peer_gone(int64_t now) {
   return !checked_alive_;
 }
 
+bool Endpoint::object_shrunk(int64_t now) {
+  std::lock_guard<std::mutex> lock(peer_mutex_);
+  if (now - sized_at_ < kWaitSliceNanoseconds) return false;
+  sized_at_ = now;
+  struct stat info;
+  return mapping_.fd >= 0 && fstat(mapping_.fd, &info) == 0 && static_cast<std::size_t>(info.st_size) < mapping_.size;
+}
+
 template <typename Ready>
 ShmemError Endpoint::wait_until(Queue &queue, bool for_data, const Deadline &deadline, PendingWakes *wakes,
                                 Ready ready) {
@@ -154,6 +165,8 @@ ShmemError Endpoint::wait_until(Queue &queue, bool for_data, const Deadline &dea
       const int64_t now = monotonic_nanoseconds();
       if (deadline.passed(now))
         state = ShmemError::TIMEOUT;
+      else if (object_shrunk(now))
+        state = ShmemError::INVALID_SEGMENT;
       else if (!peer_gone(now))
         state = ShmemError::SHMEM_NO_ERROR;  // wait
     }
@@ -207,6 +220,11 @@ std::size_t Endpoint::receive(void **data, MessageHeader_t **header, const Deadl
   Located message;
   error = wait_until(in_, true, deadline, &wakes, [&] { return in_.locate(&message); });
   if (error != ShmemError::SHMEM_NO_ERROR) return fail(error, in_, false), 0;
+  if (!in_.intact()) {  // the message's pages went while it was looked at
+    in_.unlock();
+    in_.wake(&wakes);
+    return fail(ShmemError::INVALID_SEGMENT, in_, false), 0;
+  }
   if (!query) {
     QueueControl &control = in_.control();
     store(control.read_pos, message.end);
@@ -294,6 +312,11 @@ bool Endpoint::send(const void *data, std::size_t size, const char *desc, const 
   if (error != ShmemError::SHMEM_NO_ERROR) return fail(error, out_, true), false;
   reserved_ = false;  // the message takes an open reservation's place
   if (size) std::memcpy(out_.ring() + placement.offset + kMessageHeaderBytes, data, size);
+  if (!out_.intact()) {  // the pages written went meanwhile: nothing is published
+    out_.unlock();
+    out_.wake(&wakes);
+    return fail(ShmemError::INVALID_SEGMENT, out_, true), false;
+  }
   char field[24];
   copy_description(field, desc);
   out_.publish(placement, size, field, &wakes);
@@ -320,6 +343,11 @@ bool Endpoint::remove() {
 }
 
 bool Endpoint::segment_valid() const {
+  if (mapping_.truncated && mapping_.truncated->load(std::memory_order_acquire)) return false;
+  // A truncation whose lost pages nobody has touched yet shows in the size.
+  struct stat info;
+  if (mapping_.fd >= 0 && fstat(mapping_.fd, &info) == 0 && static_cast<std::size_t>(info.st_size) < mapping_.size)
+    return false;
   const SegmentHeader *header = mapping_.header();
   return check_segment(mapping_.bytes, mapping_.size, nullptr) && load(header->removed) == 0 &&
          header->capacity[kServerToClient] == capacity_of(kServerToClient) &&

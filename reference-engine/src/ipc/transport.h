@@ -23,6 +23,8 @@ struct Mapping {
   std::size_t size = 0;
   dev_t device = 0;  // identity of the object, to tell it from a later one of the same name
   ino_t inode = 0;
+  const std::atomic<bool> *truncated = nullptr;  // see truncation.h
+  int fd = -1;  // the object, kept open to see its size
 
   SegmentHeader *header() const { return reinterpret_cast<SegmentHeader *>(bytes); }
 };
@@ -72,6 +74,10 @@ private:
   // Whether the process at the other end is gone (a client not yet connected
   // is not gone: a server waits for one). Looks at most every wait slice.
   bool peer_gone(int64_t now);
+  // Whether the segment's object is smaller than its mapping (truncated by
+  // some process, its lost pages not touched here yet). Looks at most every
+  // wait slice.
+  bool object_shrunk(int64_t now);
   ShmemError fail(ShmemError error, Queue &queue, bool writing);
   void record(ShmemError error);
   // Capacity of queue `index` as this end mapped it.
@@ -99,6 +105,7 @@ private:
   int32_t checked_pid_ = 0;
   bool checked_alive_ = false;
   int64_t checked_at_ = 0;
+  int64_t sized_at_ = 0;  // the last look at the object's size
 };
 
 // Live transports, so that freeing and the test probe can tell a transport of

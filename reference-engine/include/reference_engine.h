@@ -522,9 +522,13 @@
 //   2; then it sleeps until the peer publishes a message, frees room or
 //   releases the lock, waking at least every 50 ms to look at the segment
 //   and the peer: when the peer process has ended (for a server, its
-//   connected client's; for a client, the server's) the wait ends with
-//   RETRY, so a survivor never hangs. A server with no client connected
-//   waits for one. Reads, reservations and writes that need not wait make
+//   connected client's; for a client, the server's; a dead process that its
+//   parent has not reaped yet has ended) the wait ends with RETRY, so a
+//   survivor never hangs. A server with no client connected waits for one.
+//   While a call waits, the signals a host handles are held back (faults
+//   excepted); one that comes ends the wait within a slice, with RETRY and
+//   nothing taken or sent, and is let through as the call returns, so that
+//   the host acts on it at once (a wait for the lock is not ended so). Reads, reservations and writes that need not wait make
 //   no system call (wake-ups go to sleepers only).
 //   Reads: read(&data, &header) takes the next message and returns its body
 //   size, *data pointing to its body and *header to its header, both inside
@@ -559,7 +563,8 @@
 //   none sees the transport's last outcome on any thread.
 //     MSG_TOO_LARGE    64 + the padded body exceeds the queue's capacity.
 //     RETRY            a try_ form would wait (for a message, room or the
-//                      lock); a waiting call's peer process has ended.
+//                      lock); a waiting call's peer process has ended; a
+//                      signal came while a call waited.
 //     TIMEOUT          a timed form ran out of time (waiting for a message,
 //                      room or the lock).
 //     LOCK_ERROR       the queue's lock cannot be taken: it was left
@@ -571,8 +576,11 @@
 //                      reclaiming the name: every sleeper of both ends wakes
 //                      with it, at once, or within 50 ms one waiting for a
 //                      lock), its header no longer reads as one of this
-//                      layout, or its positions or message headers are
-//                      inconsistent. The mapping stays until the transport
+//                      layout, its positions or message headers are
+//                      inconsistent, or its object was truncated under this
+//                      process (ipc/truncation.h: a touch of a lost page gets
+//                      zero pages instead of SIGBUS; waits and
+//                      is_segment_valid look at the object's size). The mapping stays until the transport
 //                      is freed, so a removed segment never faults.
 //   remove(): marks the segment removed, wakes every sleeper and unlinks the
 //   name; true when it did; false (INVALID_SEGMENT) when the segment was

@@ -249,7 +249,7 @@ const char *Tarsel::IPC::shmem_error_to_string(ShmemError error) {
     case ShmemError::LOCK_ERROR:
       return "the segment's lock cannot be taken";
     case ShmemError::RETRY:
-      return "try again: the operation would have to wait, or the peer process is gone";
+      return "try again: the operation would have to wait, the peer process is gone, or a signal came";
     case ShmemError::MSG_TOO_LARGE:
       return "message too large for the queue";
   }

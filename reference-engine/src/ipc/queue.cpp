@@ -190,13 +190,46 @@ void Queue::release_read(PendingWakes *wakes) {
   }
 }
 
-bool Queue::sleep(uint32_t *word, uint32_t seen, int64_t until) {
+void Queue::sleep(uint32_t *word, uint32_t seen, int64_t until) {
   const timespec at = to_timespec(until);
   // Shared between processes, so not FUTEX_PRIVATE_FLAG; the bitset form
-  // takes an absolute CLOCK_MONOTONIC time. The kernel never restarts this
-  // wait after a signal handler: it answers EINTR.
-  return !(syscall(SYS_futex, word, FUTEX_WAIT_BITSET, seen, &at, nullptr, FUTEX_BITSET_MATCH_ANY) == -1 &&
-           errno == EINTR);
+  // takes an absolute CLOCK_MONOTONIC time.
+  syscall(SYS_futex, word, FUTEX_WAIT_BITSET, seen, &at, nullptr, FUTEX_BITSET_MATCH_ANY);
+}
+
+namespace {
+
+sigset_t host_signals() {
+  sigset_t signals;
+  sigfillset(&signals);
+  for (int fault : {SIGBUS, SIGSEGV, SIGILL, SIGFPE, SIGTRAP, SIGSYS}) sigdelset(&signals, fault);
+  return signals;
+}
+
+}  // namespace
+
+namespace {
+
+thread_local int signals_held_depth = 0;
+thread_local sigset_t mask_before_held;  // the thread's own mask, outside every holder
+
+}  // namespace
+
+SignalsHeldBack::SignalsHeldBack() {
+  static const sigset_t held = host_signals();
+  if (signals_held_depth++ == 0) pthread_sigmask(SIG_BLOCK, &held, &mask_before_held);
+}
+
+SignalsHeldBack::~SignalsHeldBack() {
+  if (--signals_held_depth == 0) pthread_sigmask(SIG_SETMASK, &mask_before_held, nullptr);
+}
+
+bool SignalsHeldBack::signal_waiting() {
+  sigset_t pending;
+  if (sigpending(&pending) != 0) return false;
+  for (int signal = 1; signal < NSIG; ++signal)
+    if (sigismember(&pending, signal) == 1 && sigismember(&mask_before_held, signal) == 0) return true;
+  return false;
 }
 
 void Queue::wake_all(uint32_t *word) { syscall(SYS_futex, word, FUTEX_WAKE, INT_MAX, nullptr, nullptr, 0); }

@@ -4,6 +4,7 @@
 #pragma once
 
 #include <sched.h>
+#include <signal.h>
 #include <time.h>
 
 #include <atomic>
@@ -82,6 +83,32 @@ struct Deadline {
   int64_t slice_end(int64_t now) const;
 };
 
+// Holds back, while a call waits, the signals a host handles (not the
+// faults: SIGBUS, SIGSEGV and their kind still come at once). A signal that
+// came while the wait was on its way to sleep would otherwise be handled
+// before the sleep and missed by it, and the sleep would go on for ever; held
+// back, it stays pending, and the wait looks for one before each sleep and
+// after each sleep slice. It is let through, and handled, when the call
+// returns. Holders nest (a retrying read holds them across its reads).
+class SignalsHeldBack {
+public:
+  SignalsHeldBack();
+  ~SignalsHeldBack();
+  SignalsHeldBack(const SignalsHeldBack &) = delete;
+  SignalsHeldBack &operator=(const SignalsHeldBack &) = delete;
+  // Runs `sleep` (one slice of a Queue::sleep) unless a signal is waiting;
+  // false when one was waiting before it or came during it.
+  template <typename Sleep>
+  bool sleep(Sleep sleep) {
+    if (signal_waiting()) return false;
+    sleep();
+    return !signal_waiting();
+  }
+
+private:
+  static bool signal_waiting();
+};
+
 // Where a message goes: the wrap marker's offset when `gap` is not 0, and the
 // message's own offset.
 struct Placement {
@@ -144,9 +171,8 @@ public:
   // Releases the messages read so far (their space returns to the writer).
   void release_read(PendingWakes *wakes);
 
-  // Sleeps while `*word` holds `seen`, until `until` (CLOCK_MONOTONIC ns);
-  // false when a signal handler ran meanwhile (the host may want to stop).
-  static bool sleep(uint32_t *word, uint32_t seen, int64_t until);
+  // Sleeps while `*word` holds `seen`, until `until` (CLOCK_MONOTONIC ns).
+  static void sleep(uint32_t *word, uint32_t seen, int64_t until);
   // Wakes every thread asleep on `word`.
   static void wake_all(uint32_t *word);
   // Sends the wake-ups owed (the lock released).

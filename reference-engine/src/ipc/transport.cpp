@@ -9,6 +9,7 @@
 #include <cinttypes>
 #include <cstdio>
 #include <cstring>
+#include <optional>
 #include <unordered_map>
 
 #include "core/entry.h"
@@ -150,6 +151,7 @@ template <typename Ready>
 ShmemError Endpoint::wait_until(Queue &queue, bool for_data, const Deadline &deadline, PendingWakes *wakes,
                                 Ready ready) {
   wait_interrupted = false;
+  std::optional<SignalsHeldBack> signals;
   QueueControl &control = queue.control();
   uint32_t *word = for_data ? &control.data_seq : &control.space_seq;
   uint32_t *waiting = for_data ? &control.readers_waiting : &control.writers_waiting;
@@ -162,6 +164,9 @@ ShmemError Endpoint::wait_until(Queue &queue, bool for_data, const Deadline &dea
     ShmemError state = queue.intact() ? ready() : ShmemError::INVALID_SEGMENT;
     if (state == ShmemError::SHMEM_NO_ERROR) return state;
     if (state == ShmemError::RETRY && deadline.kind != Deadline::kNone) {
+      // From the first moment the call may wait, before any system call
+      // here: a signal handled before the sleep would be missed by it.
+      if (!signals) signals.emplace();
       const int64_t now = monotonic_nanoseconds();
       if (deadline.passed(now))
         state = ShmemError::TIMEOUT;
@@ -196,11 +201,11 @@ ShmemError Endpoint::wait_until(Queue &queue, bool for_data, const Deadline &dea
     __atomic_fetch_add(waiting, 1u, __ATOMIC_SEQ_CST);
     queue.unlock();
     queue.wake(wakes);
-    const bool slept = Queue::sleep(word, seen, deadline.slice_end(monotonic_nanoseconds()));
+    const bool slept = signals->sleep([&] { Queue::sleep(word, seen, deadline.slice_end(monotonic_nanoseconds())); });
     __atomic_fetch_sub(waiting, 1u, __ATOMIC_SEQ_CST);
     if (!slept) {
       wait_interrupted = true;
-      return ShmemError::RETRY;  // the lock is not held: nothing to give back
+      return ShmemError::RETRY;  // the lock is not held: nothing to give back; the signal comes on return
     }
     const ShmemError locked = queue.lock(deadline);
     if (locked != ShmemError::SHMEM_NO_ERROR) return locked;
@@ -241,6 +246,7 @@ std::size_t Endpoint::receive(void **data, MessageHeader_t **header, const Deadl
 
 std::size_t Endpoint::receive_retrying(void **data, MessageHeader_t **header, double timeout) {
   const Deadline deadline = Deadline::after(timeout);
+  SignalsHeldBack signals;  // also between the attempts
   for (;;) {
     const std::size_t size = receive(data, header, deadline);
     const ShmemError error = last_error();
@@ -251,7 +257,7 @@ std::size_t Endpoint::receive_retrying(void **data, MessageHeader_t **header, do
     const int64_t pause = 1000 * 1000;
     const int64_t until = deadline.kind == Deadline::kUntil && deadline.at < now + pause ? deadline.at : now + pause;
     timespec ts{static_cast<time_t>((until - now) / 1000000000), static_cast<long>((until - now) % 1000000000)};
-    if (nanosleep(&ts, nullptr) != 0 && errno == EINTR) {
+    if (!signals.sleep([&] { nanosleep(&ts, nullptr); })) {
       wait_interrupted = true;
       return size;
     }

@@ -66,9 +66,9 @@ private:
   // Waits, the queue locked, until `ready` gives NO_ERROR (the lock is then
   // still held) or the operation fails (the lock is then released, `wakes`
   // sent). `for_data`: a reader waiting for a message, else a writer waiting
-  // for room. A signal handler that runs while it sleeps ends the wait with
-  // RETRY, nothing taken or sent, so that a host can act on the signal
-  // (Ctrl-C) at once; interrupted() then says so.
+  // for room. A signal that comes while it waits ends the wait with RETRY,
+  // nothing taken or sent, so that a host can act on it (Ctrl-C) at once;
+  // interrupted() then says so.
   template <typename Ready>
   ShmemError wait_until(Queue &queue, bool for_data, const Deadline &deadline, PendingWakes *wakes, Ready ready);
   // Whether the process at the other end is gone (a client not yet connected

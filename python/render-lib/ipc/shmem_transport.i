@@ -65,7 +65,7 @@ private:
 
 // The waiting calls: the blocking and timed forms.
 // The engine ends a wait early, with nothing taken or sent, when a signal
-// handler has run (Ctrl-C); the call then lets the interpreter run the
+// comes (Ctrl-C); the call then lets the interpreter run the
 // signal's Python handler, so KeyboardInterrupt (or whatever it raises) comes
 // from the call at once instead of after the wait. A handler that raises
 // nothing leaves the call's own answer: None or False, with RETRY.

@@ -539,9 +539,9 @@ class Wrapper:
         if line.startswith("resultobj = swig::from("):
             ctype = re.match(r"resultobj = swig::from\(static_cast< (.*) >\(\*?result\)\);", line).group(1)
             return self.container_out(ctype)
-        if line.startswith("resultobj = SWIG_NewPointerObj(swig::make_output_iterator("):
-            ctype = re.search(r"static_cast< const (.*?)::(?:reverse_)?iterator & >", line).group(1)
-            return "SwigPyIterator[%s]" % self.iterated(ctype, name)
+        if line.startswith("resultobj = SWIG_NewPointerObj(swig::container_position(arg1, "):
+            container = re.search(r"argument \" \"1\"\" of type '\" \"([^\"]*) \*\"\"'", body).group(1)
+            return "SwigPyIterator[%s]" % self.iterated(container, name)
         if line.startswith("resultobj = SWIG_NewPointerObj(byte_value(result)"):
             return "_p_uchar_t"  # CharValueResult: a pointer into the module's table
         kept = re.match(r"resultobj = SWIG_NewPointerObj\((?:interned_process_id\(result\)|&shared_allocator), "

@@ -32,9 +32,17 @@
 #include <cstdio>
 #include <cstdint>
 #include <cstring>
+#include <string>
 
 // A text for "%s" that is never null: a null engine text prints as "(null)".
 static inline const char *printable(const char *text) { return text ? text : "(null)"; }
+
+// A refusal deep in the module's own code (an iterator, say): leaves the
+// wrapper with this Python exception, which the guard raises.
+struct RefusedCall {
+  PyObject *type;
+  std::string message;
+};
 
 // Holds one reference to a Python object and drops it on every path out of
 // the scope, an engine abort included.

@@ -38,7 +38,8 @@ static void renderlib_initialize_threads()
 // RuntimeError "Tarsel Abort" (chained to the host callback that caused it,
 // if one did); when the call ran without the interpreter lock, the lock is
 // taken back as the call's frame unwinds, before the error is set. A failed
-// host callback that reaches a wrapper has its Python error set already.
+// host callback that reaches a wrapper has its Python error set already; a
+// call the module's own code refuses on the way carries its exception.
 %exception {
   try {
     $action
@@ -46,6 +47,9 @@ static void renderlib_initialize_threads()
     raise_tarsel_abort();
     SWIG_fail;
   } catch (const Swig::DirectorException &) {
+    SWIG_fail;
+  } catch (const RefusedCall &refused) {
+    PyErr_SetString(refused.type, refused.message.c_str());
     SWIG_fail;
   }
 }

@@ -67,4 +67,5 @@ struct traits_asptr_stdseq<std::map<K, T, C, A>, std::pair<K, T> >
 %template(float_vector) std::vector<float>;
 %template(genotype_vector) std::vector<Genotype *>;
 %template(param_vector) std::vector<Param *>;
+%map_key_and_value_positions(value_map_type, std::map<std::string, std::vector<float> >)
 %template(value_map) std::map<std::string, std::vector<float> >;

@@ -148,13 +148,13 @@ def test_engine_vectors_kept_past_the_drawing_call_refuse_use():
         %s
         class Keeping(SvgDrawing):
             def lines(self, xs, ys):
-                self.kept.append((xs, ys, list(xs)))
+                self.kept.append((xs, ys, list(xs), iter(xs)))
                 super().lines(xs, ys)
         drawing = Keeping()
         drawing.kept = []
         _renderlib.tarsel_set_gfx_impl(drawing)
         draw(_renderlib.init_tarsel_effect("T_Gradient", False))
-        xs, ys, copy = drawing.kept[0]
+        xs, ys, copy, walk = drawing.kept[0]
         print(len(copy) > 0)
         for use in (len, lambda v: v[0], list, lambda v: v.append(1.0), lambda v: v.size()):
             try:
@@ -162,5 +162,9 @@ def test_engine_vectors_kept_past_the_drawing_call_refuse_use():
                 print("used")
             except ValueError as error:
                 print(str(error).startswith("invalid null reference in method 'float_vector_"))
+        try:
+            next(walk)
+        except ValueError as error:
+            print(str(error) == "the iterator's float_vector no longer exists")
     """ % DRAW)
-    assert out.split() == ["True"] * 6
+    assert out.split() == ["True"] * 7

@@ -32,6 +32,8 @@
 #include <cstdio>
 #include <cstdint>
 #include <cstring>
+#include <new>
+#include <stdexcept>
 #include <string>
 
 // A text for "%s" that is never null: a null engine text prints as "(null)".

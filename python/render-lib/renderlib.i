@@ -39,7 +39,9 @@ static void renderlib_initialize_threads()
 // if one did); when the call ran without the interpreter lock, the lock is
 // taken back as the call's frame unwinds, before the error is set. A failed
 // host callback that reaches a wrapper has its Python error set already; a
-// call the module's own code refuses on the way carries its exception.
+// call the module's own code refuses on the way carries its exception. A
+// container asked for more than memory holds raises MemoryError instead of
+// ending the process.
 %exception {
   try {
     $action
@@ -50,6 +52,12 @@ static void renderlib_initialize_threads()
     SWIG_fail;
   } catch (const RefusedCall &refused) {
     PyErr_SetString(refused.type, refused.message.c_str());
+    SWIG_fail;
+  } catch (const std::length_error &too_long) {
+    PyErr_SetString(PyExc_MemoryError, too_long.what());
+    SWIG_fail;
+  } catch (const std::bad_alloc &) {
+    PyErr_NoMemory();
     SWIG_fail;
   }
 }

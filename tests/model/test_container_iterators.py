@@ -44,6 +44,7 @@ report(lambda: v.erase(v.end(), v.begin()))
 report(lambda: v.begin() == other.begin())
 report(lambda: v.begin().distance(other.begin()))
 report(lambda: v.end() - v.begin())
+report(lambda: v.end() - v.rbegin())      # of another kind
 report(lambda: v.end().next())
 report(lambda: v.begin().decr())
 def growing_loop():
@@ -74,6 +75,7 @@ report(lambda: alive.value() == elements[0])
         "ok False",
         "ValueError iterators of different containers",
         "ok 3",
+        "TypeError 'SwigPyIterator' and 'SwigPyIterator'",
         "StopIteration -",
         "StopIteration -",
         "RuntimeError %s changed size since the iterator was made" % vector,

@@ -3,6 +3,7 @@ of the containers' behaviour is SWIG's stock code and is not re-tested here."""
 import pytest
 
 import renderlib
+from isolated import run_cleanly
 
 
 def test_vector_rules_that_differ_from_lists():
@@ -54,3 +55,21 @@ def test_an_empty_vector_has_no_front_back_or_last_element_to_pop(vector):
         with pytest.raises(IndexError, match="in method '%s_%s': the vector is empty" % (vector.__name__, method)):
             getattr(empty, method)()
     assert len(empty) == 0
+
+
+def test_a_vector_asked_for_more_than_it_can_hold_raises_memory_error():
+    # In a process of its own: an escaping length error ends the process.
+    out = run_cleanly("""
+        import renderlib
+        TOO_MANY = 2 ** 64 - 1
+        for kind, element in ((renderlib.bool_vector, True), (renderlib.string_vector, "a"),
+                              (renderlib.float_vector, 1.0), (renderlib.param_vector, None)):
+            v = kind([element])
+            for ask in (lambda: v.reserve(TOO_MANY), lambda: v.resize(TOO_MANY), lambda: kind(TOO_MANY),
+                        lambda: v.assign(TOO_MANY, element), lambda: v.insert(v.begin(), TOO_MANY, element)):
+                try:
+                    ask()
+                except MemoryError:
+                    print("refused", list(v) == [element])
+    """)
+    assert out.split() == ["refused", "True"] * 20

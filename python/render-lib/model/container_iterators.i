@@ -20,9 +20,10 @@
 
 // `iterator + n` and `iterator - n` free the copy they make when the step
 // runs past either end (StopIteration) instead of dropping it; comparing
-// iterators of different kinds or containers gives False instead of
-// throwing out of the wrapper ("bad iterator type" is equal()'s and
-// distance()'s to raise).
+// iterators of different kinds or containers gives False, and subtracting
+// one from the other fails, instead of throwing out of the wrapper ("bad
+// iterator type" is equal()'s and distance()'s to raise; Python turns a
+// failed operator into TypeError).
 %feature("action") swig::SwigPyIterator::operator+(ptrdiff_t n) const {
   std::unique_ptr<swig::SwigPyIterator> copy(arg1->copy());
   copy->advance(arg2);
@@ -32,6 +33,14 @@
   std::unique_ptr<swig::SwigPyIterator> copy(arg1->copy());
   copy->advance(-arg2);
   result = copy.release();
+}
+%feature("action") swig::SwigPyIterator::operator-(const SwigPyIterator &x) const {
+  try {
+    result = *arg1 - *arg2;
+  } catch (const std::invalid_argument &refused) {
+    PyErr_SetString(PyExc_ValueError, refused.what());
+    SWIG_fail;
+  }
 }
 %feature("action") swig::SwigPyIterator::operator==(const SwigPyIterator &x) const {
   try {

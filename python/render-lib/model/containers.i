@@ -62,6 +62,15 @@ struct traits_asptr_stdseq<std::map<K, T, C, A>, std::pair<K, T> >
 %vector_element_access(Genotype *)
 %vector_element_access(Param *)
 
+// std::vector<bool>::size_type size
+// The standard library's bit vector skips its length check when made with a
+// count, and a count near the largest size wraps round to a vector with no
+// storage behind it; refused as the other vectors refuse it.
+%typemap(check, noblock=1) std::vector<bool>::size_type size {
+  if ($1 > std::vector<bool>().max_size())
+    SWIG_exception_fail(SWIG_MemoryError, "cannot create std::vector larger than max_size()");
+}
+
 %template(bool_vector) std::vector<bool>;
 %template(string_vector) std::vector<std::string>;
 %template(float_vector) std::vector<float>;

@@ -1,5 +1,7 @@
 """The container rules that differ from Python's own lists and dicts. The rest
 of the containers' behaviour is SWIG's stock code and is not re-tested here."""
+import random
+
 import pytest
 
 import renderlib
@@ -25,12 +27,23 @@ def test_vector_rules_that_differ_from_lists():
         renderlib.float_vector().pop()
 
 
-def test_element_conversions_are_strict():
-    with pytest.raises(TypeError, match="^Wrong number or type of arguments for overloaded function 'new_bool_vector'"):
-        renderlib.bool_vector([1, 0])
+def test_an_element_that_does_not_convert_is_named_by_its_position():
+    # For the overloaded constructors too: the element's own message, then where it stands.
+    for make, values, message in ((renderlib.bool_vector, [1, 0], "bool in sequence element 0 "),
+                                  (renderlib.string_vector, ["a", 5], "std::string in sequence element 1 "),
+                                  (renderlib.float_vector, [1.0, "x"], "float in sequence element 1 "),
+                                  (renderlib.param_vector, [None, 3], "Param in sequence element 1 ")):
+        with pytest.raises(TypeError) as raised:
+            make(values)
+        assert str(raised.value) == message
     assert list(renderlib.bool_vector([True, False])) == [True, False]
-    with pytest.raises(TypeError, match="^Wrong number or type of arguments for overloaded function 'new_string_vector'"):
-        renderlib.string_vector(["a", 5])
+    v, values = renderlib.float_vector([1, 2]), renderlib.value_map()
+    for assign in (lambda: v.__setitem__(slice(0, 1), [3, None]), lambda: values.__setitem__("radius", [2, None])):
+        with pytest.raises(TypeError, match="^float in sequence element 1 $"):
+            assign()
+    assert list(v) == [1.0, 2.0] and len(values) == 0  # nothing changed
+    with pytest.raises(TypeError, match="^Wrong number or type of arguments for overloaded function 'new_float_vector'"):
+        renderlib.float_vector(object())  # no overload takes it
 
 
 def test_value_map_rules():
@@ -73,3 +86,62 @@ def test_a_vector_asked_for_more_than_it_can_hold_raises_memory_error():
                     print("refused", list(v) == [element])
     """)
     assert out.split() == ["refused", "True"] * 20
+
+
+def resolved(start, stop, step, n, inserting):
+    """The indices a slice selects in a vector of n, by the module's two-stage
+    rule: the interpreter's slice arithmetic (its error result ignored), then
+    the module's bounds, where a start at or past the end is the end for an
+    assignment and 0 for a read or a delete."""
+    step = 1 if step is None else step
+    i = (n - 1 if step < 0 else 0) if start is None else start + (n if start < 0 else 0)
+    j = (-1 if step < 0 else n) if stop is None else stop + (n if stop < 0 else 0)
+    if step > 0:
+        i = 0 if i < 0 else i if i < n else n if inserting else 0
+        j = max(0 if j < 0 else min(j, n), i)
+    else:
+        i = -1 if i < -1 else n - 1 if i >= n else i
+        j = -1 if j < -1 else min(j, n - 1)
+        i = max(i, j)
+    return i, j, list(range(i, j, step))
+
+
+def test_slices_follow_the_two_stage_rule():
+    rng = random.Random(2026)
+    bound = lambda: rng.choice([None, rng.randint(-12, 12)])  # noqa: E731
+    for _ in range(3000):
+        n = rng.randint(0, 8)
+        start, stop, step = bound(), bound(), rng.choice([None, 1, 1, 2, 3, -1, -2, -3])
+        items = [float(k) for k in range(n)]
+        v = renderlib.float_vector(items)
+        _, _, read = resolved(start, stop, step, n, False)
+        assert list(v[start:stop:step]) == [items[k] for k in read], (n, start, stop, step)
+        del v[start:stop:step]
+        assert list(v) == [x for k, x in enumerate(items) if k not in read], ("del", n, start, stop, step)
+        v = renderlib.float_vector(items)
+        i, j, written = resolved(start, stop, step, n, True)
+        new = [100.0 + k for k in range(rng.randint(0, 4) if step in (None, 1) else len(written))]
+        v[start:stop:step] = new
+        expected = list(items)
+        if step in (None, 1):
+            expected[i:j] = new
+        else:
+            for k, value in zip(written, new):
+                expected[k] = value
+        assert list(v) == expected, ("set", n, start, stop, step, new)
+        # The two-bound forms: no counting from the end, step 1.
+        i, j = rng.randint(-3, 10), rng.randint(-3, 10)
+        v = renderlib.float_vector(items)
+        assert list(v.__getslice__(i, j)) == [items[k] for k in resolved(max(i, 0), max(j, 0), 1, n, False)[2]]
+        v.__delslice__(i, j)
+        assert list(v) == [x for k, x in enumerate(items) if k not in resolved(max(i, 0), max(j, 0), 1, n, False)[2]]
+
+
+def test_deleting_a_slice_from_past_the_end_deletes_from_the_start():
+    v = renderlib.float_vector(range(8))
+    del v[10:4]
+    assert list(v) == [4.0, 5.0, 6.0, 7.0]
+    v.__setitem__(slice(9, 2))  # a slice without a value deletes too
+    assert list(v) == [6.0, 7.0]
+    v[10:4] = [1.0]  # an assignment from past the end appends
+    assert list(v) == [6.0, 7.0, 1.0]

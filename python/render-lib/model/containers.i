@@ -12,11 +12,15 @@ class Param;
 // SWIG converts a Python sequence (a list, a dict's items) into a new
 // container element by element, and drops that container when a later
 // element fails to convert. These specialisations of its conversion do the
-// same and free it, for the vectors and the map below.
+// same and free it, for the vectors and the map below. A vector takes any
+// sequence as a candidate when overloads are weighed, so that an element
+// that does not convert is reported as itself ("... in sequence element N ")
+// instead of as a call no overload takes.
 %fragment("ContainerConversionFreesOnFailure", "header", fragment="StdSequenceTraits") %{
+#include <cstdio>
 #include <memory>
 namespace swig {
-template <class Seq, class T>
+template <class Seq, class T, bool ElementsCheckedAsTheyConvert>
 struct container_from_sequence {
   static int asptr(PyObject *obj, Seq **seq) {
     if (obj == Py_None || SWIG_Python_GetSwigThis(obj)) {
@@ -31,9 +35,22 @@ struct container_from_sequence {
       try {
         SwigPySequence_Cont<T> items(obj);
         if (!seq)
-          return items.check() ? SWIG_OK : SWIG_ERROR;
+          return ElementsCheckedAsTheyConvert || items.check() ? SWIG_OK : SWIG_ERROR;
         std::unique_ptr<Seq> made(new Seq());
-        assign(items, made.get());
+        for (Py_ssize_t i = 0, size = items.size(); i < size; ++i) {
+          SwigVar_PyObject item = PySequence_GetItem(obj, i);
+          try {
+            made->insert(made->end(), swig::as<T>(item));
+          } catch (const std::invalid_argument &) {
+            // The element's own message, then where it stands.
+            if (!PyErr_Occurred())
+              SWIG_Error(SWIG_TypeError, swig::type_name<T>());
+            char where[48];
+            std::snprintf(where, sizeof where, "in sequence element %d ", (int)i);
+            SWIG_Python_AddErrorMsg(where);
+            return SWIG_ERROR;
+          }
+        }
         *seq = made.release();
         return SWIG_NEWOBJ;
       } catch (std::exception &e) {
@@ -47,14 +64,58 @@ struct container_from_sequence {
 };
 
 template <class T, class A>
-struct traits_asptr_stdseq<std::vector<T, A>, T> : container_from_sequence<std::vector<T, A>, T> {};
+struct traits_asptr_stdseq<std::vector<T, A>, T> : container_from_sequence<std::vector<T, A>, T, true> {};
 
 template <class K, class T, class C, class A>
 struct traits_asptr_stdseq<std::map<K, T, C, A>, std::pair<K, T> >
-    : container_from_sequence<std::map<K, T, C, A>, std::pair<K, T> > {};
+    : container_from_sequence<std::map<K, T, C, A>, std::pair<K, T>, false> {};
+
+// SWIG deletes nothing from a slice that starts at or past the end of a
+// vector; here the delete starts at 0 there, as a read of that slice does.
+// (A more specialised overload of SWIG's delslice, which its slice methods
+// call.)
+template <class T, class A, class Difference>
+inline void delslice(std::vector<T, A> *self, Difference i, Difference j, Py_ssize_t step) {
+  if (step > 0 && i >= (Difference)self->size())
+    i = 0;
+  swig::delslice<std::vector<T, A>, Difference>(self, i, j, step);
+}
 }
 %}
 %fragment("ContainerConversionFreesOnFailure");
+
+// const std::vector<...> &other, &v, &x (%vector_sequence_input(VECTOR))
+// A vector argument of the containers' own methods (a copy's source, a slice's
+// new elements, a map's value), given as a proxy or any sequence: SWIG's
+// typemap, but an element's own conversion error stands instead of the
+// argument message.
+%define %vector_sequence_input(VECTOR...)
+%typemap(in, noblock=1) const VECTOR &other (int res = SWIG_OLDOBJ), const VECTOR &v (int res = SWIG_OLDOBJ),
+                        const VECTOR &x (int res = SWIG_OLDOBJ) {
+  {
+    VECTOR *ptr = 0;
+    res = swig::asptr($input, &ptr);
+    if (!SWIG_IsOK(res)) {
+      if (!PyErr_Occurred()) {
+        %argument_fail(res, "$type", $symname, $argnum);
+      }
+      SWIG_fail;
+    }
+    if (!ptr) {
+      %argument_nullref("$type", $symname, $argnum);
+    }
+    $1 = ptr;
+  }
+}
+%typemap(freearg, noblock=1) const VECTOR &other, const VECTOR &v, const VECTOR &x {
+  if (SWIG_IsNewObj(res$argnum)) delete $1;
+}
+%enddef
+%vector_sequence_input(std::vector<bool>)
+%vector_sequence_input(std::vector<std::string>)
+%vector_sequence_input(std::vector<float>)
+%vector_sequence_input(std::vector<Genotype *>)
+%vector_sequence_input(std::vector<Param *>)
 
 %vector_element_access(bool)
 %vector_element_access(std::string)

@@ -25,7 +25,7 @@ T_RasterInfo *same_raster(T_RasterInfo *info) { return info; }
 RenderContext *context_handle(int which) { return reinterpret_cast<RenderContext *>(context_storage[which & 1]); }
 
 // The address of byte `offset` of a writable buffer (a bytearray, say) as the
-// uchar_t pointer proxy that DEC and base64decode take.
+// uchar_t pointer proxy that base64decode takes.
 uchar_t *byte_address(PyObject *buffer, int offset) {
   Py_buffer view;
   if (PyObject_GetBuffer(buffer, &view, PyBUF_WRITABLE) != 0) { PyErr_Clear(); return 0; }

@@ -426,8 +426,8 @@ class Wrapper:
             if not re.search(r"arg\d+ = %s;" % re.escape(obj), segment):
                 raise StubError("%s argument %d is not a Python object any more" % (name, index + 1))
             return PYOBJECT_ARGUMENTS[name, index]
-        if "PyObject_GetBuffer(%s, &view, PyBUF_ND)" % obj in segment:
-            return "Buffer"  # RawImage
+        if "raw_image_address(%s, " % obj in segment:
+            return "Buffer"  # RawImage, RenderDestination
         if "PyObject_GetBuffer(%s, &view, PyBUF_SIMPLE)" % obj in segment:
             return "Buffer"  # (void *BufferAddress, size_t BufferSize)
         if "PyList_Check(%s)" % obj in segment:
@@ -542,12 +542,10 @@ class Wrapper:
         if line.startswith("resultobj = SWIG_NewPointerObj(swig::container_position(arg1, "):
             container = re.search(r"argument \" \"1\"\" of type '\" \"([^\"]*) \*\"\"'", body).group(1)
             return "SwigPyIterator[%s]" % self.iterated(container, name)
-        if line.startswith("resultobj = SWIG_NewPointerObj(byte_value(result)"):
-            return "_p_uchar_t"  # CharValueResult: a pointer into the module's table
-        kept = re.match(r"resultobj = SWIG_NewPointerObj\((?:interned_process_id\(result\)|&shared_allocator), "
-                        r"SWIGTYPE_(p_\w+), 0\);", line)
+        kept = re.match(r"resultobj = SWIG_NewPointerObj\((?:new pid_t\(result\)|&shared_allocator), "
+                        r"SWIGTYPE_(p_\w+), .*\);", line)
         if kept:
-            return self.class_of(kept.group(1))  # the module's own copy: never null
+            return self.class_of(kept.group(1))  # a new copy, or the module's own: never null
         pointer = re.match(r"resultobj = SWIG_NewPointerObj\((.*), SWIGTYPE_(p_\w+|\w+),\s*(.*)\);", line)
         if pointer is None:
             pointer = re.match(r"resultobj = SWIG_NewPointerObj\((.*), (swig::SwigPyIterator::descriptor\(\)),\s*(.*)\);",

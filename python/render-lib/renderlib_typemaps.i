@@ -6,8 +6,8 @@
 // |------------------------|-------------------------------------|----------------------------------------|
 // | EngineHeapText         | a text member of an engine record,  | the engine, with free(); the old value |
 // |                        | on the C heap                       | here when it is replaced               |
-// | RawImage               | none: the caller's buffer, by       | nobody; the view is released at once   |
-// |                        | address                             |                                        |
+// | RawImage,              | none: the caller's buffer, by       | nobody; the view is released at once   |
+// | RenderDestination      | address                             |                                        |
 // | RasterInfoList         | the array of descriptor pointers    | the wrapper, on every path             |
 // |                        | and a snapshot of the list          |                                        |
 // | RawImageList           | the address array, one view per     | the wrapper: views after the call,     |
@@ -19,8 +19,7 @@
 // | RequiredText,          |                                     |                                        |
 // | DecodeText/Dest/Length |                                     |                                        |
 // | %vector_element_access | none: refuses an empty vector       | nothing to free                        |
-// | CharValueResult        | none: points into a static table    | nothing to free                        |
-// | InternedProcessId      | one pid_t per distinct value        | nobody: kept for the process's life    |
+// | OwnedProcessId         | a new pid_t                         | its proxy, as it dies                  |
 // | get_allocator          | none: one static allocator per type | nothing to free                        |
 // | RasterImageBytes       | the UTF-8 copy of the str           | the wrapper, on every path             |
 // | WidgetResult           | the engine's result, by value       | the wrapper, after conversion          |
@@ -65,22 +64,41 @@
 // engine. The view (PyBUF_ND: contiguous, writability not requested) is
 // released at once, so the exporter must keep its memory in place, unresized,
 // for the whole call; a read-only object is accepted even where the engine
-// writes.
-%typemap(in, noblock=1) RawImage {
-  {
-    Py_buffer view;
-    if (PyObject_GetBuffer($input, &view, PyBUF_ND) != 0) {
-      PyObject *type, *value, *traceback;
-      PyErr_Fetch(&type, &value, &traceback);
-      Py_XDECREF(value);
-      Py_XDECREF(traceback);
-      PyErr_SetString(type ? type : PyExc_TypeError, "in method '$symname', argument $argnum of type '(RawImage)'");
-      Py_XDECREF(type);
-      SWIG_fail;
-    }
-    $1 = view.buf;
-    PyBuffer_Release(&view);
+// writes. A failed request keeps its own error class (TypeError when it set
+// none), with the argument message.
+%{
+// The start address of `input`'s buffer, or null with `message` set as the
+// error; its class is the request's own, or `refusal` when that is given.
+static void *raw_image_address(PyObject *input, const char *message, PyObject *refusal)
+{
+  Py_buffer view;
+  if (PyObject_GetBuffer(input, &view, PyBUF_ND) != 0) {
+    PyObject *type, *value, *traceback;
+    PyErr_Fetch(&type, &value, &traceback);
+    Py_XDECREF(value);
+    Py_XDECREF(traceback);
+    PyErr_SetString(refusal ? refusal : type ? type : PyExc_TypeError, message);
+    Py_XDECREF(type);
+    return NULL;
   }
+  void *address = view.buf;
+  PyBuffer_Release(&view);
+  return address;
+}
+%}
+%typemap(in, noblock=1) RawImage {
+  $1 = raw_image_address($input, "in method '$symname', argument $argnum of type '(RawImage)'", NULL);
+  if (!$1 && PyErr_Occurred())
+    SWIG_fail;
+}
+
+// RawImage RenderDestination
+// The destination of a render call: as RawImage, but a failed request is
+// always TypeError, whatever the exporter raised.
+%typemap(in, noblock=1) RawImage RenderDestination {
+  $1 = raw_image_address($input, "in method '$symname', argument $argnum of type '(RawImage)'", PyExc_TypeError);
+  if (!$1 && PyErr_Occurred())
+    SWIG_fail;
 }
 
 %{
@@ -285,30 +303,33 @@ static bool vector_method_needs_element(const char *symname)
   $result = SWIG_Python_AppendOutput($result, SWIG_From_int(*$1));
 }
 
-// uchar_t CharValueResult
-// A byte value returned as a uchar_t pointer proxy into a static table of the
-// 256 values (byte_value), so that no result ever needs freeing.
-%typemap(out) uchar_t CharValueResult "$result = SWIG_NewPointerObj(byte_value($1), $&1_descriptor, 0);"
-
-// pid_t InternedProcessId
-// A process identifier returned as an opaque pid_t pointer proxy. SWIG would
-// give the proxy a new pid_t to own, which it cannot free (pid_t has no
-// destructor); instead each distinct value is kept once by the module for the
-// life of the process and the proxy points at that copy, owning nothing.
+// pid_t OwnedProcessId
+// A process identifier returned as an opaque pid_t pointer proxy that owns a
+// new pid_t. pid_t is no class, so SWIG has no function to free it with and
+// an owning proxy would print a leak warning as it dies instead; the module
+// gives the type one as it starts (kept out of the module's functions), so
+// the proxy frees its copy silently. The proxy stays a bare pointer object.
 %{
-#include <map>
-#include <memory>
-static pid_t *interned_process_id(pid_t pid)
+static PyObject *free_process_id(PyObject *, PyObject *dying)
 {
-  // Never destroyed: a proxy may outlive the module's static destructors.
-  static auto *ids = new std::map<pid_t, std::unique_ptr<pid_t>>;
-  std::unique_ptr<pid_t> &id = (*ids)[pid];
-  if (!id)
-    id.reset(new pid_t(pid));
-  return id.get();
+  delete static_cast<pid_t *>(reinterpret_cast<SwigPyObject *>(dying)->ptr);
+  Py_RETURN_NONE;
+}
+
+static void give_process_ids_a_destroy_function(swig_type_info *type)
+{
+  static PyMethodDef free_method = {"free_process_id", free_process_id, METH_O, "frees a pid_t"};
+  static SwigPyClientData client_data;  // klass, newraw and pytype stay null
+  if (type->clientdata || !(client_data.destroy = PyCFunction_New(&free_method, NULL)))
+    return;
+  type->clientdata = &client_data;
 }
 %}
-%typemap(out) pid_t InternedProcessId "$result = SWIG_NewPointerObj(interned_process_id($1), $&1_descriptor, 0);"
+%typemap(out) pid_t OwnedProcessId
+  "$result = SWIG_NewPointerObj(new pid_t($1), $&1_descriptor, SWIG_POINTER_OWN | SWIG_POINTER_NOSHADOW);"
+%init %{
+  give_process_ids_a_destroy_function(SWIGTYPE_p_pid_t);
+%}
 
 // SWIGTYPE get_allocator
 // A container's allocator. std::allocator has no state, so one shared

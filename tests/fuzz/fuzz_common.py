@@ -157,7 +157,7 @@ def main(test_one_input, target_module, max_len=4096, default_inputs=2000):
 def byte_address_module(folder=None):
     """The tests' second SWIG module (tests/shared_registry.i), whose
     byte_address(buffer, offset) gives the uchar_t pointer proxy that
-    base64decode and DEC take. Built into `folder` (default: the environment's
+    base64decode takes. Built into `folder` (default: the environment's
     RENDERLIB_FUZZ_HELPERS, else build-fuzz/helpers/ of the work tree) unless
     it is there already."""
     import importlib

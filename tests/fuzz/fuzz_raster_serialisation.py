@@ -259,14 +259,8 @@ class Case:
                 assert expected[before + length:] == bytes([0xA5]) * GUARD  # the length given was enough
         assert buffer == expected, (text, length, bytes(buffer).hex(), bytes(expected).hex())
 
-    def character(self):
-        raw = self.r.bytes(8) or b"\0"
-        text = bytearray(raw)
-        values = [ctypes.string_at(int(_renderlib.DEC(helpers.byte_address(text, i))), 1)[0] for i in range(len(raw))]
-        assert values == [dec(c) for c in raw], (raw, values)
-
     def run(self):
-        operations = [self.from_base64, self.from_bits, self.decode, self.character, self.to_bytearray]
+        operations = [self.from_base64, self.from_bits, self.decode, self.to_bytearray]
         for _ in range(1 + self.r.int_in(0, 3)):
             self.r.pick(operations)()
             image = image_of(self.info)

@@ -146,12 +146,13 @@ def dest_value(r, wrong):
         return writable_buffer(r, r.int_in(0, 64)), None
     if choice == 5:  # read-only is taken
         return r.pick([lambda: bytes(r.int_in(0, 32)), lambda: memoryview(b"pixels"), lambda: readonly_array(8)])(), None
+    # A destination whose buffer cannot be had is TypeError, whatever the object raised.
     if choice == 6:
-        return numpy.zeros((4, 4), numpy.float32)[:, ::2], ValueError
+        return numpy.zeros((4, 4), numpy.float32)[:, ::2], TypeError
     if choice == 7:
-        return memoryview(bytearray(16))[::2], BufferError
+        return memoryview(bytearray(16))[::2], TypeError
     if choice == 8:
-        return released_view(), ValueError
+        return released_view(), TypeError
     return r.pick([lambda: "pixels", lambda: 16, lambda: None, lambda: [bytearray(4)], renderlib.T_RasterInfo])(), TypeError
 
 

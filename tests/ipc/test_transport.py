@@ -10,6 +10,8 @@ import pytest
 
 import _renderlib
 import renderlib
+from isolated import run_python
+from process_memory import UNDER_ADDRESS_SANITIZER
 from segments import connect, segment_file, serve
 
 E = _renderlib
@@ -135,6 +137,7 @@ def test_identity_queries(pair):
     server, client = pair
     pid = server.get_server_pid()
     assert not isinstance(pid, int) and "pid_t *" in repr(pid)
+    assert pid.own() is True and pid != server.get_server_pid()  # a new copy each time, freed by its handle
     texts = [_renderlib.shmem_error_to_string(code) for code in range(6)]
     assert all(isinstance(text, str) and text for text in texts) and len(set(texts)) == 6
     assert _renderlib.shmem_error_to_string(99) is None
@@ -181,3 +184,24 @@ def test_a_removed_segment_is_invalid_for_both_ends(pair, name):
         assert transport.get_last_error() == E.ShmemError_INVALID_SEGMENT
         assert not transport.try_write_pybuf(b"x")
         assert transport.get_last_error() == E.ShmemError_INVALID_SEGMENT
+
+
+def test_a_million_server_pid_handles_leak_nothing_and_print_nothing(name):
+    calls = 1000 if "vgpreload" in os.environ.get("LD_PRELOAD", "") else 1000000
+    done = run_python("""
+        import sys, _renderlib, renderlib
+        from process_memory import resident_kib
+        server = _renderlib.ShmemManager_serve(sys.argv[1], 1 << 12, 1 << 12)
+        calls = int(sys.argv[2])
+        for _ in range(calls // 10):
+            server.get_server_pid()
+        before = resident_kib()
+        for _ in range(calls):
+            server.get_server_pid()
+        sys.stderr.write("grew %d KiB" % (resident_kib() - before))
+        server.remove()
+    """, timeout=120, args=[name, calls])
+    assert done.returncode == 0 and done.stdout == "", (done.stdout[:300], done.stderr[-2000:])
+    growth = int(done.stderr.split()[-2])
+    if not UNDER_ADDRESS_SANITIZER:
+        assert growth < 1024, done.stderr  # a pid_t kept per call would be some 32 MB

@@ -62,6 +62,8 @@ def test_lists_and_buffers(quick, probe, name, arguments, dest_at, rasters_at, i
         (dict(images=[numpy.zeros((4, 4))[:, ::2]]), "in %s, arg %d, cannot get Py_buffer view; maybe has no size?" % (name, images_at)),
         (dict(images=[5]), "in %s, arg %d, list must contain objects that support the buffer protocol" % (name, images_at)),
         (dict(dest="pixels"), "in method '%s', argument %d of type '(RawImage)'" % (name, dest_at)),
+        # the exporter raises ValueError for a strided array; the destination is refused as TypeError all the same
+        (dict(dest=numpy.zeros((4, 4))[:, ::2]), "in method '%s', argument %d of type '(RawImage)'" % (name, dest_at)),
     ]
     for change, message in refusals:
         with pytest.raises(TypeError) as raised:

@@ -98,8 +98,8 @@ public:
   bool commit();
   bool remove();
   bool is_segment_valid();
-  // A process identifier, handed to Python as an opaque pid_t pointer.
-  %apply pid_t InternedProcessId { pid_t get_server_pid };
+  // A process identifier, handed to Python as an opaque owned pid_t pointer.
+  %apply pid_t OwnedProcessId { pid_t get_server_pid };
   pid_t get_server_pid();
   %clear pid_t get_server_pid;
   bool client_pid_exists();

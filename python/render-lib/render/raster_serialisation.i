@@ -10,16 +10,9 @@ typedef unsigned char uchar_t;
 
 static const size_t RASTER_INFO_IMAGE_SIZE = 104;
 
-// The 256 byte values, so that DEC can hand out pointers that need no freeing.
-static struct ByteValues {
-  uchar_t value[256];
-  ByteValues() { for (int i = 0; i < 256; ++i) value[i] = (uchar_t)i; }
-} byte_values;
-
-static uchar_t *byte_value(uchar_t value) { return &byte_values.value[value]; }
-
 // The value of one base64 character; a byte outside the alphabet is its own
-// value ('=' gives 61), there is no error value.
+// value ('=' gives 61), there is no error value. The decoder's own: not a
+// function of the module.
 static uchar_t DEC(uchar_t c)
 {
   if (c >= 'A' && c <= 'Z') return (uchar_t)(c - 65);
@@ -97,7 +90,5 @@ void make_tarsel_raster_info_from_base64(T_RasterInfo *info, char const *text);
 %clear char const *text;
 %apply (char const *DecodeText, uchar_t *DecodeDest, int DecodeLength) { (char const *text, uchar_t *dest, int length) };
 void base64decode(char const *text, uchar_t *dest, int length);
-%apply uchar_t CharValueResult { uchar_t DEC };
-uchar_t DEC(uchar_t c);
 %clear T_RasterInfo *info;
 

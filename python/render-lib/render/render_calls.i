@@ -11,6 +11,7 @@ typedef void *RawImage;
 
 %apply T_RasterInfo **RasterInfoList { T_RasterInfo **rasters };
 %apply RawImage *RawImageList { RawImage *images };
+%apply RawImage RenderDestination { RawImage dest };
 
 %threadallow render_tarsel_effect_to_native_image;
 %threadallow render_tarsel_lensflare_to_native_image;
@@ -35,4 +36,5 @@ bool render_tarsel_lensflare_to_native_image(EffectGlobals_t *instance, char con
 
 %clear T_RasterInfo **rasters;
 %clear RawImage *images;
+%clear RawImage dest;
 %clear int n_rasters;

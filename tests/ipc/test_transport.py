@@ -202,6 +202,5 @@ def test_a_million_server_pid_handles_leak_nothing_and_print_nothing(name):
         server.remove()
     """, timeout=120, args=[name, calls])
     assert done.returncode == 0 and done.stdout == "", (done.stdout[:300], done.stderr[-2000:])
-    growth = int(done.stderr.split()[-2])
-    if not UNDER_ADDRESS_SANITIZER:
-        assert growth < 1024, done.stderr  # a pid_t kept per call would be some 32 MB
+    if not UNDER_ADDRESS_SANITIZER:  # a pid_t kept per call would be some 32 MB
+        assert int(done.stderr.split()[-2]) < 1024, done.stderr

@@ -7,6 +7,7 @@ import pytest
 import _renderlib
 import renderlib  # noqa: F401  (registers the proxy classes before a second module loads)
 from engine_probe import EngineProbe
+from time_limit import pytest_configure, pytest_handlecrashitem, pytest_runtest_protocol  # noqa: F401 (hooks)
 
 _probe = None
 

@@ -17,5 +17,6 @@ export LD_PRELOAD="$(gcc -print-file-name=libasan.so) $(gcc -print-file-name=lib
 export PYTHONMALLOC=malloc
 export ASAN_OPTIONS=detect_leaks=0:abort_on_error=1:strict_string_checks=1:check_initialization_order=1
 export UBSAN_OPTIONS=print_stacktrace=1:halt_on_error=1
-# Reports go to the terminal, not to pytest's captured output: a report ends the process.
-.venv-sanitize/bin/python -m pytest -p no:cacheprovider --capture=sys -q "$@"
+# Reports go to the terminal, not to pytest's captured output: a report ends the
+# process, so the tests run in this one (-n 0), whose standard error is the terminal's.
+.venv-sanitize/bin/python -m pytest -p no:cacheprovider --capture=sys -q -n 0 "$@"

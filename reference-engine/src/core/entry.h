@@ -1,5 +1,6 @@
-// Every exported engine entry point starts with enter(): it records the call in
-// the probe's call log and honours the probe's "abort the next call" switch.
+// Every exported engine entry point starts with enter(): it tells the entry
+// observer, if one is installed (the test probe installs one: its call log and
+// its "abort the next call" switch), that the host called it.
 //
 // enter() returns a scope that marks the calling thread as inside the engine
 // until the entry point returns. Calls the engine makes to its own entry points
@@ -25,12 +26,22 @@ inline std::string describe(std::size_t value) { return describe(static_cast<lon
 inline std::string describe(bool value) { return value ? "true" : "false"; }
 inline std::string describe(float value) { return describe(static_cast<double>(value)); }
 
-// Appends "name(arg, arg, ...)" to the call log, then, when `may_abort`,
-// throws TarselAbortException if the probe armed its fault switch.
+// What watches the entry points. entered() gets the entry's name and its
+// arguments as text ("" unless wants_arguments() said yes, so that timing
+// runs do not pay for formatting them); when `may_abort` it may throw
+// TarselAbortException to fail the call.
+struct EntryObserver {
+  bool (*wants_arguments)();
+  void (*entered)(const char *name, std::string arguments, bool may_abort);
+};
+
+// Installs `observer` (null: none) for every entry point from now on.
+void set_entry_observer(const EntryObserver *observer);
+
+// Tells the observer of an entry.
 void record_entry(const char *name, std::string arguments, bool may_abort = true);
 
-// Whether the call log is kept (the probe can pause it, so that timing runs do
-// not pay for formatting arguments).
+// Whether the observer wants the arguments as text.
 bool call_log_enabled();
 
 // Depth of engine entry calls on the calling thread.

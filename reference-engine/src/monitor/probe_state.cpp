@@ -6,7 +6,7 @@
 #include <map>
 #include <mutex>
 
-#include "core/call_log.h"
+#include "probe/call_log.h"
 #include "monitor/display.h"
 #include "monitor/image.h"
 #include "monitor/preview_device.h"

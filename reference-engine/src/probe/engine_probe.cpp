@@ -1,9 +1,10 @@
-// The test probe (tarsel_probe.h) and the call log that every entry point feeds.
+// The engine's test probe (tarsel_probe.h): its call log, fed by the entry
+// points through the observer it installs as the library loads, its fault
+// switch, and the switches and counts it reaches in the engine. Nothing in
+// the engine includes it.
 #include <atomic>
 #include <chrono>
-#include <cinttypes>
 #include <cstdio>
-#include <mutex>
 #include <string>
 #include <thread>
 
@@ -12,15 +13,15 @@
 #include <unistd.h>
 
 #include "core/abort.h"
-#include "core/call_log.h"
-#include "core/thread_end.h"
 #include "core/entry.h"
+#include "core/identity.h"
 #include "core/messages.h"
-#include "core/probe_state.h"
+#include "core/thread_end.h"
 #include "ipc/transport.h"
 #include "model/instance.h"
 #include "model/param_values.h"
 #include "model/stamps.h"
+#include "probe/call_log.h"
 #include "render/frame_requests.h"
 #include "render/render_stats.h"
 #include "render/workers.h"
@@ -36,55 +37,23 @@ CallLog &call_log() {
   return *log;
 }
 
+std::atomic<bool> log_enabled{true};
 std::atomic<bool> abort_next_call{false};
 
-std::mutex version_mutex;
-std::optional<std::string> version_override;
+bool wants_arguments() { return log_enabled.load(std::memory_order_relaxed); }
 
-}  // namespace
-
-std::string describe(const char *text) {
-  if (!text) return "null";
-  return std::string("\"") + text + "\"";
-}
-
-std::string describe(const void *pointer) {
-  if (!pointer) return "null";
-  char buffer[32];
-  std::snprintf(buffer, sizeof buffer, "0x%" PRIxPTR, reinterpret_cast<std::uintptr_t>(pointer));
-  return buffer;
-}
-
-std::string describe(long long value) { return std::to_string(value); }
-
-std::string describe(double value) {
-  char buffer[32];
-  std::snprintf(buffer, sizeof buffer, "%g", value);
-  return buffer;
-}
-
-int &entry_depth() {
-  thread_local int depth = 0;
-  return depth;
-}
-
-std::atomic<bool> log_enabled{true};
-
-bool call_log_enabled() { return log_enabled.load(std::memory_order_relaxed); }
-
-void record_entry(const char *name, std::string arguments, bool may_abort) {
-  if (call_log_enabled()) call_log().append(std::string(name) + "(" + arguments + ")");
+void entered(const char *name, std::string arguments, bool may_abort) {
+  if (wants_arguments()) call_log().append(std::string(name) + "(" + arguments + ")");
   // A plain load first: the exchange, a locked write to a shared cache line,
   // is paid only while the switch is armed.
   if (may_abort && abort_next_call.load(std::memory_order_relaxed) && abort_next_call.exchange(false))
     throw TarselAbortException();
 }
 
-std::optional<std::string> probe::version_text_override() {
-  std::lock_guard<std::mutex> lock(version_mutex);
-  return version_override;
-}
+const EntryObserver observer{wants_arguments, entered};
+const bool observing = (set_entry_observer(&observer), true);
 
+}  // namespace
 }  // namespace tarsel_ref
 
 using tarsel_ref::call_log;
@@ -138,11 +107,7 @@ double tarsel_probe_time_frame_requests(int count, int width, int height) {
 }
 
 void tarsel_probe_set_version_text(const char *text) {
-  std::lock_guard<std::mutex> lock(tarsel_ref::version_mutex);
-  if (text)
-    tarsel_ref::version_override = std::string(text);
-  else
-    tarsel_ref::version_override.reset();
+  tarsel_ref::set_version_text(text ? std::optional<std::string>(text) : std::nullopt);
 }
 
 int tarsel_probe_live_instances(void) { return tarsel_ref::live_instance_count(); }

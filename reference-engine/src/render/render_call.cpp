@@ -233,42 +233,50 @@ std::shared_ptr<const WorkImage> rebuild_previous(const RenderCall &call, const 
   return previous;
 }
 
-}  // namespace
+// What the checks of a call settle: the descriptor to render, the colour
+// spaces, the resolution factor and the destination.
+struct Checked {
+  const Genotype *g = nullptr;
+  Spaces spaces{};
+  int downsample = 1;
+  RasterView dest;
+};
 
-bool render(const RenderCall &call, std::string *error) {
-  const InstanceUse use(call.instance);  // the instance outlives this render, whoever frees it meanwhile
-  EffectInstance *instance = use.get();
-  if (!instance) {
-    *error = "not a live effect instance of this engine";
-    return false;
-  }
-  const Genotype *g = select_descriptor(*instance, call.descriptor);
-  if (!g) {
+// The call's inputs: entries 1.. of its lists (lens flares always read a
+// background there), and which of them it connects.
+struct Inputs {
+  std::vector<RasterView> sources;
+  std::vector<bool> connected;
+  int count() const { return static_cast<int>(sources.size()); }
+};
+
+bool check_call(const RenderCall &call, EffectInstance &instance, Checked *checked, std::string *error) {
+  checked->g = select_descriptor(instance, call.descriptor);
+  if (!checked->g) {
     *error = std::string("the effect has no descriptor named \"") + call.descriptor + "\"";
     return false;
   }
-  if (call.flare_call && !g->flare_param) {
-    *error = std::string("\"") + g->name + "\" has no flare to draw";
+  if (call.flare_call && !checked->g->flare_param) {
+    *error = std::string("\"") + checked->g->name + "\" has no flare to draw";
     return false;
   }
-  Spaces spaces{};
-  if (!check_settings(call, &spaces, error)) return false;
-  const int downsample = std::max(call.downsample, 1);
+  if (!check_settings(call, &checked->spaces, error)) return false;
+  checked->downsample = std::max(call.downsample, 1);
   if (call.n_rasters < 1 || !call.rasters || !call.rasters[0]) {
     *error = "no descriptor for the destination (rasters[0])";
     return false;
   }
-  RasterView dest;
-  if (!describe_raster(*call.rasters[0], call.dest, &dest, error)) {
+  if (!describe_raster(*call.rasters[0], call.dest, &checked->dest, error)) {
     *error = "destination: " + *error;
     return false;
   }
-  if (!check_resolution(*call.rasters[0], downsample, "the destination", error)) return false;
+  return check_resolution(*call.rasters[0], checked->downsample, "the destination", error);
+}
 
-  // Inputs: entries 1.. of the lists; lens flares always read a background there.
-  const int n_inputs = call.flare_call ? 1 : g->n_inputs;
-  std::vector<RasterView> sources(static_cast<std::size_t>(n_inputs));
-  std::vector<bool> connected(static_cast<std::size_t>(n_inputs), false);
+bool describe_inputs(const RenderCall &call, const Checked &checked, Inputs *inputs, std::string *error) {
+  const int n_inputs = call.flare_call ? 1 : checked.g->n_inputs;
+  inputs->sources.assign(static_cast<std::size_t>(n_inputs), RasterView());
+  inputs->connected.assign(static_cast<std::size_t>(n_inputs), false);
   for (int i = 0; i < n_inputs; ++i) {
     const int k = i + 1;
     if (k >= call.n_rasters || !call.images || !call.images[k]) continue;
@@ -277,85 +285,87 @@ bool render(const RenderCall &call, std::string *error) {
       *error = what + " has pixels but no descriptor";
       return false;
     }
-    if (!describe_raster(*call.rasters[k], call.images[k], &sources[static_cast<std::size_t>(i)], error)) {
+    if (!describe_raster(*call.rasters[k], call.images[k], &inputs->sources[static_cast<std::size_t>(i)], error)) {
       *error = what + ": " + *error;
       return false;
     }
-    if (!check_resolution(*call.rasters[k], downsample, what, error)) return false;
-    connected[static_cast<std::size_t>(i)] = true;
+    if (!check_resolution(*call.rasters[k], checked.downsample, what, error)) return false;
+    inputs->connected[static_cast<std::size_t>(i)] = true;
   }
-  if (dest.empty()) return true;
+  return true;
+}
 
+KernelContext kernel_context(const RenderCall &call, const Checked &checked, const Inputs &inputs) {
   const T_RasterInfo &info = *call.rasters[0];
+  const RasterView &dest = checked.dest;
   KernelContext ctx;
-  ctx.genotype = g;
+  ctx.genotype = checked.g;
   ctx.width = dest.width;
   ctx.height = dest.height;
   ctx.x0 = dest.x_origin;
   ctx.y0 = dest.y_origin;
-  ctx.frame_width = info.world_xsize > 0 ? static_cast<double>(info.world_xsize) / downsample : dest.width;
-  ctx.frame_height = info.world_ysize > 0 ? static_cast<double>(info.world_ysize) / downsample : dest.height;
-  ctx.downsample = downsample;
+  ctx.frame_width = info.world_xsize > 0 ? static_cast<double>(info.world_xsize) / checked.downsample : dest.width;
+  ctx.frame_height = info.world_ysize > 0 ? static_cast<double>(info.world_ysize) / checked.downsample : dest.height;
+  ctx.downsample = checked.downsample;
   ctx.quality = std::clamp(call.quality, 0, 2);
   ctx.pixel_aspect = call.pixel_aspect > 0.0f ? call.pixel_aspect : 1.0f;
   ctx.frame = call.frame;
   ctx.frame_rate = call.frame_rate > 0 ? call.frame_rate : 25;
   ctx.seed = call.seed;
   ctx.n_threads = std::max(call.n_threads, 0);
-  ctx.working = spaces.working;
-  ctx.connected = connected;
+  ctx.working = checked.spaces.working;
+  ctx.connected = inputs.connected;
   ctx.flare_call = call.flare_call;
-  const ParamReader params(*g, connected, ctx.frame, ctx.seconds());
-  ctx.params = &params;
+  return ctx;
+}
 
-  std::vector<std::shared_ptr<const WorkImage>> loaded(static_cast<std::size_t>(n_inputs));
-  for (int i = 0; i < n_inputs; ++i)
-    if (connected[static_cast<std::size_t>(i)])
-      loaded[static_cast<std::size_t>(i)] =
-          read_image(sources[static_cast<std::size_t>(i)], ctx, spaces, spaces.input, call.premultiplied);
-  for (int i = 0; i < n_inputs; ++i)
-    ctx.inputs.push_back(loaded[static_cast<std::size_t>(i)] ? loaded[static_cast<std::size_t>(i)]
-                                                             : fallback(*g, i, ctx, loaded));
-  if (g->flags.use_prev_dest_p && call.images && call.images[0]) {
-    RasterView previous = dest;  // the previous output has the destination's layout
+// The inputs read into working images, a stand-in for each one not
+// connected, and the previous output when the call gives it.
+void load_inputs(const RenderCall &call, const Checked &checked, const Inputs &inputs, KernelContext *ctx) {
+  std::vector<std::shared_ptr<const WorkImage>> loaded(static_cast<std::size_t>(inputs.count()));
+  for (int i = 0; i < inputs.count(); ++i)
+    if (inputs.connected[static_cast<std::size_t>(i)])
+      loaded[static_cast<std::size_t>(i)] = read_image(inputs.sources[static_cast<std::size_t>(i)], *ctx,
+                                                       checked.spaces, checked.spaces.input, call.premultiplied);
+  for (int i = 0; i < inputs.count(); ++i)
+    ctx->inputs.push_back(loaded[static_cast<std::size_t>(i)] ? loaded[static_cast<std::size_t>(i)]
+                                                              : fallback(*checked.g, i, *ctx, loaded));
+  if (checked.g->flags.use_prev_dest_p && call.images && call.images[0]) {
+    RasterView previous = checked.dest;  // the previous output has the destination's layout
     previous.base = static_cast<unsigned char *>(call.images[0]);
-    ctx.previous = read_image(previous, ctx, spaces, spaces.output, call.premultiplied);
+    ctx->previous = read_image(previous, *ctx, checked.spaces, checked.spaces.output, call.premultiplied);
   }
+}
 
-  Kernel kernel = call.flare_call ? render_flare_call : find_kernel(g->name);
-  if (!kernel) {
-    *error = std::string("the engine cannot render \"") + g->name + "\"";
-    return false;
-  }
-  const float mix = call.flare_call ? 1.0f : std::clamp(call.mix, 0.0f, 1.0f) * slot_mix(*instance);
-
-  // Other frames of the inputs, asked of the host by effects that read them
-  // or rebuild their previous output; read like the inputs.
-  std::unique_ptr<FrameRequests> requests;
+// Other frames of the inputs, asked of the host by effects that read them or
+// rebuild their previous output; read like the inputs. None when no host
+// answers requests or the effect needs none. `ctx` must outlive the result.
+std::unique_ptr<FrameRequests> frames_from_host(const RenderCall &call, const Checked &checked,
+                                                const Inputs &inputs, KernelContext *ctx) {
+  const Genotype &g = *checked.g;
   const T_LoadOtherFrameFun request_fun = installed_frame_request();
-  if (request_fun && !call.flare_call && (g->flags.need_other_frames_p || g->flags.use_prev_dest_p)) {
-    T_RenderState state;
-    std::memset(&state, 0, sizeof state);
-    for (int i = 0; i < n_inputs && i < MAX_INPUTS; ++i)
-      if (connected[static_cast<std::size_t>(i)]) state.input_info[i] = *call.rasters[i + 1];
-    auto read_frame = [&](const T_RasterInfo &frame_info, void *pixels,
-                          std::string *why) -> std::shared_ptr<const WorkImage> {
-      RasterView frame;
-      if (!describe_raster(frame_info, pixels, &frame, why)) return nullptr;
-      if (!check_resolution(frame_info, downsample, "the frame", why)) return nullptr;
-      return read_image(frame, ctx, spaces, spaces.input, call.premultiplied);
-    };
-    requests = std::make_unique<FrameRequests>(request_fun, state, call.instance, *g, read_frame);
-    ctx.requests = requests.get();
-  }
-  if (g->flags.use_prev_dest_p && !ctx.previous && ctx.requests)
-    if (const History history = find_history(g->name)) {
-      const int frames = history(ctx);
-      if (frames > 0) ctx.previous = rebuild_previous(call, ctx, dest, spaces, *g, kernel, mix, frames);
-    }
+  if (!request_fun || call.flare_call || !(g.flags.need_other_frames_p || g.flags.use_prev_dest_p)) return nullptr;
+  T_RenderState state;
+  std::memset(&state, 0, sizeof state);
+  for (int i = 0; i < inputs.count() && i < MAX_INPUTS; ++i)
+    if (inputs.connected[static_cast<std::size_t>(i)]) state.input_info[i] = *call.rasters[i + 1];
+  auto read_frame = [&call, &checked, ctx](const T_RasterInfo &frame_info, void *pixels,
+                                           std::string *why) -> std::shared_ptr<const WorkImage> {
+    RasterView frame;
+    if (!describe_raster(frame_info, pixels, &frame, why)) return nullptr;
+    if (!check_resolution(frame_info, checked.downsample, "the frame", why)) return nullptr;
+    return read_image(frame, *ctx, checked.spaces, checked.spaces.input, call.premultiplied);
+  };
+  return std::make_unique<FrameRequests>(request_fun, state, call.instance, g, read_frame);
+}
+
+// Runs the kernel (unless the mix leaves input 1 as it is) and writes every
+// line of the result to the destination.
+void write_result(const RenderCall &call, const KernelContext &ctx, const Checked &checked, const Inputs &inputs,
+                  Kernel kernel, float mix) {
   std::unique_ptr<WorkImage> made;
   int unchanged = kWrote;  // the input that is the result as it is
-  if (n_inputs > 0 && mix <= 0.0f) {
+  if (inputs.count() > 0 && mix <= 0.0f) {
     unchanged = 0;
   } else {
     made = std::make_unique<WorkImage>(ctx.width, ctx.height);
@@ -365,19 +375,56 @@ bool render(const RenderCall &call, std::string *error) {
   // Any mix of input 1 with itself is input 1; another input is blended with
   // it. An input sharing the destination's memory is taken from its working
   // copy, as lines written may be lines still to be read.
-  const bool copy_pixels = unchanged >= 0 && connected[static_cast<std::size_t>(unchanged)] &&
-                           !overlaps(sources[static_cast<std::size_t>(unchanged)], dest) &&
-                           (mix >= 1.0f || unchanged == 0) && g->rgba_mode != 2 &&
+  const RasterView &dest = checked.dest;
+  const bool copy_pixels = unchanged >= 0 && inputs.connected[static_cast<std::size_t>(unchanged)] &&
+                           !overlaps(inputs.sources[static_cast<std::size_t>(unchanged)], dest) &&
+                           (mix >= 1.0f || unchanged == 0) && checked.g->rgba_mode != 2 &&
                            !((call.flags & kRenderKeepAlpha) && dest.layout->has_alpha());
   const WorkImage &result = made ? *made : ctx.input(unchanged);
   const float line_mix = made || unchanged != 0 ? mix : 1.0f;
   ctx.rows([&](int y) {
     std::vector<float> line(static_cast<std::size_t>(ctx.width) * 4);
     if (copy_pixels)
-      copy_line(call, ctx, dest, sources[static_cast<std::size_t>(unchanged)], spaces, y, line);
+      copy_line(call, ctx, dest, inputs.sources[static_cast<std::size_t>(unchanged)], checked.spaces, y, line);
     else
-      finish_line(call, ctx, dest, spaces, *g, line_mix, result, y, line);
+      finish_line(call, ctx, dest, checked.spaces, *checked.g, line_mix, result, y, line);
   });
+}
+
+}  // namespace
+
+bool render(const RenderCall &call, std::string *error) {
+  const InstanceUse use(call.instance);  // the instance outlives this render, whoever frees it meanwhile
+  EffectInstance *instance = use.get();
+  if (!instance) {
+    *error = "not a live effect instance of this engine";
+    return false;
+  }
+  Checked checked;
+  Inputs inputs;
+  if (!check_call(call, *instance, &checked, error) || !describe_inputs(call, checked, &inputs, error)) return false;
+  if (checked.dest.empty()) return true;
+
+  const Genotype &g = *checked.g;
+  KernelContext ctx = kernel_context(call, checked, inputs);
+  const ParamReader params(g, inputs.connected, ctx.frame, ctx.seconds());
+  ctx.params = &params;
+  load_inputs(call, checked, inputs, &ctx);
+  const Kernel kernel = call.flare_call ? render_flare_call : find_kernel(g.name);
+  if (!kernel) {
+    *error = std::string("the engine cannot render \"") + g.name + "\"";
+    return false;
+  }
+  const float mix = call.flare_call ? 1.0f : std::clamp(call.mix, 0.0f, 1.0f) * slot_mix(*instance);
+  const std::unique_ptr<FrameRequests> requests = frames_from_host(call, checked, inputs, &ctx);
+  ctx.requests = requests.get();
+  if (g.flags.use_prev_dest_p && !ctx.previous && ctx.requests)
+    if (const History history = find_history(g.name)) {
+      const int frames = history(ctx);
+      if (frames > 0)
+        ctx.previous = rebuild_previous(call, ctx, checked.dest, checked.spaces, g, kernel, mix, frames);
+    }
+  write_result(call, ctx, checked, inputs, kernel, mix);
   return true;
 }
 

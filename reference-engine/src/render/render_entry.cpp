@@ -53,6 +53,34 @@ bool basics_present(EffectGlobals_t *instance, T_RasterInfo **rasters, int n_ras
   return instance && rasters && n_rasters >= 1;
 }
 
+// The call record with the arguments both entry points take; each adds its own.
+RenderCall shared_call(const char *entry, EffectGlobals_t *instance, const char *descriptor, RawImage dest, int frame,
+                       int field, int downsample, int quality, T_RasterInfo **rasters, RawImage *images,
+                       int n_rasters, float pixel_aspect, int n_threads, int seed, bool premultiplied,
+                       const char *input_colorspace, const char *output_colorspace,
+                       const char *working_colorspace) {
+  RenderCall call;
+  call.entry = entry;
+  call.instance = instance;
+  call.descriptor = descriptor;
+  call.dest = dest;
+  call.rasters = rasters;
+  call.images = images;
+  call.n_rasters = n_rasters;
+  call.frame = frame;
+  call.field = field;
+  call.downsample = downsample;
+  call.quality = quality;
+  call.pixel_aspect = pixel_aspect;
+  call.n_threads = n_threads;
+  call.seed = seed;
+  call.premultiplied = premultiplied;
+  call.input_colorspace = input_colorspace;
+  call.output_colorspace = output_colorspace;
+  call.working_colorspace = working_colorspace;
+  return call;
+}
+
 }  // namespace
 
 void note_render_seconds(double seconds) { last_seconds.store(seconds); }
@@ -75,28 +103,13 @@ int render_tarsel_effect_to_native_image(EffectGlobals_t *instance, const char *
       premultiplied, input_colorspace, output_colorspace, working_colorspace);
   tarsel_ref::RenderClock clock;
   if (tarsel_ref::render_immediate_return()) return tarsel_ref::basics_present(instance, rasters, n_rasters) ? 1 : 0;
-  tarsel_ref::RenderCall call;
-  call.entry = "render_tarsel_effect_to_native_image";
-  call.instance = instance;
-  call.descriptor = descriptor;
-  call.dest = dest;
-  call.rasters = rasters;
-  call.images = images;
-  call.n_rasters = n_rasters;
-  call.frame = frame;
-  call.field = field;
-  call.downsample = downsample;
-  call.quality = quality;
+  tarsel_ref::RenderCall call = tarsel_ref::shared_call(
+      "render_tarsel_effect_to_native_image", instance, descriptor, dest, frame, field, downsample, quality, rasters,
+      images, n_rasters, pixel_aspect, n_threads, seed, premultiplied, input_colorspace, output_colorspace,
+      working_colorspace);
   call.mix = mix;
-  call.pixel_aspect = pixel_aspect;
-  call.n_threads = n_threads;
-  call.seed = seed;
   call.flags = flags;
   call.frame_rate = frame_rate;
-  call.premultiplied = premultiplied;
-  call.input_colorspace = input_colorspace;
-  call.output_colorspace = output_colorspace;
-  call.working_colorspace = working_colorspace;
   return tarsel_ref::run(call) ? 1 : 0;
 }
 
@@ -120,25 +133,10 @@ bool render_tarsel_lensflare_to_native_image(EffectGlobals_t *instance, const ch
   }
   tarsel_ref::FlareCall flare;
   flare.brightness = brightness;
-  tarsel_ref::RenderCall call;
-  call.entry = "render_tarsel_lensflare_to_native_image";
-  call.instance = instance;
-  call.descriptor = descriptor;
-  call.dest = dest;
-  call.rasters = rasters;
-  call.images = images;
-  call.n_rasters = n_rasters;
-  call.frame = frame;
-  call.field = field;
-  call.downsample = downsample;
-  call.quality = quality;
-  call.pixel_aspect = pixel_aspect;
-  call.n_threads = n_threads;
-  call.seed = seed;
-  call.premultiplied = premultiplied;
-  call.input_colorspace = input_colorspace;
-  call.output_colorspace = output_colorspace;
-  call.working_colorspace = working_colorspace;
+  tarsel_ref::RenderCall call = tarsel_ref::shared_call(
+      "render_tarsel_lensflare_to_native_image", instance, descriptor, dest, frame, field, downsample, quality,
+      rasters, images, n_rasters, pixel_aspect, n_threads, seed, premultiplied, input_colorspace, output_colorspace,
+      working_colorspace);
   // The centre is given in destination pixels; the kernel works in the frame.
   if (rasters && n_rasters >= 1 && rasters[0]) {
     flare.center_x = static_cast<double>(center_x) + rasters[0]->x_origin;

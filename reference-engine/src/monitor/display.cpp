@@ -5,7 +5,7 @@
 #include <string>
 
 #include "monitor/preview_device.h"
-#include "monitor/probe_state.h"
+#include "monitor/live_objects.h"
 
 namespace qrv_ref {
 namespace {

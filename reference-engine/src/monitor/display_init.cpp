@@ -2,7 +2,7 @@
 #include <new>
 
 #include "monitor/display.h"
-#include "monitor/probe_state.h"
+#include "monitor/live_objects.h"
 
 EM_Display *EM_DisplayInit() {
   if (qrv_ref::init_fails())

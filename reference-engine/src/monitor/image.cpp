@@ -3,7 +3,7 @@
 #include <cmath>
 #include <new>
 
-#include "monitor/probe_state.h"
+#include "monitor/live_objects.h"
 
 namespace qrv_ref {
 

@@ -44,25 +44,26 @@ void log_call(const void *object, const std::string &text) {
   objects.observer(entry + "." + text);
 }
 
-int register_display(ReferenceDisplay *display) {
+namespace {
+
+using Kind = std::map<const void *, int> LiveObjects::*;  // displays or images
+
+int number(Kind kind, const void *object) {
   std::lock_guard<std::mutex> hold(live().mutex);
-  return live().displays[display] = ++live().made;
+  return (live().*kind)[object] = ++live().made;
 }
 
-void unregister_display(ReferenceDisplay *display) {
+void forget(Kind kind, const void *object) {
   std::lock_guard<std::mutex> hold(live().mutex);
-  live().displays.erase(display);
+  (live().*kind).erase(object);
 }
 
-int register_image(WrappedImage *image) {
-  std::lock_guard<std::mutex> hold(live().mutex);
-  return live().images[image] = ++live().made;
-}
+}  // namespace
 
-void unregister_image(WrappedImage *image) {
-  std::lock_guard<std::mutex> hold(live().mutex);
-  live().images.erase(image);
-}
+int register_display(ReferenceDisplay *display) { return number(&LiveObjects::displays, display); }
+void unregister_display(ReferenceDisplay *display) { forget(&LiveObjects::displays, display); }
+int register_image(WrappedImage *image) { return number(&LiveObjects::images, image); }
+void unregister_image(WrappedImage *image) { forget(&LiveObjects::images, image); }
 
 int object_number(const void *object) {
   LiveObjects &objects = live();

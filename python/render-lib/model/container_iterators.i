@@ -90,6 +90,13 @@ public:
   // Whether `container` is the one this position belongs to. A position
   // without a container (made by a foreign module) belongs to none.
   bool belongs_to(const Container *container) const { return container && current() == container; }
+  // Refuses a position given to another container than its own, or one a
+  // change of its container made stale.
+  void check_given_to(const Container *container) const {
+    if (!belongs_to(container))
+      throw PositionRefused{PyExc_ValueError, "an iterator of another container"};
+    this->container();
+  }
   // The same kind of position over the same container, or "bad iterator type".
   template <class Position>
   static const Position &alike(const Position &self, const SwigPyIterator &other) {
@@ -160,23 +167,11 @@ public:
 
   // The C++ iterator in `vector`, checked for `use`: 0 any position from the
   // first to the end, 1 an element.
-  bool at(Vector *vector, int use, OutIter *iterator, PositionRefused *refused) const {
-    if (!base::belongs_to(vector)) {
-      *refused = PositionRefused{PyExc_ValueError, "an iterator of another container"};
-      return false;
-    }
-    try {
-      base::container();
-    } catch (const PositionRefused &stale) {
-      *refused = stale;
-      return false;
-    }
-    if (index_ + use > vector->size()) {
-      *refused = PositionRefused{PyExc_IndexError, "the iterator is past the last element"};
-      return false;
-    }
-    *iterator = start(vector) + index_;
-    return true;
+  OutIter at(Vector *vector, int use) const {
+    base::check_given_to(vector);
+    if (index_ + use > vector->size())
+      throw PositionRefused{PyExc_IndexError, "the iterator is past the last element"};
+    return start(vector) + index_;
   }
 
 private:
@@ -257,23 +252,11 @@ public:
   }
   SwigPyIterator *copy() const { return new self_type(*this); }
 
-  bool at(Map *map, int use, iterator *out, PositionRefused *refused) const {
-    if (!base::belongs_to(map)) {
-      *refused = PositionRefused{PyExc_ValueError, "an iterator of another container"};
-      return false;
-    }
-    try {
-      base::container();
-      if (at_end_ && use) {
-        *refused = PositionRefused{PyExc_IndexError, "the iterator is past the last element"};
-        return false;
-      }
-      *out = at_end_ ? map->end() : element(map);
-    } catch (const PositionRefused &stale) {
-      *refused = stale;
-      return false;
-    }
-    return true;
+  iterator at(Map *map, int use) const {
+    base::check_given_to(map);
+    if (at_end_ && use)
+      throw PositionRefused{PyExc_IndexError, "the iterator is past the last element"};
+    return at_end_ ? map->end() : element(map);
   }
 
 private:
@@ -345,24 +328,31 @@ SwigPyIterator *map_position(const typename Map::iterator &at, PyObject *seq) {
 // for `use` (0 any position, 1 an element); false with the reason set when
 // it is refused, or when it is no position of this module (`refused.type`
 // is then null).
+template <class Position, class Container, class OutIter>
+bool position_of(Container *container, SwigPyIterator *iterator, int use, OutIter *out, PositionRefused *refused) {
+  refused->type = 0;
+  const Position *position = dynamic_cast<const Position *>(iterator);
+  if (!position)
+    return false;
+  try {
+    *out = position->at(container, use);
+    return true;
+  } catch (const PositionRefused &why) {
+    *refused = why;
+    return false;
+  }
+}
 template <class Container, class OutIter>
 bool position_argument(Container *container, SwigPyIterator *iterator, int use, OutIter *out,
                        PositionRefused *refused) {
-  refused->type = 0;
-  if (const VectorPosition<Container, OutIter, false> *position =
-          dynamic_cast<const VectorPosition<Container, OutIter, false> *>(iterator))
-    return position->at(container, use, out, refused);
-  return false;
+  return position_of<VectorPosition<Container, OutIter, false> >(container, iterator, use, out, refused);
 }
 template <class K, class T, class C, class A>
 bool position_argument(std::map<K, T, C, A> *map, SwigPyIterator *iterator, int use,
                        typename std::map<K, T, C, A>::iterator *out, PositionRefused *refused) {
   typedef std::map<K, T, C, A> Map;
-  typedef MapPosition<Map, typename Map::iterator, from_oper<typename Map::value_type>, false> Position;
-  refused->type = 0;
-  if (const Position *position = dynamic_cast<const Position *>(iterator))
-    return position->at(map, use, out, refused);
-  return false;
+  return position_of<MapPosition<Map, typename Map::iterator, from_oper<typename Map::value_type>, false> >(
+      map, iterator, use, out, refused);
 }
 
 }  // namespace swig

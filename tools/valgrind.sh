@@ -45,10 +45,10 @@ deselect=(
   # A restarted peer process must start and answer within 5 s.
   tests/ipc/test_two_processes.py::test_a_peer_killed_holding_the_lock
   # An abort must end a 4K blur within 0.2 s of the request.
-  tests/render/test_render_threads.py::test_an_abort_from_another_thread_ends_a_4k_render_quickly
+  tests/rendering/test_render_threads.py::test_an_abort_from_another_thread_ends_a_4k_render_quickly
   # Compares a Python thread's pace during two full-HD renders with its pace
   # alone; valgrind runs one thread at a time.
-  tests/render/test_render_threads.py::test_two_renders_at_once_while_python_keeps_running
+  tests/rendering/test_render_threads.py::test_two_renders_at_once_while_python_keeps_running
   # Timed waits must end within 20 ms of their timeout.
   tests/ipc/test_transport.py::test_nothing_to_read_is_none_without_an_error
   tests/ipc/test_transport.py::test_a_full_queue
@@ -65,7 +65,7 @@ deselect=(
   tests/ipc/test_two_processes.py::test_a_segment_truncated_under_its_transports
   # Needs the engine to hand a freed instance's address out again, which
   # memcheck's store of freed blocks prevents.
-  tests/render/test_instance_sharing.py::test_a_freed_proxy_stays_refused_when_its_address_is_handed_out_again
+  tests/rendering/test_instance_sharing.py::test_a_freed_proxy_stays_refused_when_its_address_is_handed_out_again
 )
 deselect_args=()
 for test in "${deselect[@]}"; do deselect_args+=(--deselect "$test"); done

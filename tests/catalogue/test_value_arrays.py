@@ -64,11 +64,3 @@ def test_a_raster_descriptors_background_is_accepted_as_value_data():
     values = renderlib.ValueArray()
     values.data = info.background_pixel
     assert list(values) == pytest.approx([0.1, 0.2, 0.3, 0.4])
-
-
-def test_messages_name_the_template():
-    with pytest.raises(TypeError, match=r"^in method 'ValueArray___len__', argument 1 of type "
-                                        r"'wrapped_array< float,MAX_CHANNELS > const \*'$"):
-        _renderlib.ValueArray___len__(renderlib.ShortInputArray())
-    with pytest.raises(TypeError, match=r"argument 1 of type 'wrapped_array< short,MAX_INPUTS > \*'$"):
-        _renderlib.ShortInputArray___setitem__(renderlib.ValueArray(), 0, 1)

@@ -1,5 +1,9 @@
-"""Both catalogues walked completely: every effect created, read and freed."""
+"""Both catalogues as the module hands them over, walked completely: every
+effect created, read and freed."""
+import pytest
+
 import _renderlib
+import renderlib
 from effect_helpers import all_entries, all_params
 from renderlib import effects
 
@@ -72,3 +76,21 @@ def test_every_parameter_type_is_in_the_catalogue(instance):
             _renderlib.ptype_boolean, _renderlib.ptype_pushbutton, _renderlib.ptype_string,
             _renderlib.ptype_label, _renderlib.ptype_flare} <= types
     assert {3, 4} <= colour_channels
+
+
+@pytest.mark.parametrize("lookup, count", [("get_tarsel_plugin_info_i", "get_n_tarsel_effects"),
+                                           ("get_tarsel_builder_info_i", "get_n_tarsel_builder_effects")])
+def test_indices_reach_the_engine_unchecked_and_null_becomes_none(probe, lookup, count):
+    n = getattr(_renderlib, count)()
+    assert probe.calls() == ["%s()" % count]
+    probe.clear_calls()
+    for index in (n, -1, 2147483647):
+        assert getattr(_renderlib, lookup)(index) is None  # the reference engine returns null
+    assert probe.calls() == ["%s(%d)" % (lookup, i) for i in (n, -1, 2147483647)]
+
+
+def test_a_record_made_from_python_is_read_only_and_owned():
+    info = renderlib.Plugin_Info()
+    assert info.plugin_name is None and info.this.own()
+    with pytest.raises(AttributeError):
+        info.plugin_name = "T_Blur"

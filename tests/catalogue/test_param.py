@@ -1,5 +1,4 @@
 """Param made from Python: construction, attributes, overloads, identity."""
-import ctypes
 import re
 
 import pytest
@@ -85,19 +84,6 @@ def test_overloaded_methods_and_strict_booleans():
         "  Possible C/C++ prototypes are:\n"
         "    Param::to_string(RenderContext *,bool)\n"
         "    Param::to_string(RenderContext *)\n")
-    with pytest.raises(TypeError, match=r"^Wrong number or type of arguments for overloaded function 'Param_to_json'"):
-        param.to_json(None, 0)
-    with pytest.raises(TypeError, match=r"^Wrong number or type of arguments for overloaded function "
-                                        r"'Param_maybe_set_to_old_default'.\n  Possible C/C\+\+ prototypes are:\n"
-                                        r"    Param::maybe_set_to_old_default\(RenderContext \*,float,unsigned int\)\n"
-                                        r"    Param::maybe_set_to_old_default\(RenderContext \*,float\)\n$"):
-        param.maybe_set_to_old_default(None)
-    with pytest.raises(TypeError, match=r"^in method 'Param_needs_old_default', argument 2 of type 'float'$"):
-        param.needs_old_default("1")
-    with pytest.raises(TypeError, match=r"^in method 'Param_numeric_p', argument 1 of type 'Param \*'$"):
-        _renderlib.Param_numeric_p(renderlib.Genotype())
-    with pytest.raises(TypeError, match=r"^in method 'Param_ptype_name', argument 1 of type 'Param const \*'$"):
-        _renderlib.Param_ptype_name(5)
 
 
 def test_engine_members_of_a_param_made_from_python():
@@ -110,12 +96,3 @@ def test_engine_members_of_a_param_made_from_python():
     assert param.get_state_names() == []  # not a popup
     assert param.is_point() is False
     assert param.get_limits() == (None, None, param.slider_min, param.slider_max)  # "no limit" both ways
-
-
-@pytest.mark.parametrize("mode, point", [(0, False), (1, True), (2, True), (3, False), (4, True), (5, False),
-                                         (6, True), (7, True), (8, False), (9, False)])
-def test_point_parameters_are_two_channel_params_in_placing_screen_modes(mode, point):
-    param = renderlib.Param("P", _renderlib.ptype_float, 2, mode)
-    ctypes.memmove(int(param.this) + 41, bytes([2]), 1)  # the engine shows two channels
-    assert param.is_point() is point
-    assert len(param.get_titles()) == (1 if point else 2)

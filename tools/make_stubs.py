@@ -1,10 +1,12 @@
 #!/usr/bin/env python3
-"""Writes the type stubs of the binding from its interface as built.
+"""Writes the type stubs of the SWIG layer from its interface as built.
 
-    python tools/make_stubs.py [--swig PATH] [--work DIR] [--check]
+    python tools/make_stubs.py --out DIR [--swig PATH] [-I DIR ...] [--work DIR]
 
-SWIG is run on python/render-lib/renderlib.i the way the build runs it, and
-the stubs are read off what it generates:
+The build runs it (python/render-lib/CMakeLists.txt) and installs what it
+writes with the package. SWIG is run on python/render-lib/renderlib.i the way
+the build runs it, with the engine's headers from -I (engine-api/ if none is
+given), and the stubs are read off what it generates:
 
 - the C++ wrapper gives every function of the extension module, its number of
   arguments, the conversion each argument goes through (with the C type named
@@ -14,15 +16,14 @@ the stubs are read off what it generates:
   properties and constructors, and the module's functions and constants;
 - a second run with the autodoc feature gives the parameters' names.
 
-Written (all under python/render-lib/):
+Written under --out:
 
 - _renderlib-stubs/__init__.pyi: the extension module, a PEP 561 stub-only
   package. Its flat functions take positional arguments only.
 - renderlib/__init__.pyi: the companion layer. Proxy methods pass their
   arguments on positionally, so their parameters are positional-only too.
-- renderlib/<module>.pyi for each hand-written module of the package, with the
-  parameters as the source declares them and the types from HANDWRITTEN below;
-- renderlib/py.typed, the PEP 561 marker of a package with inline stubs.
+
+The hand-written modules of the package carry their own annotations.
 
 Type rules, as the wrapper behaves:
 
@@ -44,9 +45,8 @@ Type rules, as the wrapper behaves:
   are typed from PYOBJECT_RESULTS and PYOBJECT_ARGUMENTS below, each with the
   interface file that says what they hold.
 
-Any wrapper code the generator does not recognise stops it with an error, so
-a changed interface cannot quietly turn into loose stubs. --check compares the
-stubs on disk with what the interface gives now and exits 1 when they differ.
+Any wrapper code the generator does not recognise stops it (and the build)
+with an error, so a changed interface cannot quietly turn into loose stubs.
 """
 import argparse
 import ast
@@ -61,12 +61,9 @@ from pathlib import Path
 
 REPO = Path(__file__).resolve().parent.parent
 BINDING = REPO / "python" / "render-lib"
-PACKAGE = BINDING / "renderlib"
-EXTENSION_STUB = BINDING / "_renderlib-stubs" / "__init__.pyi"
-PACKAGE_STUB = PACKAGE / "__init__.pyi"
+EXTENSION_STUB = Path("_renderlib-stubs", "__init__.pyi")
+PACKAGE_STUB = Path("renderlib", "__init__.pyi")
 SWIG_VERSION = "4.0.2"
-# Modules of the package that are programs, not APIs: importing one runs it.
-PROGRAM_MODULES = {"__main__"}
 
 GENERATED_BY = "tools/make_stubs.py"
 
@@ -159,15 +156,18 @@ ELEMENTS = {"float": "float", "double": "float", "bool": "bool", "int": "int", "
 # Running SWIG
 
 
-def run_swig(swig, out, extra=()):
+def run_swig(swig, includes, out, extra=()):
     out.mkdir(parents=True, exist_ok=True)
     version = subprocess.run([swig, "-version"], capture_output=True, text=True, check=True).stdout
     if "SWIG Version %s" % SWIG_VERSION not in version:
         raise StubError("%s is not SWIG %s: %s" % (swig, SWIG_VERSION, version.strip()))
-    subprocess.run([swig, "-c++", "-python", "-threads", "-Wextra", *extra,
-                    "-I%s" % BINDING, "-I%s" % (REPO / "engine-api"),
-                    "-outdir", str(out), "-o", str(out / "wrap.cxx"), str(BINDING / "renderlib.i")],
-                   check=True, cwd=REPO)
+    # Quiet unless it fails: the build's own SWIG run shows the same warnings.
+    run = subprocess.run([swig, "-c++", "-python", "-threads", "-Wextra", *extra, "-I%s" % BINDING,
+                          *["-I%s" % include for include in includes], "-outdir", str(out),
+                          "-o", str(out / "wrap.cxx"), str(BINDING / "renderlib.i")],
+                         cwd=REPO, stdout=subprocess.PIPE, stderr=subprocess.STDOUT, text=True)
+    if run.returncode:
+        raise StubError("SWIG failed:\n%s" % run.stdout)
     return (out / "wrap.cxx").read_text(), (out / "renderlib.py").read_text()
 
 
@@ -617,7 +617,7 @@ def parameter_names(companion_with_docs):
                     if item.name == "__init__":
                         for flat in flats:
                             if flat.startswith("new_"):
-                                director = "_self" in ast.unparse(item)
+                                director = "_self" in ast.dump(item)
                                 record(flat, prototypes(item), drop_self=True, prefix=("_self",) if director else ())
                     else:
                         for flat in flats:
@@ -783,8 +783,8 @@ def tidy(text):
 def extension_stub(wrapper, names):
     lines = [
         "# Type stubs of the _renderlib extension module.",
-        "# Generated by %s from the SWIG wrapper of python/render-lib/renderlib.i;" % GENERATED_BY,
-        "# do not edit: change the interface and run the generator again.",
+        "# Generated by %s from the SWIG wrapper of python/render-lib/renderlib.i" % GENERATED_BY,
+        "# when the package is built; change the interface, not this file.",
         "#",
         "# Results are typed as proxies of the renderlib package, which registers",
         "# its classes when it is imported (without it they are bare pointer objects).",
@@ -850,8 +850,8 @@ def companion_stub(wrapper, names, companion):
     lines = [
         "# Type stubs of the renderlib package's proxy layer (written by SWIG as",
         "# renderlib.py, installed as renderlib/__init__.py).",
-        "# Generated by %s from the SWIG wrapper of python/render-lib/renderlib.i;" % GENERATED_BY,
-        "# do not edit: change the interface and run the generator again.",
+        "# Generated by %s from the SWIG wrapper of python/render-lib/renderlib.i" % GENERATED_BY,
+        "# when the package is built; change the interface, not this file.",
         "#",
         "# Methods take positional arguments only. A pointer argument takes None",
         "# as null where the wrapper lets it, and a pointer result is None where",
@@ -944,8 +944,8 @@ def proxy_class(wrapper, node, flat):
                 # overloaded operator accepts; SWIG's takes an int only.
                 lines_of_method[-1] += "  # type: ignore[misc]"
             body.extend(lines_of_method)
-        elif isinstance(item, ast.Expr) and isinstance(item.value, ast.Constant):
-            continue
+        elif isinstance(item, ast.Expr) and item is node.body[0]:
+            continue  # the class's docstring
         else:
             raise StubError("%s: a statement the generator does not know" % cls)
     return lines + body
@@ -972,7 +972,7 @@ def proxy_property(wrapper, name, call, methods, flat, cls):
 
 def proxy_method(wrapper, cls, item, methods, flat):
     name = item.name
-    source = ast.unparse(item)
+    source = ast.dump(item)  # names and texts, as the source spells them
     if name == "__init__":
         if "No constructor defined" in source:
             # The engine makes these; calling the class raises AttributeError.
@@ -1001,263 +1001,12 @@ def proxy_method(wrapper, cls, item, methods, flat):
 
 
 # --------------------------------------------------------------------------
-# Hand-written modules: the parameters come from the source, the types from
-# here, as "module.function" (or "module.Class.method") -> {parameter: type,
-# "return": type}, and "module.name" -> type for a module or class attribute.
-
-HANDWRITTEN_IMPORTS = {
-    "arrays": ["from typing import Any, TypeVar", "", "import numpy", "from numpy.typing import NDArray", "",
-               "from renderlib import T_RasterInfo", "",
-               '_Array = TypeVar("_Array", bound=NDArray[Any])'],
-    "cli": ["import argparse", "import os", "from collections.abc import Sequence"],
-    "contact_sheet": ["import pathlib", "from collections.abc import Callable, Iterable, Sequence",
-                      "from typing import Any", "", "import numpy", "from _typeshed import StrPath",
-                      "from numpy.typing import NDArray", "from PIL import Image"],
-    "effects": ["from collections.abc import Mapping, Sequence", "", "from typing_extensions import Buffer", "",
-                "from renderlib import EffectGlobals_t, Plugin_Info, T_RasterInfo"],
-    "images": ["import numpy", "from _typeshed import StrPath", "from numpy.typing import ArrayLike, NDArray"],
-    "monitor": ["from typing_extensions import Buffer, Self"],
-    "png": ["from _typeshed import FileDescriptorOrPath"],
-    "rendering": ["from collections.abc import Callable, Iterable, Mapping", "", "import numpy",
-                  "from numpy.typing import ArrayLike, NDArray", "from typing_extensions import Self", "",
-                  "from renderlib import EffectGlobals_t"],
-    "widgets": ["from PIL import Image", "", "import renderlib", "from _renderlib import _SwigPyObject, _Wrapped",
-                "from renderlib import float_vector"],
-}
-
-# An input of the renderers: a frame number's picture, as anything numpy
-# turns into an RGBA array; None for an unconnected input.
-_FRAME_SOURCE = "Callable[[int], ArrayLike] | None"
-_RGBA = "NDArray[numpy.float32]"
-
-HANDWRITTEN = {
-    # arrays.py
-    "arrays.DEFAULT_LAYOUTS": "dict[int, str]",
-    "arrays.PIXEL_TYPES": "dict[tuple[str, str], int]",
-    "arrays.LAYOUTS": "dict[int, tuple[str, numpy.dtype[Any]]]",
-    "arrays.raster_info_for": {"array": "NDArray[Any]", "layout": "str | None", "return": "T_RasterInfo"},
-    "arrays.described": {"array": "_Array", "layout": "str | None", "return": "tuple[T_RasterInfo, _Array]"},
-    "arrays.array_for": {"info": "T_RasterInfo", "return": "NDArray[Any]"},
-    "arrays.layout_of": {"info": "T_RasterInfo", "return": "str"},
-    # cli.py: the commands take the parsed command line.
-    "cli.EXIT_RENDER": "int",
-    "cli.EXIT_USAGE": "int",
-    "cli.EXIT_BUILD": "int",
-    "cli.EXIT_FILE": "int",
-    "cli.EXIT_MONITOR": "int",
-    "cli.CommandError.status": "int",
-    "cli.CommandError.__init__": {"message": "str", "status": "int", "return": "None"},
-    "cli.user_identity": {"return": "str | None"},
-    "cli.version": {"_args": "argparse.Namespace", "return": "int"},
-    "cli.list_effects": {"_args": "argparse.Namespace", "return": "int"},
-    "cli.describe": {"args": "argparse.Namespace", "return": "int"},
-    "cli.frame_range": {"text": "str", "return": "range"},
-    "cli.size": {"text": "str", "return": "tuple[int, int]"},
-    "cli.parameter": {"text": "str", "return": "tuple[str, str]"},
-    "cli.frame_path": {"pattern": "str | os.PathLike[str]", "frame": "int", "return": "str"},
-    "cli.render": {"args": "argparse.Namespace", "return": "int"},
-    "cli.monitor": {"args": "argparse.Namespace", "return": "int"},
-    "cli.contact_sheet": {"args": "argparse.Namespace", "return": "int"},
-    "cli.parser": {"return": "argparse.ArgumentParser"},
-    "cli.main": {"argv": "Sequence[str] | None", "return": "int"},
-    # contact_sheet.py
-    "contact_sheet.COLUMNS": "int",
-    "contact_sheet.LABEL_HEIGHT": "int",
-    "contact_sheet.showcase_params": {"name": "str | None", "width": "float", "height": "float",
-                                      "return": "dict[str, str]"},
-    "contact_sheet.second_card": {"width": "int", "height": "int", "frame": "int", "return": _RGBA},
-    "contact_sheet.render_every_effect": {"folder": "pathlib.Path", "size": "tuple[int, int]", "frame": "int",
-                                          "progress": "Callable[[list[str | None]], Iterable[str | None]]",
-                                          "return": "list[tuple[str, %s]]" % _RGBA},
-    "contact_sheet.sheet_image": {"renders": "Sequence[tuple[str, NDArray[Any]]]", "return": "Image.Image"},
-    "contact_sheet.widget_overlay": {"size": "tuple[int, int]", "frame": "int", "return": "Image.Image"},
-    "contact_sheet.make_contact_sheet": {"folder": "StrPath", "size": "tuple[int, int]", "frame": "int",
-                                         "progress": "Callable[[list[str | None]], Iterable[str | None]]",
-                                         "return": "pathlib.Path"},
-    # effects.py
-    "effects.catalogue": {"builder": "bool", "return": "list[Plugin_Info | None]"},
-    "effects.is_builder_effect": {"plugin_name": "str | None", "return": "bool"},
-    "effects.parameter_texts": {"instance": "EffectGlobals_t", "return": "dict[str, str | None]"},
-    "effects.saved_text": {"instance": "EffectGlobals_t", "changes": "Mapping[str, str | None] | None",
-                           "return": "str"},
-    "effects.recreate": {"instance": "EffectGlobals_t", "changes": "Mapping[str, str | None] | None",
-                         "return": "EffectGlobals_t | None"},
-    "effects.raster": {"pixel_type": "int", "width": "int", "height": "int",
-                       "return": "tuple[T_RasterInfo, bytearray]"},
-    "effects.render": {"instance": "EffectGlobals_t | None", "dest": "tuple[T_RasterInfo | None, Buffer]",
-                       "inputs": "Sequence[tuple[T_RasterInfo | None, Buffer | None] | None]",
-                       "previous": "Buffer | None", "frame": "int", "colorspace": "str | None", "return": "bool"},
-    # images.py
-    "images.TIFF_SUFFIXES": "tuple[str, ...]",
-    "images.DEPTHS": "tuple[str, ...]",
-    "images.read_image": {"path": "StrPath", "return": _RGBA},
-    "images.quantised": {"rgba": "ArrayLike", "depth": "str",
-                         "return": "NDArray[numpy.uint8] | NDArray[numpy.uint16] | NDArray[numpy.float32]"},
-    "images.write_image": {"path": "StrPath", "rgba": "ArrayLike", "depth": "str", "return": "None"},
-    # monitor.py
-    "monitor.STATUS_NAMES": "dict[int, str]",
-    "monitor.MonitorError.status": "int | None",
-    "monitor.MonitorError.__init__": {"operation": "str", "status": "int | None", "return": "None"},
-    "monitor.devices": {"return": "dict[str, list[str]]"},
-    "monitor.Monitor.device": "str",
-    "monitor.Monitor.width": "int",
-    "monitor.Monitor.height": "int",
-    "monitor.Monitor.__init__": {"device": "str", "mode": "str", "return": "None"},
-    "monitor.Monitor.show": {"pixels": "Buffer", "format": "int", "name": "str | None", "bottom_up": "bool",
-                             "pixel_aspect": "float", "gamma": "float", "premultiplied": "bool",
-                             "full_range": "bool", "return": "None"},
-    "monitor.Monitor.close": {"return": "None"},
-    "monitor.Monitor.__enter__": {"return": "Self"},
-    "monitor.Monitor.__exit__": {"exc": "object", "return": "None"},
-    # png.py
-    "png.encode_rgba8": {"pixels": "bytes | bytearray | memoryview", "width": "int", "height": "int",
-                         "return": "bytes"},
-    "png.write_rgba8": {"path": "FileDescriptorOrPath", "pixels": "bytes | bytearray | memoryview",
-                        "width": "int", "height": "int", "return": "None"},
-    # rendering.py
-    "rendering.card_frame": {"width": "int", "height": "int", "frame": "int", "return": _RGBA},
-    "rendering.effect_instance": {"name": "str | None", "params": "Mapping[str, str | None] | None",
-                                  "return": "EffectGlobals_t"},
-    "rendering.EffectRenderer.instance": "EffectGlobals_t | None",
-    "rendering.EffectRenderer.name": "str | None",
-    "rendering.EffectRenderer.n_inputs": "int",
-    "rendering.EffectRenderer.inputs": "list[%s]" % _FRAME_SOURCE,
-    "rendering.EffectRenderer.colorspace": "str | None",
-    "rendering.EffectRenderer.__init__": {"name": "str | None", "params": "Mapping[str, str | None] | None",
-                                          "inputs": "Iterable[%s]" % _FRAME_SOURCE, "colorspace": "str | None",
-                                          "return": "None"},
-    "rendering.EffectRenderer.render": {"frame": "int", "width": "int", "height": "int", "return": _RGBA},
-    "rendering.EffectRenderer.close": {"return": "None"},
-    "rendering.EffectRenderer.__enter__": {"return": "Self"},
-    "rendering.EffectRenderer.__exit__": {"exc": "object", "return": "None"},
-    # widgets.py: the drawing methods take what the engine passes (GfxInterface).
-    "widgets.SvgDrawing.char_width": "int",
-    "widgets.SvgDrawing.calls": "list[tuple[str, tuple[object, ...]]]",
-    "widgets.SvgDrawing.__init__": {"char_width": "int", "return": "None"},
-    "widgets.SvgDrawing.set_graphics_context": {"context": "_SwigPyObject | _Wrapped | None", "return": "None"},
-    "widgets.SvgDrawing.start_drawing": {"mode": "int", "return": "None"},
-    "widgets.SvgDrawing.end_drawing": {"return": "None"},
-    "widgets.SvgDrawing.begin_line": {"return": "None"},
-    "widgets.SvgDrawing.end_line": {"return": "None"},
-    "widgets.SvgDrawing.line": {"x1": "float", "y1": "float", "x2": "float", "y2": "float", "return": "None"},
-    "widgets.SvgDrawing.lines": {"xs": "float_vector", "ys": "float_vector", "return": "None"},
-    "widgets.SvgDrawing.color_3f": {"red": "float", "green": "float", "blue": "float", "return": "None"},
-    "widgets.SvgDrawing.stipple_on": {"return": "None"},
-    "widgets.SvgDrawing.stipple_off": {"return": "None"},
-    "widgets.SvgDrawing.stipple_pattern": {"pattern": "int", "return": "None"},
-    "widgets.SvgDrawing.line_width": {"width": "float", "return": "None"},
-    "widgets.SvgDrawing.flush": {"return": "None"},
-    "widgets.SvgDrawing.circle": {"x": "float", "y": "float", "r": "float", "return": "None"},
-    "widgets.SvgDrawing.dot": {"x": "float", "y": "float", "size": "float", "return": "None"},
-    "widgets.SvgDrawing.rect_filled": {"x1": "float", "y1": "float", "x2": "float", "y2": "float",
-                                       "return": "None"},
-    "widgets.SvgDrawing.draw_text": {"text": "str | None", "x": "float", "y": "float", "return": "None"},
-    "widgets.SvgDrawing.get_text_length_in_pixels": {"text": "str | None", "return": "int"},
-    "widgets.SvgDrawing.operations": {"return": "list[str]"},
-    "widgets.SvgDrawing.svg": {"width": "float", "height": "float", "backdrop": "str", "return": "str"},
-    "widgets.SvgDrawing.paint": {"image": "Image.Image", "return": "Image.Image"},
-}
-
-UNTYPED = "Incomplete"
-USED = set()
 
 
-class HandwrittenStub:
-    def __init__(self, module, source):
-        self.module = module
-        self.tree = ast.parse(source)
-        self.missing = []
-
-    def type_of(self, key, parameter=None):
-        USED.add("%s.%s" % (self.module, key))
-        entry = HANDWRITTEN.get("%s.%s" % (self.module, key))
-        if parameter is None:
-            if isinstance(entry, str):
-                return entry
-        elif isinstance(entry, dict) and parameter in entry:
-            return entry[parameter]
-        self.missing.append("%s.%s%s has no type" % (self.module, key, "" if parameter is None else " " + parameter))
-        return UNTYPED
-
-    def function(self, node, key, indent, method=False):
-        args = node.args
-        parts = []
-        positional = args.posonlyargs + args.args
-        defaults = [None] * (len(positional) - len(args.defaults)) + list(args.defaults)
-        for n, (arg, default) in enumerate(zip(positional, defaults)):
-            if method and n == 0:
-                parts.append(arg.arg)
-                continue
-            text = "%s: %s" % (arg.arg, self.type_of(key, arg.arg))
-            parts.append(text + (" = ..." if default is not None else ""))
-            if args.posonlyargs and arg is args.posonlyargs[-1]:
-                parts.append("/")
-        if args.vararg:
-            parts.append("*%s: %s" % (args.vararg.arg, self.type_of(key, args.vararg.arg)))
-        elif args.kwonlyargs:
-            parts.append("*")
-        for arg, default in zip(args.kwonlyargs, args.kw_defaults):
-            parts.append("%s: %s%s" % (arg.arg, self.type_of(key, arg.arg), " = ..." if default is not None else ""))
-        if args.kwarg:
-            parts.append("**%s: %s" % (args.kwarg.arg, self.type_of(key, args.kwarg.arg)))
-        decorators = ["%s@%s" % (indent, ast.unparse(d)) for d in node.decorator_list]
-        return decorators + ["%sdef %s(%s) -> %s: ..." % (indent, node.name, ", ".join(parts),
-                                                         self.type_of(key, "return"))]
-
-    def attributes(self, cls):
-        """Attributes a class's methods set on self, in order of appearance."""
-        found = []
-        for node in ast.walk(cls):
-            targets = node.targets if isinstance(node, ast.Assign) else [node.target] if isinstance(
-                node, ast.AnnAssign) else []
-            for target in targets:
-                if isinstance(target, ast.Attribute) and getattr(target.value, "id", None) == "self":
-                    if not target.attr.startswith("_") and target.attr not in found:
-                        found.append(target.attr)
-        return found
-
-    def render(self):
-        lines = ["# Type stubs of renderlib.%s (hand-written module)." % self.module,
-                 "# Generated by %s: the parameters come from the module's source, the" % GENERATED_BY,
-                 "# types from the generator's HANDWRITTEN table; do not edit here."]
-        imports = list(HANDWRITTEN_IMPORTS.get(self.module, []))
-        body = []
-        for node in self.tree.body:
-            if isinstance(node, (ast.Assign, ast.AnnAssign)):
-                targets = node.targets if isinstance(node, ast.Assign) else [node.target]
-                names = [t for target in targets for t in (target.elts if isinstance(target, ast.Tuple) else
-                                                            [target])]
-                for target in names:
-                    if isinstance(target, ast.Name) and not target.id.startswith("_"):
-                        body.append("%s: %s" % (target.id, self.type_of(target.id)))
-            elif isinstance(node, (ast.FunctionDef, ast.AsyncFunctionDef)) and not node.name.startswith("_"):
-                body.append("")
-                body.extend(self.function(node, node.name, ""))
-            elif isinstance(node, ast.ClassDef) and not node.name.startswith("_"):
-                bases = ", ".join(ast.unparse(b) for b in node.bases)
-                body.append("")
-                body.append("class %s%s:" % (node.name, "(%s)" % bases if bases else ""))
-                members = []
-                for attribute in self.attributes(node):
-                    members.append("    %s: %s" % (attribute, self.type_of("%s.%s" % (node.name, attribute))))
-                for item in node.body:
-                    if isinstance(item, (ast.FunctionDef, ast.AsyncFunctionDef)) and (
-                            not item.name.startswith("_") or item.name.startswith("__")):
-                        static = any(getattr(d, "id", None) == "staticmethod" for d in item.decorator_list)
-                        members.extend(self.function(item, "%s.%s" % (node.name, item.name), "    ",
-                                                     method=not static))
-                body.extend(members or ["    ..."])
-        if self.missing:
-            imports = ["from _typeshed import Incomplete"] + ([""] if imports else []) + imports
-        return tidy("\n".join(lines + imports + [""] + body)).rstrip("\n") + "\n"
-
-
-# --------------------------------------------------------------------------
-
-
-def generate(swig, work):
-    wrap_source, companion = run_swig(swig, work / "build")
-    _, documented = run_swig(swig, work / "autodoc", ("-features", "autodoc=0"))
+def generate(swig, includes, work):
+    """{path under the output folder: text}"""
+    wrap_source, companion = run_swig(swig, includes, work / "build")
+    _, documented = run_swig(swig, includes, work / "autodoc", ("-features", "autodoc=0"))
     wrapper = Wrapper(wrap_source)
     names = parameter_names(documented)
     outputs = {}
@@ -1265,19 +1014,7 @@ def generate(swig, work):
     package_stub = companion_stub(wrapper, names, companion)
     outputs[EXTENSION_STUB] = extension_stub(wrapper, names)
     outputs[PACKAGE_STUB] = package_stub
-    outputs[PACKAGE / "py.typed"] = ""
-    warnings = []
-    for source in sorted(PACKAGE.glob("*.py")):
-        module = source.stem
-        if module in PROGRAM_MODULES or module == "__init__":
-            continue
-        stub = HandwrittenStub(module, source.read_text())
-        outputs[source.with_suffix(".pyi")] = stub.render()
-        warnings.extend(stub.missing)
-    for key in HANDWRITTEN:
-        if key not in USED:
-            warnings.append("%s: in HANDWRITTEN but not in the module any more" % key)
-    return outputs, warnings
+    return outputs
 
 
 def default_swig():
@@ -1287,25 +1024,19 @@ def default_swig():
 
 def main(argv=None):
     parser = argparse.ArgumentParser(description=__doc__.split("\n\n")[0])
+    parser.add_argument("--out", required=True, type=Path, help="folder to write the stubs into")
     parser.add_argument("--swig", default=default_swig(), help="SWIG %s executable" % SWIG_VERSION)
+    parser.add_argument("-I", dest="includes", action="append", metavar="DIR",
+                        help="folder of the engine's headers, as the build gives SWIG (engine-api/ if none)")
     parser.add_argument("--work", help="folder for SWIG's output (a temporary one if not given)")
-    parser.add_argument("--check", action="store_true", help="compare with the stubs on disk; write nothing")
     args = parser.parse_args(argv)
     if not args.swig:
         parser.error("no swig found: give --swig")
     with tempfile.TemporaryDirectory() as temporary:
-        outputs, warnings = generate(args.swig, Path(args.work or temporary))
-    for warning in warnings:
-        print("HANDWRITTEN is out of date: %s" % warning, file=sys.stderr)
-    stale = [path for path, text in outputs.items() if not path.exists() or path.read_text() != text]
-    if args.check:
-        for path in stale:
-            print("out of date: %s" % path.relative_to(REPO), file=sys.stderr)
-        return 1 if stale or warnings else 0
-    for path in stale:
-        path.parent.mkdir(parents=True, exist_ok=True)
-        path.write_text(outputs[path])
-        print("wrote %s" % path.relative_to(REPO))
+        outputs = generate(args.swig, args.includes or [str(REPO / "engine-api")], Path(args.work or temporary))
+    for path, text in outputs.items():
+        (args.out / path).parent.mkdir(parents=True, exist_ok=True)
+        (args.out / path).write_text(text)
     return 0
 
 

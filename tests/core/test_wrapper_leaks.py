@@ -21,8 +21,7 @@ from engine_probe import EngineProbe, loaded_library_path
 from process_memory import UNDER_ADDRESS_SANITIZER, resident_kib
 from renderlib import effects, png
 
-REPO = pathlib.Path(__file__).resolve().parents[2]
-STUBS = REPO / "python" / "render-lib" / "_renderlib-stubs" / "__init__.pyi"
+STUBS = pathlib.Path(_renderlib.__file__).parent / "_renderlib-stubs" / "__init__.pyi"  # installed by the build
 
 # valgrind puts its own libraries in front of the interpreter's; it checks
 # memory itself, far more slowly, so a few rounds do there.

@@ -10,10 +10,19 @@ alpha, three RGB, four RGBA. A render into numpy arrays takes three lines::
     glow = _renderlib.init_tarsel_effect("T_Glow", False)
     effects.render(glow, described(out), [described(source)])
 """
+from __future__ import annotations
+
+from typing import TYPE_CHECKING, Any, TypeVar
+
 import numpy
 
 import _renderlib
 import renderlib
+
+if TYPE_CHECKING:
+    from numpy.typing import NDArray
+
+_Array = TypeVar("_Array", bound="NDArray[Any]")
 
 DEFAULT_LAYOUTS = {1: "L", 2: "LA", 3: "RGB", 4: "RGBA"}
 
@@ -37,7 +46,7 @@ PIXEL_TYPES = {
 LAYOUTS = {pixel_type: (layout, numpy.dtype(dtype)) for (layout, dtype), pixel_type in PIXEL_TYPES.items()}
 
 
-def raster_info_for(array, layout=None):
+def raster_info_for(array: NDArray[Any], layout: str | None = None) -> renderlib.T_RasterInfo:
     """A T_RasterInfo describing `array` (see the module's notes); ValueError
     for an array the engine cannot take as it lies in memory."""
     if not isinstance(array, numpy.ndarray):
@@ -63,12 +72,12 @@ def raster_info_for(array, layout=None):
     return info
 
 
-def described(array, layout=None):
+def described(array: _Array, layout: str | None = None) -> tuple[renderlib.T_RasterInfo, _Array]:
     """(T_RasterInfo, array): the pair the render helpers of renderlib.effects take."""
     return raster_info_for(array, layout), array
 
 
-def array_for(info):
+def array_for(info: renderlib.T_RasterInfo) -> NDArray[Any]:
     """A zeroed array laid out as `info` describes: (ds_ysize, ds_xsize,
     channels) of the layout's element type."""
     if info.pixel_type not in LAYOUTS:
@@ -81,6 +90,6 @@ def array_for(info):
     return numpy.zeros((info.ds_ysize, info.ds_xsize, len(layout)), dtype)
 
 
-def layout_of(info):
+def layout_of(info: renderlib.T_RasterInfo) -> str:
     """The channel layout of a descriptor's pixel type, such as "RGBA"."""
     return LAYOUTS[info.pixel_type][0]

@@ -6,15 +6,28 @@ Exit status: 0 done; 1 the engine did not render; 2 a usage error (unknown
 effect, parameter or value, bad option); 3 module and engine were built
 apart; 4 an image file could not be read or written; 5 a monitor device
 failed."""
+from __future__ import annotations
+
 import argparse
 import os
 import pathlib
 import re
 import subprocess
 import sys
+from typing import TYPE_CHECKING, TypeVar, cast
 
 import _renderlib
 from renderlib import effects
+
+if TYPE_CHECKING:
+    from collections.abc import Callable, Iterable, Sequence
+
+    import numpy
+    from numpy.typing import NDArray
+
+    from renderlib.rendering import EffectRenderer
+
+_Item = TypeVar("_Item")
 
 EXIT_RENDER, EXIT_USAGE, EXIT_BUILD, EXIT_FILE, EXIT_MONITOR = 1, 2, 3, 4, 5
 
@@ -22,12 +35,12 @@ EXIT_RENDER, EXIT_USAGE, EXIT_BUILD, EXIT_FILE, EXIT_MONITOR = 1, 2, 3, 4, 5
 class CommandError(Exception):
     """A one-line failure with its exit status."""
 
-    def __init__(self, message, status):
+    def __init__(self, message: str, status: int) -> None:
         super().__init__(message)
         self.status = status
 
 
-def user_identity():
+def user_identity() -> str | None:
     """The identity text that ``check_user`` compares, or None where it cannot
     be found: the effective uid in its POSIX security-identifier form, or the
     Windows account's security identifier."""
@@ -41,7 +54,7 @@ def user_identity():
     return out.strip().split(",")[-1].strip('"') or None
 
 
-def version(_args):
+def version(_args: argparse.Namespace) -> int:
     """Engine version, build identity and user check."""
     identity = user_identity()
     build_match = _renderlib.check_build_id()
@@ -57,26 +70,28 @@ def version(_args):
     return 0 if build_match else EXIT_BUILD
 
 
-def list_effects(_args):
+def list_effects(_args: argparse.Namespace) -> int:
     """Both effect catalogues, with categories."""
     for builder, title in ((False, "Effects"), (True, "Effect builder")):
         entries = effects.catalogue(builder)
         print("%s (%d)" % (title, len(entries)))
-        for entry in entries:
+        for entry in filter(None, entries):
             print("  %-16s %s" % (entry.plugin_name, entry._category))
     return 0
 
 
-def describe(args):
+def describe(args: argparse.Namespace) -> int:
     """An effect's inputs and parameters: type, default, limits, states, group."""
     from renderlib.rendering import effect_instance
     instance = effect_instance(args.effect)
     try:
         genotype = instance.effect_genotype
+        if genotype is None:
+            raise CommandError("%s has no effect descriptor" % args.effect, EXIT_USAGE)
         print("%s  (%s)" % (args.effect, "effect builder" if effects.is_builder_effect(args.effect) else "effect"))
         print("inputs: %s" % (", ".join(genotype._get_input_names()) or "none"))
         print("parameters:")
-        for param in genotype._get_params():
+        for param in filter(None, genotype._get_params()):
             name = param.get_canonical_name()
             if not name:
                 continue
@@ -87,18 +102,18 @@ def describe(args):
             group = genotype.get_param_group_name(param)
             print("  %-18s %-12s default %s%s%s%s" % (
                 name, param.ptype_name(), param.to_string(None) or '""', limits,
-                "  states: %s" % " | ".join(states) if states else "",
+                "  states: %s" % " | ".join(map(str, states)) if states else "",
                 "  group: %s" % group if group else ""))
     finally:
         _renderlib.free_tarsel_effect(instance)
     return 0
 
 
-def _number(value):
+def _number(value: float | None) -> str:
     return "none" if value is None else "%g" % value
 
 
-def frame_range(text):
+def frame_range(text: str) -> range:
     match = re.fullmatch(r"(-?\d+)(?:-(-?\d+))?", text)
     if not match or int(match.group(2) or match.group(1)) < int(match.group(1)):
         raise argparse.ArgumentTypeError("a frame range reads N or FIRST-LAST, such as 0-24")
@@ -106,10 +121,10 @@ def frame_range(text):
     return range(first, int(match.group(2) or first) + 1)
 
 
-def size(text):
-    width, _, height = text.partition("x")
+def size(text: str) -> tuple[int, int]:
+    width_text, _, height_text = text.partition("x")
     try:
-        width, height = int(width), int(height)
+        width, height = int(width_text), int(height_text)
     except ValueError:
         width = height = 0
     if width <= 0 or height <= 0:
@@ -117,14 +132,14 @@ def size(text):
     return width, height
 
 
-def parameter(text):
+def parameter(text: str) -> tuple[str, str]:
     name, equals, value = text.partition("=")
     if not equals or not name:
         raise argparse.ArgumentTypeError("a parameter reads NAME=VALUE, such as radius=12")
     return name, value
 
 
-def frame_path(pattern, frame):
+def frame_path(pattern: str | os.PathLike[str], frame: int) -> str:
     """`pattern` with its run of '#' (or a printf %d field) replaced by the frame."""
     pattern = str(pattern)
     hashes = re.search(r"#+", pattern)
@@ -135,11 +150,11 @@ def frame_path(pattern, frame):
     return pattern
 
 
-def _is_sequence(pattern):
+def _is_sequence(pattern: str | os.PathLike[str]) -> bool:
     return frame_path(pattern, 0) != frame_path(pattern, 1)
 
 
-def _inputs(paths):
+def _inputs(paths: Iterable[str]) -> list[Callable[..., NDArray[numpy.float32]]]:
     """One frame function per input file (a sequence pattern or a still)."""
     from renderlib.images import read_image
     sources = []
@@ -152,7 +167,7 @@ def _inputs(paths):
     return sources
 
 
-def _renderer(args, width, height):
+def _renderer(args: argparse.Namespace, width: int, height: int) -> EffectRenderer:
     from renderlib.rendering import EffectRenderer, card_frame
     sources = _inputs(args.input)
     renderer = EffectRenderer(args.effect, dict(args.param), colorspace=args.colorspace)
@@ -162,13 +177,13 @@ def _renderer(args, width, height):
                            EXIT_USAGE)
     # Inputs not given see the test card, so every effect has something to work on.
     sources += [lambda frame: card_frame(width, height, frame)] * (renderer.n_inputs - len(sources))
-    renderer.inputs = sources
+    renderer.inputs = list(sources)
     return renderer
 
 
-def _frame_size(args):
+def _frame_size(args: argparse.Namespace) -> tuple[int, int]:
     if args.size:
-        return args.size
+        return cast("tuple[int, int]", args.size)
     if args.input:
         from renderlib.images import read_image
         first = read_image(frame_path(args.input[0], args.frames[0]))
@@ -176,12 +191,13 @@ def _frame_size(args):
     return 640, 360
 
 
-def _progress(frames, args, what):
-    from tqdm import tqdm
-    return tqdm(frames, desc=what, unit="frame", disable=True if args.quiet else None, file=sys.stderr)
+def _progress(frames: Iterable[_Item], args: argparse.Namespace, what: str) -> Iterable[_Item]:
+    from tqdm import tqdm  # type: ignore[import-untyped,unused-ignore]
+    return cast("Iterable[_Item]", tqdm(frames, desc=what, unit="frame", disable=True if args.quiet else None,
+                                        file=sys.stderr))
 
 
-def render(args):
+def render(args: argparse.Namespace) -> int:
     """Render frames of an effect to image files."""
     if len(args.frames) > 1 and not _is_sequence(args.output):
         raise CommandError("rendering %d frames needs an output pattern such as out.####.png" % len(args.frames),
@@ -196,7 +212,7 @@ def render(args):
     return 0
 
 
-def monitor(args):
+def monitor(args: argparse.Namespace) -> int:
     """Show frames of an effect on a monitor device."""
     from renderlib.monitor import Monitor, devices
     if args.list or not args.effect:
@@ -216,7 +232,7 @@ def monitor(args):
     return 0
 
 
-def contact_sheet(args):
+def contact_sheet(args: argparse.Namespace) -> int:
     """Render every effect of both catalogues and a contact sheet of them all."""
     from renderlib.contact_sheet import make_contact_sheet
     folder = pathlib.Path(args.output)
@@ -227,7 +243,7 @@ def contact_sheet(args):
     return 0
 
 
-def _add_render_options(command, output_required):
+def _add_render_options(command: argparse.ArgumentParser, output_required: bool) -> None:
     command.add_argument("effect", nargs=None if output_required else "?", help="plug-in name, such as T_Blur")
     command.add_argument("-i", "--input", action="append", default=[], metavar="IMAGE",
                          help="an input image, in input order; a pattern with #### is a sequence "
@@ -240,7 +256,7 @@ def _add_render_options(command, output_required):
     command.add_argument("-q", "--quiet", action="store_true", help="no progress bar or summary")
 
 
-def parser():
+def parser() -> argparse.ArgumentParser:
     parser = argparse.ArgumentParser(prog="renderlib", description=__doc__.split("\n\n")[0],
                                      formatter_class=argparse.RawDescriptionHelpFormatter,
                                      epilog=__doc__.split("\n\n")[1])
@@ -273,13 +289,13 @@ def parser():
     return parser
 
 
-def main(argv=None):
+def main(argv: Sequence[str] | None = None) -> int:
     args = parser().parse_args(argv)
     from renderlib.images import ImageFileError
     from renderlib.monitor import MonitorError
     from renderlib.rendering import EffectError, RenderError
     try:
-        return args.run(args)
+        return cast(int, args.run(args))
     except CommandError as error:
         message, status = str(error), error.status
     except EffectError as error:

@@ -1,7 +1,10 @@
 """Every effect of both catalogues rendered over the test card, one image
 file each, laid out on one contact sheet; and the lens flare's on-screen
 widgets drawn over its render."""
+from __future__ import annotations
+
 import pathlib
+from typing import TYPE_CHECKING, Any
 
 import numpy
 
@@ -11,11 +14,22 @@ from renderlib.images import quantised, write_image
 from renderlib.rendering import EffectRenderer, card_frame
 from renderlib.widgets import SvgDrawing
 
+if TYPE_CHECKING:
+    from collections.abc import Callable, Iterable, Sequence
+
+    from _typeshed import StrPath
+    from numpy.typing import NDArray
+    from PIL import Image
+    from typing_extensions import TypeAlias
+
+    # Shows progress over the plug-in names while passing them on, as tqdm does.
+    _Progress: TypeAlias = "Callable[[list[str]], Iterable[str]]"
+
 COLUMNS = 4
 LABEL_HEIGHT = 22
 
 
-def showcase_params(name, width, height):
+def showcase_params(name: str | None, width: float, height: float) -> dict[str, str]:
     """Values that show what an effect does at this size (positions are in
     frame pixels); the engine's defaults for the rest."""
     centre = "%g %g" % (width / 2, height / 2)
@@ -25,22 +39,24 @@ def showcase_params(name, width, height):
         "T_Dissolve": {"mix": "0.5"},
         "T_Blur": {"radius": "%g" % (height / 40)},
         "T_Glow": {"radius": "%g" % (height / 12)},
-    }.get(name, {})
+    }.get(name or "", {})
 
 
-def second_card(width, height, frame):
+def second_card(width: int, height: int, frame: int) -> NDArray[numpy.float32]:
     """The card a second input sees: the test card mirrored and warmed."""
     card = card_frame(width, height, frame)[:, ::-1].copy()
     card[:, :, 0] = numpy.minimum(1, card[:, :, 0] * 1.6)
     return card
 
 
-def render_every_effect(folder, size, frame, progress=iter):
+def render_every_effect(folder: pathlib.Path, size: tuple[int, int], frame: int,
+                        progress: _Progress = iter) -> list[tuple[str, NDArray[numpy.float32]]]:
     """Renders each effect to <folder>/<plug-in>.png; [(name, rgba)]."""
     width, height = size
     inputs = [lambda f: card_frame(width, height, f), lambda f: second_card(width, height, f)]
     renders = []
-    names = [entry.plugin_name for builder in (False, True) for entry in effects.catalogue(builder)]
+    names = [entry.plugin_name for builder in (False, True) for entry in effects.catalogue(builder)
+             if entry is not None and entry.plugin_name is not None]
     for name in progress(names):
         with EffectRenderer(name, showcase_params(name, width, height), inputs) as renderer:
             rgba = renderer.render(frame, width, height)
@@ -49,7 +65,7 @@ def render_every_effect(folder, size, frame, progress=iter):
     return renders
 
 
-def sheet_image(renders):
+def sheet_image(renders: Sequence[tuple[str, NDArray[Any]]]) -> Image.Image:
     """The renders in a grid, each labelled with its plug-in name."""
     from PIL import Image, ImageDraw
     height, width = renders[0][1].shape[:2]
@@ -64,7 +80,7 @@ def sheet_image(renders):
     return sheet
 
 
-def widget_overlay(size, frame):
+def widget_overlay(size: tuple[int, int], frame: int) -> Image.Image:
     """The lens flare rendered, with its widgets drawn over it (Pillow image)."""
     from PIL import Image
     width, height = size
@@ -81,7 +97,8 @@ def widget_overlay(size, frame):
     return drawing.paint(Image.fromarray(quantised(rgba, "8"), "RGBA").convert("RGB"))
 
 
-def make_contact_sheet(folder, size=(320, 180), frame=12, progress=iter):
+def make_contact_sheet(folder: StrPath, size: tuple[int, int] = (320, 180), frame: int = 12,
+                       progress: _Progress = iter) -> pathlib.Path:
     """Writes every effect's render, contact-sheet.png and widgets.png into
     `folder`; returns the contact sheet's path."""
     folder = pathlib.Path(folder)

@@ -4,9 +4,16 @@ PNG and most other formats go through Pillow (8 bits a channel; 16-bit
 greyscale PNG is read at full depth). TIFF goes through tifffile: read at
 any of 8 bits, 16 bits or 32-bit float a channel, written at the depth asked.
 """
+from __future__ import annotations
+
 import pathlib
+from typing import TYPE_CHECKING, Any
 
 import numpy
+
+if TYPE_CHECKING:
+    from _typeshed import StrPath
+    from numpy.typing import ArrayLike, NDArray
 
 TIFF_SUFFIXES = (".tif", ".tiff")
 DEPTHS = ("8", "16", "float")
@@ -16,7 +23,7 @@ class ImageFileError(OSError):
     """An image file could not be read or written; the message says which and why."""
 
 
-def _as_rgba(array):
+def _as_rgba(array: NDArray[Any]) -> NDArray[numpy.float32]:
     """Any (h, w[, c]) array of 1 to 4 channels as float32 RGBA, 0..1."""
     if array.ndim == 2:
         array = array[:, :, None]
@@ -41,7 +48,7 @@ def _as_rgba(array):
     return rgba
 
 
-def read_image(path):
+def read_image(path: StrPath) -> NDArray[numpy.float32]:
     """The image file at `path` as float32 RGBA."""
     path = pathlib.Path(path)
     try:
@@ -60,16 +67,17 @@ def read_image(path):
         raise ImageFileError("cannot read %s: %s" % (path, error)) from error
 
 
-def quantised(rgba, depth):
+def quantised(rgba: ArrayLike, depth: str
+              ) -> NDArray[numpy.uint8] | NDArray[numpy.uint16] | NDArray[numpy.float32]:
     """float RGBA as the array a file of `depth` ("8", "16", "float") stores."""
     if depth == "float":
         return numpy.ascontiguousarray(rgba, numpy.float32)
     top = 255 if depth == "8" else 65535
-    scaled = numpy.rint(numpy.clip(rgba, 0, 1) * top)
-    return scaled.astype(numpy.uint8 if depth == "8" else numpy.uint16)
+    scaled: NDArray[numpy.floating[Any]] = numpy.rint(numpy.clip(rgba, 0, 1) * top)
+    return scaled.astype(numpy.uint8) if depth == "8" else scaled.astype(numpy.uint16)
 
 
-def write_image(path, rgba, depth="8"):
+def write_image(path: StrPath, rgba: ArrayLike, depth: str = "8") -> None:
     """Writes float RGBA to `path`: TIFF at `depth`, anything else at 8 bits."""
     path = pathlib.Path(path)
     if depth not in DEPTHS:

@@ -7,7 +7,14 @@ of that mode's size, with failures raised instead of returned.
 
 The flat functions (``EM_Display_connect`` and the rest) stay available for
 anything else; they return the library's status and check no sizes."""
+from __future__ import annotations
+
+from typing import TYPE_CHECKING
+
 import _renderlib
+
+if TYPE_CHECKING:
+    from typing_extensions import Buffer, Self
 
 STATUS_NAMES = {getattr(_renderlib, name): name for name in (
     "EM_errorNone", "EM_errorParam", "EM_errorNotFound", "EM_errorAllocate", "EM_errorLast", "EM_errorDevice")}
@@ -17,13 +24,13 @@ class MonitorError(RuntimeError):
     """A monitor operation failed; `status` is the library's status, or None
     when the library made no object."""
 
-    def __init__(self, operation, status=None):
+    def __init__(self, operation: str, status: int | None = None) -> None:
         self.status = status
         reason = "no object made" if status is None else STATUS_NAMES.get(status, "status %d" % status)
         super().__init__("%s failed: %s" % (operation, reason))
 
 
-def devices():
+def devices() -> dict[str, list[str]]:
     """{device name: [mode names]} of the monitor library."""
     display = _renderlib.EM_DisplayInit()
     if display is None:
@@ -39,7 +46,7 @@ class Monitor:
     """A device connected in a mode, on a display of its own. Close it (or
     leave the ``with`` block) to disconnect and release the display."""
 
-    def __init__(self, device, mode):
+    def __init__(self, device: str, mode: str) -> None:
         self.device = device
         self._display = _renderlib.EM_DisplayInit()
         if self._display is None:
@@ -52,8 +59,9 @@ class Monitor:
         self.width = _renderlib.EM_Display_get_width(self._display, device)
         self.height = _renderlib.EM_Display_get_height(self._display, device)
 
-    def show(self, pixels, format=_renderlib.EM_ImageFormat_32BitIntBGRA, name=None, bottom_up=False,
-             pixel_aspect=1.0, gamma=0.0, premultiplied=False, full_range=True):
+    def show(self, pixels: Buffer, format: int = _renderlib.EM_ImageFormat_32BitIntBGRA, name: str | None = None,
+             bottom_up: bool = False, pixel_aspect: float = 1.0, gamma: float = 0.0, premultiplied: bool = False,
+             full_range: bool = True) -> None:
         """Shows one frame: `pixels` is any C-contiguous buffer of width x
         height 32-bit pixels in `format`, top row first unless `bottom_up`."""
         if self._display is None:
@@ -74,14 +82,14 @@ class Monitor:
         if status != _renderlib.EM_errorNone:
             raise MonitorError("showing a frame on %s" % self.device, status)
 
-    def close(self):
+    def close(self) -> None:
         if self._display is not None:
             _renderlib.EM_Display_disconnect(self._display, self.device)
             _renderlib.release_external_monitor(self._display)
             self._display = None
 
-    def __enter__(self):
+    def __enter__(self) -> Self:
         return self
 
-    def __exit__(self, *exc):
+    def __exit__(self, *exc: object) -> None:
         self.close()

@@ -1,13 +1,19 @@
 """A minimal PNG writer for 8-bit RGBA frames (the standard library's zlib)."""
+from __future__ import annotations
+
 import struct
 import zlib
+from typing import TYPE_CHECKING
+
+if TYPE_CHECKING:
+    from _typeshed import FileDescriptorOrPath
 
 
-def _chunk(kind, data):
+def _chunk(kind: bytes, data: bytes) -> bytes:
     return struct.pack(">I", len(data)) + kind + data + struct.pack(">I", zlib.crc32(kind + data) & 0xFFFFFFFF)
 
 
-def encode_rgba8(pixels, width, height):
+def encode_rgba8(pixels: bytes | bytearray | memoryview, width: int, height: int) -> bytes:
     """PNG bytes of `height` rows of `width` RGBA pixels, 8 bits per channel,
     first row at the top."""
     row = width * 4
@@ -18,6 +24,7 @@ def encode_rgba8(pixels, width, height):
     return b"\x89PNG\r\n\x1a\n" + _chunk(b"IHDR", header) + _chunk(b"IDAT", zlib.compress(raw, 6)) + _chunk(b"IEND", b"")
 
 
-def write_rgba8(path, pixels, width, height):
+def write_rgba8(path: FileDescriptorOrPath, pixels: bytes | bytearray | memoryview, width: int,
+                height: int) -> None:
     with open(path, "wb") as out:
         out.write(encode_rgba8(pixels, width, height))

@@ -6,11 +6,25 @@ other frames served to the engine when an effect asks for them.
 
 An input is a function of the frame number giving a float32 RGBA array
 (height, width, 4), or None for an unconnected input."""
+from __future__ import annotations
+
+from typing import TYPE_CHECKING
+
 import numpy
 
 import _renderlib
 import renderlib
 from renderlib import arrays, effects
+
+if TYPE_CHECKING:
+    from collections.abc import Callable, Iterable, Mapping, Sequence
+
+    from numpy.typing import ArrayLike, NDArray
+    from typing_extensions import Self, TypeAlias
+
+    # An input: a frame number's picture, as anything numpy turns into an
+    # RGBA array; None for an unconnected input.
+    _FrameSource: TypeAlias = "Callable[[int], ArrayLike] | None"
 
 
 class EffectError(ValueError):
@@ -21,7 +35,7 @@ class RenderError(RuntimeError):
     """The engine did not render a frame; the message carries its messages."""
 
 
-def card_frame(width, height, frame=0):
+def card_frame(width: int, height: int, frame: int = 0) -> NDArray[numpy.float32]:
     """A test picture: a dusky gradient, colour bars along the bottom, and a
     white square that crosses the frame as `frame` goes from 0 to 24."""
     ys = numpy.linspace(0, 1, height, dtype=numpy.float32)[:, None]
@@ -41,7 +55,7 @@ def card_frame(width, height, frame=0):
     return card
 
 
-def effect_instance(name, params=None):
+def effect_instance(name: str | None, params: Mapping[str, str | None] | None = None) -> renderlib.EffectGlobals_t:
     """A new instance of `name` (either catalogue) with `params` ({canonical
     name: text in the engine's text form}) applied. A value the engine cannot
     read raises EffectError with the engine's own message."""
@@ -72,12 +86,12 @@ class _InputFrames(renderlib.LoadFrameInterface):
     """Serves frame f of input i as the engine asks, keeping each answer
     until the render returns."""
 
-    def __init__(self, inputs, width, height):
+    def __init__(self, inputs: Sequence[_FrameSource], width: int, height: int) -> None:
         super().__init__()
         self.inputs, self.width, self.height = inputs, width, height
-        self.kept = {}
+        self.kept: dict[int, tuple[renderlib.T_RasterInfo, bytearray]] = {}
 
-    def load_frame(self, input, frame, width, height):
+    def load_frame(self, input: int, frame: int, width: int, height: int) -> bytearray:
         source = self.inputs[input] if input < len(self.inputs) else None
         if source is None:  # unconnected: a transparent frame
             rgba = numpy.zeros((self.height, self.width, 4), numpy.float32)
@@ -86,7 +100,7 @@ class _InputFrames(renderlib.LoadFrameInterface):
         self.kept[input] = (arrays.raster_info_for(rgba), bytearray(rgba.tobytes()))
         return self.kept[input][1]
 
-    def current_raster_info(self, input):
+    def current_raster_info(self, input: int) -> renderlib.T_RasterInfo:
         return self.kept[input][0]
 
 
@@ -94,8 +108,9 @@ class EffectRenderer:
     """An effect instance with its inputs, rendering whole frames. Use it as
     a context manager (or call close) to free the instance."""
 
-    def __init__(self, name, params=None, inputs=(), colorspace="srgb"):
-        self.instance = effect_instance(name, params)
+    def __init__(self, name: str | None, params: Mapping[str, str | None] | None = None,
+                 inputs: Iterable[_FrameSource] = (), colorspace: str | None = "srgb") -> None:
+        self.instance: renderlib.EffectGlobals_t | None = effect_instance(name, params)
         self.name = name
         genotype = self.instance.effect_genotype
         if genotype is None:
@@ -105,7 +120,7 @@ class EffectRenderer:
         self.inputs = list(inputs)[:self.n_inputs]
         self.colorspace = colorspace
 
-    def render(self, frame, width, height):
+    def render(self, frame: int, width: int, height: int) -> NDArray[numpy.float32]:
         """Frame `frame` as float32 RGBA (height, width, 4)."""
         out = numpy.zeros((height, width, 4), numpy.float32)
         pairs = []
@@ -126,13 +141,13 @@ class EffectRenderer:
                                                                   "no message"))
         return out
 
-    def close(self):
+    def close(self) -> None:
         if self.instance is not None:
             _renderlib.free_tarsel_effect(self.instance)
             self.instance = None
 
-    def __enter__(self):
+    def __enter__(self) -> Self:
         return self
 
-    def __exit__(self, *exc):
+    def __exit__(self, *exc: object) -> None:
         self.close()

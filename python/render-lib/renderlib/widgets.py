@@ -9,9 +9,19 @@ drawing call the engine made (``calls``) and can give them as SVG text::
     _renderlib.tarsel_widget_draw(instance, "", 960, 540, 0, 0, 0.5, 0.5, [1920, 1080])
     pathlib.Path("widgets.svg").write_text(drawing.svg(960, 540))
 """
+from __future__ import annotations
+
+from typing import TYPE_CHECKING, Any
 from xml.sax.saxutils import escape
 
 import renderlib
+
+if TYPE_CHECKING:
+    from collections.abc import Iterable
+
+    from PIL import Image
+
+    from _renderlib import _SwigPyObject, _Wrapped
 
 
 class SvgDrawing(renderlib.GfxInterface):
@@ -19,46 +29,49 @@ class SvgDrawing(renderlib.GfxInterface):
     them into SVG. Text is measured as a monospaced face `char_width` pixels
     wide."""
 
-    def __init__(self, char_width=6):
+    def __init__(self, char_width: int = 6) -> None:
         super().__init__()
         self.char_width = char_width
-        self.calls = []
+        self.calls: list[tuple[str, tuple[Any, ...]]] = []
 
-    def _record(self, name, *args):
+    def _record(self, name: str, *args: object) -> None:
         self.calls.append((name, args))
 
-    def set_graphics_context(self, context): self._record("set_graphics_context", context)
-    def start_drawing(self, mode): self._record("start_drawing", mode)
-    def end_drawing(self): self._record("end_drawing")
-    def begin_line(self): self._record("begin_line")
-    def end_line(self): self._record("end_line")
-    def line(self, x1, y1, x2, y2): self._record("line", x1, y1, x2, y2)
+    def set_graphics_context(self, context: _SwigPyObject | _Wrapped | None) -> None:
+        self._record("set_graphics_context", context)
+    def start_drawing(self, mode: int) -> None: self._record("start_drawing", mode)
+    def end_drawing(self) -> None: self._record("end_drawing")
+    def begin_line(self) -> None: self._record("begin_line")
+    def end_line(self) -> None: self._record("end_line")
+    def line(self, x1: float, y1: float, x2: float, y2: float) -> None: self._record("line", x1, y1, x2, y2)
     # The vectors are the engine's own, valid during the call only: copied.
-    def lines(self, xs, ys): self._record("lines", tuple(xs), tuple(ys))
-    def color_3f(self, red, green, blue): self._record("color_3f", red, green, blue)
-    def stipple_on(self): self._record("stipple_on")
-    def stipple_off(self): self._record("stipple_off")
-    def stipple_pattern(self, pattern): self._record("stipple_pattern", pattern)
-    def line_width(self, width): self._record("line_width", width)
-    def flush(self): self._record("flush")
-    def circle(self, x, y, r): self._record("circle", x, y, r)
-    def dot(self, x, y, size): self._record("dot", x, y, size)
-    def rect_filled(self, x1, y1, x2, y2): self._record("rect_filled", x1, y1, x2, y2)
-    def draw_text(self, text, x, y): self._record("draw_text", text, x, y)
+    def lines(self, xs: renderlib.float_vector, ys: renderlib.float_vector) -> None:
+        self._record("lines", tuple(xs), tuple(ys))
+    def color_3f(self, red: float, green: float, blue: float) -> None: self._record("color_3f", red, green, blue)
+    def stipple_on(self) -> None: self._record("stipple_on")
+    def stipple_off(self) -> None: self._record("stipple_off")
+    def stipple_pattern(self, pattern: int) -> None: self._record("stipple_pattern", pattern)
+    def line_width(self, width: float) -> None: self._record("line_width", width)
+    def flush(self) -> None: self._record("flush")
+    def circle(self, x: float, y: float, r: float) -> None: self._record("circle", x, y, r)
+    def dot(self, x: float, y: float, size: float) -> None: self._record("dot", x, y, size)
+    def rect_filled(self, x1: float, y1: float, x2: float, y2: float) -> None:
+        self._record("rect_filled", x1, y1, x2, y2)
+    def draw_text(self, text: str | None, x: float, y: float) -> None: self._record("draw_text", text, x, y)
 
-    def get_text_length_in_pixels(self, text):
+    def get_text_length_in_pixels(self, text: str | None) -> int:
         self._record("get_text_length_in_pixels", text)
         return self.char_width * len(text or "")
 
-    def operations(self):
+    def operations(self) -> list[str]:
         """The names of the recorded calls, in order."""
         return [name for name, _ in self.calls]
 
-    def svg(self, width, height, backdrop="#404040"):
+    def svg(self, width: float, height: float, backdrop: str = "#404040") -> str:
         """The recorded drawing as an SVG document of width x height pixels."""
         return _Svg(self.char_width).document(self.calls, width, height, backdrop)
 
-    def paint(self, image):
+    def paint(self, image: Image.Image) -> Image.Image:
         """Draws the recorded calls over a Pillow image (RGB or RGBA), in place."""
         from PIL import ImageDraw
         draw = ImageDraw.Draw(image)
@@ -88,27 +101,28 @@ class SvgDrawing(renderlib.GfxInterface):
 class _Svg:
     """Replays drawing calls with the state they set (colour, width, stipple)."""
 
-    def __init__(self, char_width):
+    def __init__(self, char_width: int) -> None:
         self.char_width = char_width
         self.colour = "#ffffff"
         self.width = 1.0
         self.pattern = 0xFFFF
         self.dashed = False
 
-    def stroke(self):
+    def stroke(self) -> str:
         dash = ""
         if self.dashed:
             on = max(bin(self.pattern).count("1"), 1)
             dash = ' stroke-dasharray="%d %d"' % (on, max(16 - on, 1))
         return 'fill="none" stroke="%s" stroke-width="%g"%s' % (self.colour, self.width, dash)
 
-    def document(self, calls, width, height, backdrop):
+    def document(self, calls: Iterable[tuple[str, tuple[Any, ...]]], width: float, height: float,
+                 backdrop: str) -> str:
         shapes = [shape for name, args in calls for shape in [self.replay(name, args)] if shape]
         return ('<svg xmlns="http://www.w3.org/2000/svg" width="%d" height="%d">\n'
                 '<rect width="100%%" height="100%%" fill="%s"/>\n%s\n</svg>\n'
                 % (width, height, backdrop, "\n".join(shapes)))
 
-    def replay(self, name, args):
+    def replay(self, name: str, args: tuple[Any, ...]) -> str | None:
         if name == "color_3f":
             self.colour = "#%02x%02x%02x" % tuple(max(0, min(255, round(c * 255))) for c in args)
         elif name == "line_width":

@@ -2,18 +2,28 @@
 engine, while the engine is still using it; callback classes a host writes
 as null objects; engine vectors a drawing method keeps. Each runs in a
 process of its own: the faults these guard against crash the interpreter."""
+import textwrap
+
 import pytest
 
 from isolated import run_cleanly
 
-DRAW = 'draw = lambda effect: _renderlib.tarsel_widget_draw(effect, "", 960, 540, 0.0, 0.0, 0.5, 0.5, [1920, 1080, 0])'
+PROLOGUE = """
+import gc, threading, time, weakref
+import numpy, _renderlib, renderlib
+from renderlib import effects
+from renderlib.widgets import SvgDrawing
+draw = lambda effect: _renderlib.tarsel_widget_draw(effect, "", 960, 540, 0.0, 0.0, 0.5, 0.5, [1920, 1080, 0])
+"""
+
+
+def run(script, timeout=30):
+    """The words `script` printed, run after PROLOGUE in a process of its own."""
+    return run_cleanly(PROLOGUE + textwrap.dedent(script), timeout).split()
 
 
 def test_a_drawing_object_that_uninstalls_and_drops_itself_mid_draw_lives_to_the_end_of_the_call():
-    out = run_cleanly("""
-        import gc, weakref, _renderlib
-        from renderlib.widgets import SvgDrawing
-        %s
+    out = run("""
         class Quitter(SvgDrawing):
             def start_drawing(self, mode):
                 global drawing
@@ -28,16 +38,13 @@ def test_a_drawing_object_that_uninstalls_and_drops_itself_mid_draw_lives_to_the
         _renderlib.tarsel_set_gfx_impl(drawing)
         draw(_renderlib.init_tarsel_effect("T_LensFlare", False))
         print(calls[-1][0], gone() is None)
-    """ % DRAW)
+    """)
     # The engine drew the whole pass through the object it started with.
-    assert out.split() == ["end_drawing", "True"]
+    assert out == ["end_drawing", "True"]
 
 
 def test_replacing_the_drawing_object_from_another_thread_during_draws():
-    out = run_cleanly("""
-        import threading, time, _renderlib
-        from renderlib.widgets import SvgDrawing
-        %s
+    out = run("""
         passes = []  # (start or end, drawing object): each pass ends on the object it began with
 
         class Slow(SvgDrawing):
@@ -70,15 +77,12 @@ def test_replacing_the_drawing_object_from_another_thread_during_draws():
         _renderlib.tarsel_set_gfx_impl(None)
         whole = all(a == ("start", b[1]) and b[0] == "end" for a, b in zip(passes[::2], passes[1::2]))
         print(len(passes), whole)
-    """ % DRAW, timeout=60)
-    assert out.split() == ["400", "True"]
+    """, timeout=60)
+    assert out == ["400", "True"]
 
 
 def test_a_frame_source_that_lets_go_of_itself_in_load_frame_keeps_its_frame_for_the_render():
-    out = run_cleanly("""
-        import gc, weakref, numpy, _renderlib, renderlib
-        from renderlib import effects
-
+    out = run("""
         class Leaving(renderlib.LoadFrameInterface):
             def load_frame(self, input, frame, width, height):
                 global source
@@ -103,28 +107,26 @@ def test_a_frame_source_that_lets_go_of_itself_in_load_frame_keeps_its_frame_for
         assert effects.render(echo, dest, [current], frame=10)
         print(sorted(set(numpy.frombuffer(dest[1], numpy.float32).tolist())), gone() is None)
     """)
-    assert out.split() == ["[0.25]", "True"]
+    assert out == ["[0.25]", "True"]
 
 
-@pytest.mark.parametrize("interface", ["GfxInterface", "LoadFrameInterface"])
-def test_a_callback_class_with_a_catch_all_getattr_is_made_and_installed(interface):
-    out = run_cleanly("""
-        import _renderlib, renderlib
+@pytest.mark.parametrize("interface, install", [("GfxInterface", "tarsel_set_gfx_impl"),
+                                                ("LoadFrameInterface", "set_load_frame_impl")])
+def test_a_callback_class_with_a_catch_all_getattr_is_made_and_installed(interface, install):
+    out = run("""
         class Null(renderlib.%s):
             def __getattr__(self, name):
                 return lambda *args: 0
         null = Null()
-        installed = {"GfxInterface": _renderlib.tarsel_set_gfx_impl, "LoadFrameInterface": _renderlib.set_load_frame_impl}
-        installed["%s"](null)
-        installed["%s"](None)
+        _renderlib.%s(null)
+        _renderlib.%s(None)
         print(type(null.this).__name__, repr(null).startswith("<__main__.Null; proxy of <Swig Object"))
-    """ % ((interface,) * 3))
-    assert out.split() == ["SwigPyObject", "True"]
+    """ % (interface, install, install))
+    assert out == ["SwigPyObject", "True"]
 
 
-def test_objects_whose_this_is_made_on_the_spot_or_is_themselves_are_refused():
-    out = run_cleanly("""
-        import _renderlib
+def test_objects_whose_this_is_made_on_the_spot_or_is_themselves_or_missing_are_refused():
+    out = run_cleanly(PROLOGUE + textwrap.dedent("""
         class Anything:
             def __getattr__(self, name):
                 return lambda *args: 0
@@ -132,20 +134,20 @@ def test_objects_whose_this_is_made_on_the_spot_or_is_themselves_are_refused():
             @property
             def this(self):
                 return self
-        for thing in (Anything(), Itself()):
+        class Forgetful(renderlib.GfxInterface):
+            def __init__(self):
+                pass  # not the base's
+        for thing in (Anything(), Itself(), Forgetful(), object()):
             try:
                 _renderlib.tarsel_set_gfx_impl(thing)
             except TypeError as error:
                 print(error)
-    """)
-    assert out.splitlines() == ["in method 'tarsel_set_gfx_impl', argument 1 of type 'GfxInterface *'"] * 2
+    """))
+    assert out.splitlines() == ["in method 'tarsel_set_gfx_impl', argument 1 of type 'GfxInterface *'"] * 4
 
 
 def test_engine_vectors_kept_past_the_drawing_call_refuse_use():
-    out = run_cleanly("""
-        import _renderlib
-        from renderlib.widgets import SvgDrawing
-        %s
+    out = run("""
         class Keeping(SvgDrawing):
             def lines(self, xs, ys):
                 self.kept.append((xs, ys, list(xs), iter(xs)))
@@ -166,5 +168,5 @@ def test_engine_vectors_kept_past_the_drawing_call_refuse_use():
             next(walk)
         except ValueError as error:
             print(str(error) == "the iterator's float_vector no longer exists")
-    """ % DRAW)
-    assert out.split() == ["True"] * 7
+    """)
+    assert out == ["True"] * 7

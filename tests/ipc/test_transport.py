@@ -1,8 +1,11 @@
-"""A served segment and a client of it in one process: views over the
-segment, the write functions' conversions, the error codes and the
-size and queue limits."""
+"""Named segments served and connected in one process: refusals and resets,
+the message header at its wire layout, views over the segment, the write
+functions' conversions, the error codes and the size and queue limits.
+(Every wrapper's argument errors and memory: tests/core.)"""
+import ctypes
 import os
 import stat
+import struct
 import time
 
 import numpy
@@ -28,11 +31,49 @@ def pair(name):
         transport.remove()
 
 
-def test_the_segment_is_private_to_its_user(pair, name):
+def test_serve_and_connect_refusals_and_a_private_segment(name):
+    for bad in ("", "a/b", "x" * 201, name + "/"):
+        assert E.ShmemManager_serve(bad, QUEUE, QUEUE) is None
+    assert E.ShmemManager_serve(name, 16, 16) is None  # queues too small
+    assert E.ShmemManager_connect(name) is None  # nobody serves it
+    server = serve(name)
+    assert E.ShmemManager_serve(name, QUEUE, QUEUE) is None  # served already, by a live process
+    client = connect(name)
     assert stat.S_IMODE(os.stat(segment_file(name)).st_mode) == 0o600
-    server, client = pair
-    assert server.is_segment_valid() and client.is_segment_valid()
-    assert client.client_pid_exists()
+    assert server.is_segment_valid() and client.is_segment_valid() and client.client_pid_exists()
+    E.ShmemManager_reset(name)  # its server lives: nothing happens
+    assert segment_file(name).exists() and client.is_segment_valid()
+    server.remove()
+
+
+def test_a_corrupt_segment_is_refused(name):
+    server = serve(name)
+    with open(segment_file(name), "r+b") as segment:
+        segment.write(b"not a segment header")
+    assert E.ShmemManager_connect(name) is None
+    assert not server.is_segment_valid()
+    assert not server.try_write_pybuf(b"x")
+    assert server.get_last_error() == E.ShmemError_INVALID_SEGMENT
+    # The name fixture's forced reset then takes the segment away.
+
+
+def test_the_message_header_is_read_in_place_at_its_wire_layout():
+    header = renderlib.MessageHeader_t()
+    assert header.this.own() and ctypes.string_at(int(header.this), 64) == bytes(64)
+    assert (header.id, header.size, header.desc, header.reserved) == (0, 0, "", "")
+    image = struct.pack("<II Q 24s 24s", 0xFFFFFFFF, 0xDEAD, 2 ** 64 - 1, b"d" * 24, b"\xe9t\xe9\0tail")
+    ctypes.memmove(int(header.this), image, 64)
+    assert header.id == 2 ** 32 - 1  # unsigned, positive
+    assert header.size == 2 ** 64 - 1
+    assert header.desc == "d" * 24  # a full field has no terminator
+    # Up to the first NUL; bytes that are not UTF-8 come back as surrogate escapes.
+    assert header.reserved == "\udce9t\udce9"
+    ctypes.memmove(int(header.this) + 16, b"\0after", 6)
+    assert header.desc == ""
+    for field in ("id", "size", "desc", "reserved"):  # read only
+        with pytest.raises(AttributeError):
+            setattr(header, field, 1)
+        assert not hasattr(_renderlib, "MessageHeader_t_%s_set" % field)
 
 
 def test_nothing_to_read_is_none_without_an_error(pair):
@@ -44,6 +85,9 @@ def test_nothing_to_read_is_none_without_an_error(pair):
     assert client.timed_read_pybuf(0.05) is None
     assert client.get_last_error() == E.ShmemError_TIMEOUT
     assert 0.05 <= time.perf_counter() - start < 0.05 + 0.02
+    texts = [_renderlib.shmem_error_to_string(code) for code in range(6)]
+    assert all(isinstance(text, str) and text for text in texts) and len(set(texts)) == 6
+    assert _renderlib.shmem_error_to_string(99) is None
 
 
 def test_written_messages_are_read_in_place(pair):
@@ -54,6 +98,8 @@ def test_written_messages_are_read_in_place(pair):
     header = client.get_msg_header()
     assert not header.this.own()
     assert (header.id, header.size, header.desc) == (1, 13, "greeting")
+    raw = ctypes.string_at(int(header.this), 64)  # the wire layout, as the engine wrote it
+    assert struct.unpack_from("<I4xQ24s", raw) == (1, 13, b"greeting".ljust(24, b"\0"))
     # A header query only looks: the read takes that same message.
     view = client.read_pybuf()
     assert view.readonly and bytes(view) == b"first message"
@@ -95,6 +141,8 @@ def test_empty_and_text_messages(pair):
     assert server.write_string("y", full)
     client.read_pybuf()
     assert client.get_msg_header().desc == full[:24]
+    with pytest.raises(TypeError, match="overloaded function 'ShmemTransport_write_string'"):
+        server.write_string(b"bytes")  # text is str only
 
 
 @pytest.mark.parametrize("function, operation", [
@@ -113,35 +161,6 @@ def test_a_message_without_a_buffer(pair, function, operation):
         function(server, strided)
     assert str(raised.value.__cause__) == ("in ShmemTransport::%s, unable to get Py_buffer view; maybe has no size?"
                                            % operation)
-
-
-def test_argument_errors(pair):
-    server, _ = pair
-    with pytest.raises(TypeError, match=r"^in method 'ShmemTransport_read_pybuf', argument 1 of type "
-                                        r"'Tarsel::IPC::ShmemTransport \*'$"):
-        _renderlib.ShmemTransport_read_pybuf(renderlib.MessageHeader_t())
-    with pytest.raises(TypeError, match="^in method 'ShmemTransport_timed_read_pybuf', argument 2 of type 'float'$"):
-        server.timed_read_pybuf("soon")
-    with pytest.raises(TypeError, match="Wrong number or type of arguments for overloaded function "
-                                        "'ShmemTransport_reserve_pybuf'") as raised:
-        server.reserve_pybuf(-1)
-    assert ("Tarsel::IPC::ShmemTransport::reserve_pybuf(size_t,char const *const)\n"
-            "    Tarsel::IPC::ShmemTransport::reserve_pybuf(size_t)") in str(raised.value)
-    with pytest.raises(TypeError, match="overloaded function 'ShmemTransport_write_string'"):
-        _renderlib.ShmemTransport_write_string(server)
-    with pytest.raises(TypeError, match="overloaded function 'ShmemTransport_write_string'"):
-        server.write_string(b"bytes")
-
-
-def test_identity_queries(pair):
-    server, client = pair
-    pid = server.get_server_pid()
-    assert not isinstance(pid, int) and "pid_t *" in repr(pid)
-    assert pid.own() is True and pid != server.get_server_pid()  # a new copy each time, freed by its handle
-    texts = [_renderlib.shmem_error_to_string(code) for code in range(6)]
-    assert all(isinstance(text, str) and text for text in texts) and len(set(texts)) == 6
-    assert _renderlib.shmem_error_to_string(99) is None
-    server.print_stats()
 
 
 def test_size_boundaries(pair):
@@ -186,12 +205,15 @@ def test_a_removed_segment_is_invalid_for_both_ends(pair, name):
         assert transport.get_last_error() == E.ShmemError_INVALID_SEGMENT
 
 
-def test_a_million_server_pid_handles_leak_nothing_and_print_nothing(name):
+def test_server_pid_handles_are_copies_freed_silently(name):
     calls = 1000 if "vgpreload" in os.environ.get("LD_PRELOAD", "") else 1000000
     done = run_python("""
         import sys, _renderlib, renderlib
         from process_memory import resident_kib
         server = _renderlib.ShmemManager_serve(sys.argv[1], 1 << 12, 1 << 12)
+        pid = server.get_server_pid()  # a new handle each time, owning its copy
+        sys.stderr.write("%s %s %s " % (type(pid).__name__ == "SwigPyObject" and "pid_t *" in repr(pid),
+                                        pid.own() is True, pid != server.get_server_pid()))
         calls = int(sys.argv[2])
         for _ in range(calls // 10):
             server.get_server_pid()
@@ -202,5 +224,6 @@ def test_a_million_server_pid_handles_leak_nothing_and_print_nothing(name):
         server.remove()
     """, timeout=120, args=[name, calls])
     assert done.returncode == 0 and done.stdout == "", (done.stdout[:300], done.stderr[-2000:])
+    assert done.stderr.split()[:3] == ["True"] * 3, done.stderr[-2000:]
     if not UNDER_ADDRESS_SANITIZER:  # a pid_t kept per call would be some 32 MB
         assert int(done.stderr.split()[-2]) < 1024, done.stderr

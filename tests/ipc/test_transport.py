@@ -11,13 +11,12 @@ import time
 import numpy
 import pytest
 
-import _renderlib
+import _renderlib as E
 import renderlib
-from isolated import run_python
+from isolated import run_cleanly
 from process_memory import UNDER_ADDRESS_SANITIZER
 from segments import connect, segment_file, serve
 
-E = _renderlib
 QUEUE = 1 << 16
 LARGEST = QUEUE - 64  # a message's header is 64 bytes; an empty queue takes one this big
 
@@ -29,6 +28,11 @@ def pair(name):
     yield server, client
     for transport in (client, server):
         transport.remove()
+
+
+def refused(result, transport, error):
+    """Whether a call answered None or False with that error code."""
+    return (result is None or result is False) and transport.get_last_error() == error
 
 
 def test_serve_and_connect_refusals_and_a_private_segment(name):
@@ -52,8 +56,7 @@ def test_a_corrupt_segment_is_refused(name):
         segment.write(b"not a segment header")
     assert E.ShmemManager_connect(name) is None
     assert not server.is_segment_valid()
-    assert not server.try_write_pybuf(b"x")
-    assert server.get_last_error() == E.ShmemError_INVALID_SEGMENT
+    assert refused(server.try_write_pybuf(b"x"), server, E.ShmemError_INVALID_SEGMENT)
     # The name fixture's forced reset then takes the segment away.
 
 
@@ -63,31 +66,28 @@ def test_the_message_header_is_read_in_place_at_its_wire_layout():
     assert (header.id, header.size, header.desc, header.reserved) == (0, 0, "", "")
     image = struct.pack("<II Q 24s 24s", 0xFFFFFFFF, 0xDEAD, 2 ** 64 - 1, b"d" * 24, b"\xe9t\xe9\0tail")
     ctypes.memmove(int(header.this), image, 64)
-    assert header.id == 2 ** 32 - 1  # unsigned, positive
-    assert header.size == 2 ** 64 - 1
-    assert header.desc == "d" * 24  # a full field has no terminator
-    # Up to the first NUL; bytes that are not UTF-8 come back as surrogate escapes.
-    assert header.reserved == "\udce9t\udce9"
+    # Unsigned; a full text field has no terminator; up to the first NUL, with
+    # bytes that are not UTF-8 as surrogate escapes.
+    assert (header.id, header.size, header.desc, header.reserved) == (2 ** 32 - 1, 2 ** 64 - 1, "d" * 24,
+                                                                       "\udce9t\udce9")
     ctypes.memmove(int(header.this) + 16, b"\0after", 6)
     assert header.desc == ""
     for field in ("id", "size", "desc", "reserved"):  # read only
         with pytest.raises(AttributeError):
             setattr(header, field, 1)
-        assert not hasattr(_renderlib, "MessageHeader_t_%s_set" % field)
+        assert not hasattr(E, "MessageHeader_t_%s_set" % field)
 
 
 def test_nothing_to_read_is_none_without_an_error(pair):
     server, client = pair
-    assert client.try_read_pybuf() is None
-    assert client.get_last_error() == E.ShmemError_RETRY
+    assert refused(client.try_read_pybuf(), client, E.ShmemError_RETRY)
     assert client.get_msg_header() is None
     start = time.perf_counter()
-    assert client.timed_read_pybuf(0.05) is None
-    assert client.get_last_error() == E.ShmemError_TIMEOUT
+    assert refused(client.timed_read_pybuf(0.05), client, E.ShmemError_TIMEOUT)
     assert 0.05 <= time.perf_counter() - start < 0.05 + 0.02
-    texts = [_renderlib.shmem_error_to_string(code) for code in range(6)]
+    texts = [E.shmem_error_to_string(code) for code in range(6)]
     assert all(isinstance(text, str) and text for text in texts) and len(set(texts)) == 6
-    assert _renderlib.shmem_error_to_string(99) is None
+    assert E.shmem_error_to_string(99) is None
 
 
 def test_written_messages_are_read_in_place(pair):
@@ -128,19 +128,15 @@ def test_reserved_space_is_filled_in_place(pair):
 
 def test_empty_and_text_messages(pair):
     server, client = pair
-    assert server.write_pybuf(b"")
-    assert server.write_string("text")
-    assert server.write_string("text", "with desc")
+    assert server.write_pybuf(b"") and server.write_string("text") and server.write_string("text", "with desc")
     # An empty message reads as nothing, header included, but it was one.
     assert client.get_msg_header() is None
-    assert client.read_pybuf() is None
-    assert client.get_last_error() == E.ShmemError_SHMEM_NO_ERROR
+    assert refused(client.read_pybuf(), client, E.ShmemError_SHMEM_NO_ERROR)
     assert (client.get_msg_header().desc, bytes(client.read_pybuf())) == ("", b"text\0")
     assert client.get_msg_header().desc == "with desc"
-    full = "x" * 30
-    assert server.write_string("y", full)
+    assert server.write_string("y", "x" * 30)
     client.read_pybuf()
-    assert client.get_msg_header().desc == full[:24]
+    assert client.get_msg_header().desc == "x" * 24
     with pytest.raises(TypeError, match="overloaded function 'ShmemTransport_write_string'"):
         server.write_string(b"bytes")  # text is str only
 
@@ -151,16 +147,12 @@ def test_empty_and_text_messages(pair):
     (lambda t, m: t.timed_write_pybuf(m, 0.1), "timed_write"),
 ])
 def test_a_message_without_a_buffer(pair, function, operation):
-    server, _ = pair
-    with pytest.raises(SystemError) as raised:
-        function(server, 5)
-    assert isinstance(raised.value.__cause__, TypeError)
-    assert str(raised.value.__cause__) == "in ShmemTransport::%s, msg must support the buffer protocol" % operation
-    strided = numpy.zeros((4, 4), numpy.uint8)[:, ::2]
-    with pytest.raises(SystemError) as raised:
-        function(server, strided)
-    assert str(raised.value.__cause__) == ("in ShmemTransport::%s, unable to get Py_buffer view; maybe has no size?"
-                                           % operation)
+    for message, text in [(5, "msg must support the buffer protocol"),
+                          (numpy.zeros((4, 4), numpy.uint8)[:, ::2], "unable to get Py_buffer view; maybe has no size?")]:
+        with pytest.raises(SystemError) as raised:
+            function(pair[0], message)
+        cause = raised.value.__cause__
+        assert type(cause) is TypeError and str(cause) == "in ShmemTransport::%s, %s" % (operation, text)
 
 
 def test_size_boundaries(pair):
@@ -168,10 +160,8 @@ def test_size_boundaries(pair):
     assert server.write_pybuf(bytes(LARGEST))
     assert len(client.read_pybuf()) == LARGEST
     assert client.try_read_pybuf() is None
-    assert not server.try_write_pybuf(bytes(LARGEST + 1))
-    assert server.get_last_error() == E.ShmemError_MSG_TOO_LARGE
-    assert server.try_reserve_pybuf(LARGEST + 1) is None
-    assert server.get_last_error() == E.ShmemError_MSG_TOO_LARGE
+    assert refused(server.try_write_pybuf(bytes(LARGEST + 1)), server, E.ShmemError_MSG_TOO_LARGE)
+    assert refused(server.try_reserve_pybuf(LARGEST + 1), server, E.ShmemError_MSG_TOO_LARGE)
     assert client.try_read_pybuf() is None  # nothing was sent
     assert server.write_pybuf(b"still works") and bytes(client.read_pybuf()) == b"still works"
 
@@ -183,10 +173,9 @@ def test_a_full_queue(pair):
         sent += 1
     assert server.get_last_error() == E.ShmemError_RETRY and sent > 10
     start = time.perf_counter()
-    assert not server.timed_write_pybuf(bytes(1000), 0.1)
-    assert server.get_last_error() == E.ShmemError_TIMEOUT
+    assert refused(server.timed_write_pybuf(bytes(1000), 0.1), server, E.ShmemError_TIMEOUT)
     assert 0.1 <= time.perf_counter() - start < 0.1 + 0.02
-    assert server.try_reserve_pybuf(1000) is None and server.get_last_error() == E.ShmemError_RETRY
+    assert refused(server.try_reserve_pybuf(1000), server, E.ShmemError_RETRY)
     # Every message arrives once the reader drains the queue.
     assert sum(1 for _ in iter(client.try_read_pybuf, None)) == sent
     assert server.try_write_pybuf(bytes(1000))
@@ -199,31 +188,26 @@ def test_a_removed_segment_is_invalid_for_both_ends(pair, name):
     assert not segment_file(name).exists()
     for transport in (server, client):
         assert not transport.is_segment_valid()
-        assert transport.try_read_pybuf() is None
-        assert transport.get_last_error() == E.ShmemError_INVALID_SEGMENT
-        assert not transport.try_write_pybuf(b"x")
-        assert transport.get_last_error() == E.ShmemError_INVALID_SEGMENT
+        assert refused(transport.try_read_pybuf(), transport, E.ShmemError_INVALID_SEGMENT)
+        assert refused(transport.try_write_pybuf(b"x"), transport, E.ShmemError_INVALID_SEGMENT)
 
 
 def test_server_pid_handles_are_copies_freed_silently(name):
     calls = 1000 if "vgpreload" in os.environ.get("LD_PRELOAD", "") else 1000000
-    done = run_python("""
+    lines = run_cleanly("""
         import sys, _renderlib, renderlib
         from process_memory import resident_kib
         server = _renderlib.ShmemManager_serve(sys.argv[1], 1 << 12, 1 << 12)
         pid = server.get_server_pid()  # a new handle each time, owning its copy
-        sys.stderr.write("%s %s %s " % (type(pid).__name__ == "SwigPyObject" and "pid_t *" in repr(pid),
-                                        pid.own() is True, pid != server.get_server_pid()))
-        calls = int(sys.argv[2])
-        for _ in range(calls // 10):
+        print(type(pid).__name__, "pid_t *" in repr(pid), pid.own(), pid != server.get_server_pid())
+        for _ in range(int(sys.argv[2]) // 10):
             server.get_server_pid()
         before = resident_kib()
-        for _ in range(calls):
+        for _ in range(int(sys.argv[2])):
             server.get_server_pid()
-        sys.stderr.write("grew %d KiB" % (resident_kib() - before))
+        print(resident_kib() - before)
         server.remove()
-    """, timeout=120, args=[name, calls])
-    assert done.returncode == 0 and done.stdout == "", (done.stdout[:300], done.stderr[-2000:])
-    assert done.stderr.split()[:3] == ["True"] * 3, done.stderr[-2000:]
+    """, timeout=120, args=[name, calls]).splitlines()
+    assert lines[0] == "SwigPyObject True True True" and len(lines) == 2, lines[:5]  # nothing else printed
     if not UNDER_ADDRESS_SANITIZER:  # a pid_t kept per call would be some 32 MB
-        assert int(done.stderr.split()[-2]) < 1024, done.stderr
+        assert int(lines[1]) < 1024, lines

@@ -4,6 +4,7 @@ functions' conversions, the error codes and the size and queue limits.
 (Every wrapper's argument errors and memory: tests/core.)"""
 import ctypes
 import os
+import random
 import stat
 import struct
 import time
@@ -179,6 +180,39 @@ def test_a_full_queue(pair):
     # Every message arrives once the reader drains the queue.
     assert sum(1 for _ in iter(client.try_read_pybuf, None)) == sent
     assert server.try_write_pybuf(bytes(1000))
+
+
+def message(number):
+    """Message `number` of a long run: random bytes, empty, of the largest
+    size or (mostly) small."""
+    rng = random.Random(number)
+    return rng.randbytes(rng.choice([0, LARGEST] + [int(LARGEST * rng.random() ** 8)] * 8)), str(number)
+
+
+def test_a_long_run_of_messages_arrives_whole_and_in_order(pair):
+    # Sent (half written, half reserved and committed) until the queue is
+    # full, then read one at a time: messages cross the ring's end at every
+    # offset, and the largest fits only when the queue is empty.
+    server, client = pair
+    sent = received = 0
+    while received < 5000:
+        if sent < 5000:
+            body, desc = message(sent)
+            view = server.try_reserve_pybuf(len(body), desc) if sent % 2 else None
+            if view is not None:
+                view[:] = body
+            if server.commit() if sent % 2 else server.try_write_pybuf(body, desc):
+                sent += 1
+                continue
+            assert server.get_last_error() == E.ShmemError_RETRY, sent
+        if received == sent:  # the message read last keeps its space until the next read
+            assert client.try_read_pybuf() is None
+            continue
+        body, desc = message(received)
+        header, view = client.get_msg_header(), client.try_read_pybuf()
+        assert client.get_last_error() == E.ShmemError_SHMEM_NO_ERROR, received
+        assert (bytes(view or b""), header and header.desc) == (body, body and desc or None), received
+        received += 1
 
 
 def test_a_removed_segment_is_invalid_for_both_ends(pair, name):

@@ -110,40 +110,34 @@ def test_a_frame_source_that_lets_go_of_itself_in_load_frame_keeps_its_frame_for
     assert out == ["[0.25]", "True"]
 
 
-@pytest.mark.parametrize("interface, install", [("GfxInterface", "tarsel_set_gfx_impl"),
-                                                ("LoadFrameInterface", "set_load_frame_impl")])
-def test_a_callback_class_with_a_catch_all_getattr_is_made_and_installed(interface, install):
-    out = run("""
-        class Null(renderlib.%s):
+@pytest.mark.parametrize("kind, install", [("GfxInterface", "tarsel_set_gfx_impl"),
+                                           ("LoadFrameInterface", "set_load_frame_impl")])
+def test_a_callback_class_with_a_catch_all_getattr_is_made_and_installed_and_lookalikes_are_refused(kind, install):
+    out = run_cleanly(PROLOGUE + textwrap.dedent("""
+        class Null(renderlib.%(kind)s):
             def __getattr__(self, name):
                 return lambda *args: 0
         null = Null()
-        _renderlib.%s(null)
-        _renderlib.%s(None)
+        _renderlib.%(install)s(null)
+        _renderlib.%(install)s(None)
         print(type(null.this).__name__, repr(null).startswith("<__main__.Null; proxy of <Swig Object"))
-    """ % (interface, install, install))
-    assert out == ["SwigPyObject", "True"]
-
-
-def test_objects_whose_this_is_made_on_the_spot_or_is_themselves_or_missing_are_refused():
-    out = run_cleanly(PROLOGUE + textwrap.dedent("""
-        class Anything:
+        class Anything:  # its this is made on the spot
             def __getattr__(self, name):
                 return lambda *args: 0
         class Itself:
             @property
             def this(self):
-                return self
-        class Forgetful(renderlib.GfxInterface):
+                return self  # itself
+        class Forgetful(renderlib.%(kind)s):
             def __init__(self):
                 pass  # not the base's
         for thing in (Anything(), Itself(), Forgetful(), object()):
             try:
-                _renderlib.tarsel_set_gfx_impl(thing)
+                _renderlib.%(install)s(thing)
             except TypeError as error:
                 print(error)
-    """))
-    assert out.splitlines() == ["in method 'tarsel_set_gfx_impl', argument 1 of type 'GfxInterface *'"] * 4
+    """ % {"kind": kind, "install": install})).splitlines()
+    assert out == ["SwigPyObject True"] + ["in method '%s', argument 1 of type '%s *'" % (install, kind)] * 4
 
 
 def test_engine_vectors_kept_past_the_drawing_call_refuse_use():

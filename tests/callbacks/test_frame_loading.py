@@ -63,19 +63,25 @@ class FrameSource(renderlib.LoadFrameInterface):
 
 @pytest.fixture
 def effect(instance):
-    """Factory of effect instances with changed settings, freed after the
-    test; no frame source is left installed."""
+    """Factory of effect instances, an echo unless named, with changed
+    settings; freed after the test, and no frame source is left installed."""
     made = []
-    yield lambda name, **changes: made.append(effects.recreate(instance(name), changes)) or made[-1]
+
+    def make(name="T_Echo", **changes):
+        made.append(effects.recreate(instance(name), dict(ECHO, **changes) if name == "T_Echo" else changes))
+        return made[-1]
+
+    yield make
     _renderlib.set_load_frame_impl(None)
     for each in made:
         _renderlib.free_tarsel_effect(each)
 
 
-def render(effect, inputs, frame=FRAME):
-    """The rendered frame, premultiplied (the render writes straight colour)."""
+def render(effect, inputs=None):
+    """The rendered frame (from the current frame of input 0 unless `inputs`
+    are given), premultiplied: the render writes straight colour."""
     dest = solid_frame((0, 0, 0, 0), WIDTH, HEIGHT)
-    assert effects.render(effect, dest, inputs, frame=frame)
+    assert effects.render(effect, dest, inputs or [source_frame()], frame=FRAME)
     result = pixels_of(dest).copy()
     result[..., :3] *= result[..., 3:]
     return result
@@ -89,7 +95,7 @@ def source_frame(input=0, frame=FRAME):
 def test_frames_come_from_engine_threads_at_the_engines_size_and_are_used(effect, size):
     source = FrameSource(size=size)
     _renderlib.set_load_frame_impl(source)
-    result = render(effect("T_Echo", **ECHO), [source_frame()])
+    result = render(effect())
     # The caller waits without the lock: the requests run on the engine's threads.
     assert source.threads and threading.get_ident() not in source.threads
     assert source.requests == [(0, 9, WIDTH, HEIGHT), (0, 8, WIDTH, HEIGHT)]
@@ -118,35 +124,27 @@ def test_the_inputs_and_frames_an_effect_asks_for(effect, name, changes, asked):
         numpy.testing.assert_allclose(result, numpy.broadcast_to(expected, result.shape), rtol=1e-5)
 
 
-def test_a_source_that_goes_away_is_no_longer_called(effect):
-    first, second = FrameSource(), FrameSource()
-    echo = effect("T_Echo", **dict(ECHO, echoes="2"))
+def test_a_source_that_goes_away_is_no_longer_called(effect, probe):
+    first, second, refused = FrameSource(), FrameSource(), FrameSource()
+    echo = effect(echoes="2")
     _renderlib.set_load_frame_impl(first)
     _renderlib.set_load_frame_impl(second)
-    render(echo, [source_frame()])
-    assert first.requests == [] and len(second.requests) == 1
-    # Replaced, it is not asked; the module keeps no reference, so a source
-    # used and then dropped is collected.
+    probe.abort_next_call()
+    with pytest.raises(RuntimeError, match="^Tarsel Abort$"):  # an aborted installation changes nothing
+        _renderlib.set_load_frame_impl(refused)
+    render(echo)
+    assert first.requests == refused.requests == [] and len(second.requests) == 1
+    # The module keeps no reference: a source used and then dropped is collected.
     dropped = weakref.ref(second)
     del second
     gc.collect()
     assert dropped() is None
     # Only the current frame is at hand: the echo is that frame exactly.
-    numpy.testing.assert_array_equal(render(echo, [source_frame()]), pixels_of(source_frame()))
+    numpy.testing.assert_array_equal(render(echo), pixels_of(source_frame()))
     _renderlib.set_load_frame_impl(first)
     _renderlib.set_load_frame_impl(None)
-    numpy.testing.assert_array_equal(render(echo, [source_frame()]), pixels_of(source_frame()))
+    numpy.testing.assert_array_equal(render(echo), pixels_of(source_frame()))
     assert first.requests == []  # nor is a source removed
-
-
-def test_an_aborted_installation_keeps_the_installed_source(effect, probe):
-    kept, refused = FrameSource(), FrameSource()
-    _renderlib.set_load_frame_impl(kept)
-    probe.abort_next_call()
-    with pytest.raises(RuntimeError, match="^Tarsel Abort$"):
-        _renderlib.set_load_frame_impl(refused)
-    render(effect("T_Echo", **dict(ECHO, echoes="2")), [source_frame()])
-    assert len(kept.requests) == 1 and refused.requests == []
 
 
 def test_an_empty_bytearray_is_an_empty_frame_not_a_missing_one(effect):
@@ -160,7 +158,7 @@ def test_an_empty_bytearray_is_an_empty_frame_not_a_missing_one(effect):
 
     source = Empty()  # referenced by the test: the module keeps none
     _renderlib.set_load_frame_impl(source)
-    result = render(effect("T_Echo", **dict(ECHO, echoes="2")), [source_frame()])
+    result = render(effect(echoes="2"))
     # The empty frame counts, with nothing in it.
     numpy.testing.assert_allclose(result[0, 0], numpy.array(colour(0, 10)) / 1.5, rtol=1e-5)
 
@@ -199,9 +197,9 @@ class Failing(FrameSource):
 def test_a_failed_request_ends_the_render_as_an_abort_caused_by_it(effect, probe, failure, cause, message):
     source = Failing(failure)
     _renderlib.set_load_frame_impl(source)
-    echo = effect("T_Echo", **dict(ECHO, echoes="4"))
+    echo = effect(echoes="4")
     with pytest.raises(RuntimeError, match="^Tarsel Abort$") as raised:
-        render(echo, [source_frame()])
+        render(echo)
     with pytest.raises(cause, match=message):
         raise raised.value.__cause__
     if failure == "raises":  # the host's own traceback comes along
@@ -213,7 +211,7 @@ def test_a_failed_request_ends_the_render_as_an_abort_caused_by_it(effect, probe
     assert len(source.requests) == 2
     assert not probe.abort_requested()
     _renderlib.set_load_frame_impl(FrameSource())
-    render(echo, [source_frame()])
+    render(echo)
 
 
 def test_a_failing_source_never_hangs_the_render():

@@ -72,7 +72,7 @@ def test_widget_pictures_use_every_drawing_operation(instance, drawing):
     assert used == {name for name in dir(renderlib.GfxInterface) if not name.startswith("_") and name != "thisown"}
 
 
-def test_a_drag_moves_a_point_by_the_mouse_travel(instance, drawing):
+def test_a_drag_moves_a_point_by_the_mouse_travel_and_scales_a_colour(instance, drawing):
     effect = instance("T_Gradient")
     assert value_of(effect, "center") == [0.5, 0.5]
     # The handle is at the frame's centre: (480, 270) on screen.
@@ -90,10 +90,7 @@ def test_a_drag_moves_a_point_by_the_mouse_travel(instance, drawing):
     # Let go: moving on drags nothing.
     assert mouse(effect, 700, 400, _renderlib.MouseEventType_DRAG) == (0, ())
     assert value_of(effect, "center") == pytest.approx([0.5 + 120 / 1920, 0.5])
-
-
-def test_a_swatch_drag_scales_the_colour(instance, drawing):
-    effect = instance("T_Gradient")
+    # A colour swatch's drag scales the colour: 100 pixels left halves it.
     before = value_of(effect, "end_color")
     assert mouse(effect, 20, 40, _renderlib.MouseEventType_PRESS) == (1, ())
     status, changed = mouse(effect, 20 - 100, 40, _renderlib.MouseEventType_DRAG)

@@ -5,11 +5,10 @@ import time
 
 import pytest
 
-import _renderlib
+import _renderlib as E
 from isolated import run_cleanly
 from segments import Peer, serve
 
-E = _renderlib
 QUEUE = 1 << 15
 
 
@@ -19,7 +18,7 @@ def test_a_blocked_writer_resumes_when_the_reader_drains(name):
 transport = _renderlib.ShmemManager_connect(name)
 while transport.try_write_pybuf(bytes(1000)):
     pass
-print("full", flush=True)
+print("full")
 start = time.monotonic()
 print(transport.write_pybuf(b"last".ljust(1000)), round(time.monotonic() - start, 2))
 """, name)
@@ -41,10 +40,10 @@ for i in range(3):
     assert transport.write_pybuf(b"committed %%d" %% i)
 if %r == "lock":
     from engine_probe import EngineProbe
-    print("ready", flush=True)
+    print("ready")
     EngineProbe().lib.tarsel_probe_shmem_stall_holding_lock(int(transport.this), 1)  # never returns
 transport.reserve_pybuf(100, "never committed")[:] = b"u" * 100
-print("ready", flush=True)
+print("ready")
 time.sleep(60)
 """
 
@@ -89,13 +88,12 @@ from segments import Peer
 name, reaped, side = sys.argv[1], sys.argv[2] == "reaped", sys.argv[3]
 if side == "client":  # the peer connects; this process serves
     here = _renderlib.ShmemManager_serve(name, %(queue)d, %(queue)d)
-    peer = Peer("t = _renderlib.ShmemManager_connect(name); print('ready', flush=True); time.sleep(60)", name)
-else:  # the peer serves; this process connects
-    peer = Peer("t = _renderlib.ShmemManager_serve(name, %(queue)d, %(queue)d); print('ready', flush=True); "
-                "time.sleep(60)", name)
-    assert peer.line() == "ready"
+    peer = Peer("t = _renderlib.ShmemManager_connect(name); print('ready'); time.sleep(60)", name)
+else:  # the peer serves; this process connects once it does
+    peer = Peer("t = _renderlib.ShmemManager_serve(name, %(queue)d, %(queue)d); print('ready'); time.sleep(60)", name)
+assert peer.line() == "ready"
+if side == "server":
     here = _renderlib.ShmemManager_connect(name)
-assert side == "server" or peer.line() == "ready"
 while here.try_write_pybuf(bytes(1000)):
     pass  # full: a write or a reservation waits for the peer to read
 peer.kill(reap=reaped)

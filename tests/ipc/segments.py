@@ -7,7 +7,6 @@ import pathlib
 import subprocess
 import sys
 import textwrap
-import time
 
 import _renderlib
 import renderlib  # noqa: F401  (registers the proxy classes)
@@ -77,18 +76,10 @@ class Peer:
         """Ends the peer with SIGKILL, wherever it is, and waits for it to die;
         unless `reap`, it is left unreaped (a zombie) until reap()."""
         self.process.kill()
-        while not reap and not self.dead():
-            time.sleep(0.001)
         if reap:
             self.reap()
-
-    def dead(self):
-        """Whether the peer has died, reaped or not."""
-        try:
-            with open("/proc/%d/stat" % self.process.pid) as stat:
-                return stat.read().rsplit(")", 1)[1].split()[0] in "ZX"
-        except FileNotFoundError:
-            return True
+        else:
+            os.waitid(os.P_PID, self.process.pid, os.WEXITED | os.WNOWAIT)
 
     def reap(self):
         self.process.communicate()

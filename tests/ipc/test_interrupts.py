@@ -58,7 +58,7 @@ def test_ctrl_c_ends_every_waiting_call_at_once():
     delays = {line.split()[1]: float(line.split()[2]) for line in lines if line.startswith("interrupted")}
     print("\nfrom SIGINT to KeyboardInterrupt, seconds:", delays)
     assert len(delays) == 8 and len(lines) == 10, lines
-    assert max(delays.values()) < 0.1, delays
+    assert max(delays.values()) < 0.25, delays  # a wait slice (50 ms) and a margin for a loaded machine
     # Nothing was taken or sent by the interrupted calls.
     filled = lines[-1].split()
     assert lines[-2] == "received b'after the interrupts' None" and filled[2] == filled[4], lines

@@ -108,7 +108,8 @@ def test_a_frame_source_that_lets_go_of_itself_in_load_frame_keeps_its_frame_for
 
 @pytest.mark.parametrize("kind, install", [("GfxInterface", "tarsel_set_gfx_impl"),
                                            ("LoadFrameInterface", "set_load_frame_impl")])
-def test_a_callback_class_with_a_catch_all_getattr_is_made_and_installed_and_lookalikes_are_refused(kind, install):
+def test_a_callback_class_with_a_catch_all_getattr_is_made_and_installed(kind, install):
+    # And objects that only look like one are refused.
     out = run("""
         class Anything:  # its this is made on the spot
             def __getattr__(self, name):

@@ -139,7 +139,7 @@ def test_a_failed_drawing_call_aborts_the_draw_with_it_as_cause(instance, probe,
         _renderlib.tarsel_set_gfx_impl(None)
 
 
-def test_a_drawing_object_let_go_of_after_use_is_collected_and_taken_back(instance, error_handler_removed):
+def test_a_drawing_object_that_goes_away_is_taken_back(instance, error_handler_removed):
     messages = []
     _renderlib.set_error_handler(lambda level, text: messages.append((level, text)))
     effect = instance("T_Gradient")

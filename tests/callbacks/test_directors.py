@@ -36,8 +36,7 @@ def test_a_disowned_callback_object_belongs_to_the_native_side():
     # (Until then the native object holds no reference: see the tests of a
     # source or drawing object that goes away.)
     drawing = SvgDrawing()
-    proxy = drawing.__disown__()
-    assert isinstance(proxy, weakref.ProxyType)
+    assert isinstance(drawing.__disown__(), weakref.ProxyType)
     alive = weakref.ref(drawing)
     _renderlib.disown_GfxInterface(drawing)  # a second hand-over changes nothing
     del drawing

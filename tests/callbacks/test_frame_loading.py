@@ -149,9 +149,8 @@ def test_an_empty_bytearray_is_an_empty_frame_not_a_missing_one(effect):
 
     source = Empty()  # referenced by the test: the module keeps none
     _renderlib.set_load_frame_impl(source)
-    result = render(effect(echoes="2"))
     # The empty frame counts, with nothing in it.
-    numpy.testing.assert_allclose(result[0, 0], numpy.array(colour(0, 10)) / 1.5, rtol=1e-5)
+    numpy.testing.assert_allclose(render(effect(echoes="2"))[0, 0], numpy.array(colour(0, 10)) / 1.5, rtol=1e-5)
 
 
 # A source whose second request goes wrong in the way given, for two renders

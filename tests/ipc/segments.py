@@ -7,7 +7,6 @@ import pathlib
 import subprocess
 import sys
 import textwrap
-import time
 
 import _renderlib
 import renderlib  # noqa: F401  (registers the proxy classes)
@@ -44,17 +43,15 @@ def connect(name):
 
 class Peer:
     """Another Python process running `script` (with `name`, `_renderlib`
-    and `renderlib` at hand). It may report on stdout and read lines from
-    stdin; finish() waits for it, killing it after `limit` seconds."""
+    and `renderlib` at hand, its output unbuffered). It may report on stdout
+    and read lines from stdin."""
 
-    def __init__(self, script, name, limit=60):
+    def __init__(self, script, name):
         prologue = "import os, sys, time, zlib\nimport _renderlib, renderlib\nname = %r\n" % name
         paths = [str(TESTS), str(TESTS / "ipc")] + [p for p in [os.environ.get("PYTHONPATH")] if p]
-        environment = dict(os.environ, PYTHONPATH=os.pathsep.join(paths))
         self.process = subprocess.Popen([sys.executable, "-u", "-c", prologue + textwrap.dedent(script)],
                                         stdin=subprocess.PIPE, stdout=subprocess.PIPE, stderr=subprocess.PIPE,
-                                        text=True, env=environment)
-        self.limit = limit
+                                        text=True, env=dict(os.environ, PYTHONPATH=os.pathsep.join(paths)))
 
     def line(self):
         """The next line the peer prints (empty when it ended)."""
@@ -64,34 +61,25 @@ class Peer:
         self.process.stdin.write(text + "\n")
         self.process.stdin.flush()
 
-    def finish(self):
-        """Waits for the peer to end; its remaining output and return code."""
+    def finish(self, limit=60):
+        """Waits for the peer to end with status 0, killing it after `limit`
+        seconds: its remaining output."""
         try:
-            out, err = self.process.communicate(timeout=self.limit)
+            out, err = self.process.communicate(timeout=limit)
         except subprocess.TimeoutExpired:
             self.process.kill()
-            out, err = self.process.communicate()
-            raise AssertionError("the peer did not end within %d s: %s" % (self.limit, err))
+            raise AssertionError("the peer did not end within %d s: %s" % (limit, self.process.communicate()[1]))
         assert self.process.returncode == 0, err
         return out
 
     def kill(self, reap=True):
-        """Ends the peer with SIGKILL, wherever it is, and waits for it, or
-        leaves it unreaped (a zombie) until reap() when `reap` is false."""
+        """Ends the peer with SIGKILL, wherever it is, and waits for it to die;
+        unless `reap`, it is left unreaped (a zombie) until reap()."""
         self.process.kill()
         if reap:
             self.reap()
         else:
-            while not self.dead():
-                time.sleep(0.001)
-
-    def dead(self):
-        """Whether the peer has died, reaped or not."""
-        try:
-            with open("/proc/%d/stat" % self.process.pid) as stat:
-                return stat.read().rsplit(")", 1)[1].split()[0] in "ZX"
-        except FileNotFoundError:
-            return True
+            os.waitid(os.P_PID, self.process.pid, os.WEXITED | os.WNOWAIT)
 
     def reap(self):
         self.process.communicate()

@@ -7,6 +7,7 @@ import os
 import random
 import stat
 import struct
+import subprocess
 import time
 
 import numpy
@@ -81,6 +82,11 @@ def test_nothing_to_read_is_none_without_an_error(pair):
     start = time.perf_counter()
     assert refused(client.timed_read_pybuf(0.05), client, E.ShmemError_TIMEOUT)
     assert 0.05 <= time.perf_counter() - start < 0.05 + 0.02
+    # A child of the host ending (its SIGCHLD is ignored by default) does not cut the wait short.
+    child = subprocess.Popen(["sleep", "0.1"])
+    start = time.perf_counter()
+    assert refused(client.timed_read_pybuf(0.5), client, E.ShmemError_TIMEOUT)
+    assert time.perf_counter() - start >= 0.5 and child.wait() == 0
     texts = [E.shmem_error_to_string(code) for code in range(6)]
     assert all(isinstance(text, str) and text for text in texts) and len(set(texts)) == 6
     assert E.shmem_error_to_string(99) is None

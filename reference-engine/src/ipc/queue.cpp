@@ -224,11 +224,27 @@ SignalsHeldBack::~SignalsHeldBack() {
   if (--signals_held_depth == 0) pthread_sigmask(SIG_SETMASK, &mask_before_held, nullptr);
 }
 
+namespace {
+
+// Whether a signal would do anything once let through: one that is ignored,
+// by its handler or by default (a child ending, a window resized), must not
+// end a wait, or a host's unrelated child process would cut its reads short.
+bool signal_acts(int signal) {
+  struct sigaction action;
+  if (sigaction(signal, nullptr, &action) != 0) return true;
+  if (action.sa_handler == SIG_IGN) return false;
+  if (action.sa_handler != SIG_DFL) return true;
+  return signal != SIGCHLD && signal != SIGCONT && signal != SIGURG && signal != SIGWINCH;
+}
+
+}  // namespace
+
 bool SignalsHeldBack::signal_waiting() {
   sigset_t pending;
   if (sigpending(&pending) != 0) return false;
   for (int signal = 1; signal < NSIG; ++signal)
-    if (sigismember(&pending, signal) == 1 && sigismember(&mask_before_held, signal) == 0) return true;
+    if (sigismember(&pending, signal) == 1 && sigismember(&mask_before_held, signal) == 0 && signal_acts(signal))
+      return true;
   return false;
 }
 

@@ -4,7 +4,7 @@
 
 #include <vector>
 
-#include "model/definition.h"
+#include "catalogue/definition.h"
 
 namespace tarsel_ref {
 

@@ -7,9 +7,7 @@
 #include <thread>
 
 #include "core/abort.h"
-#include "core/entry.h"
 #include "core/thread_end.h"
-#include "rendering/kernels/kernel.h"
 #include "tarsel/errors.h"
 
 namespace tarsel_ref {
@@ -18,6 +16,8 @@ namespace {
 std::atomic<T_LoadOtherFrameFun> installed{nullptr};
 
 }  // namespace
+
+void install_frame_request(T_LoadOtherFrameFun fun) { installed.store(fun); }
 
 T_LoadOtherFrameFun installed_frame_request() { return installed.load(); }
 
@@ -110,17 +110,11 @@ std::shared_ptr<const WorkImage> FrameRequests::request(int input, int frame, un
   return image;
 }
 
-std::shared_ptr<const WorkImage> KernelContext::other_frame(int input, int wanted) const {
-  const std::size_t i = static_cast<std::size_t>(input);
-  if (wanted == frame) return inputs[i];
-  if (!requests) return nullptr;
-  if (!connected[i]) return inputs[i];  // every frame of an unconnected input is its fallback
-  return requests->request(input, wanted, kRequestOtherFrame);
+std::unique_ptr<OtherFrames> host_frame_requests(const T_RenderState &state, void *instance, const Genotype &genotype,
+                                                 FrameReader read) {
+  const T_LoadOtherFrameFun fun = installed_frame_request();
+  if (!fun) return nullptr;
+  return std::make_unique<FrameRequests>(fun, state, instance, genotype, std::move(read));
 }
 
 }  // namespace tarsel_ref
-
-void set_load_other_frame_into_buffer_fun(T_LoadOtherFrameFun fun) {
-  auto scope = tarsel_ref::enter("set_load_other_frame_into_buffer_fun", reinterpret_cast<const void *>(fun));
-  tarsel_ref::installed.store(fun);
-}

@@ -14,27 +14,22 @@
 #include <mutex>
 #include <string>
 
-#include "rendering/image.h"
+#include "rendering/render_call.h"
 #include "tarsel/genotype.h"
 #include "tarsel/load_frame.h"
 
 namespace tarsel_ref {
 
-// The request flag: why a frame is wanted.
-constexpr unsigned char kRequestOtherFrame = 0;      // another frame of an input
-constexpr unsigned char kRequestPreviousOutput = 1;  // a frame of an input the previous output is rebuilt from
+// Installs the host's callback (null: none).
+void install_frame_request(T_LoadOtherFrameFun fun);
 
 // The installed callback; null when there is none.
 T_LoadOtherFrameFun installed_frame_request();
 
 // The frame requests of one render.
-class FrameRequests {
+class FrameRequests : public OtherFrames {
 public:
-  // Reads the pixels a request returned into the render's working form, as
-  // the render reads its inputs; null with `error` set when the descriptor
-  // does not describe pixels the render can read.
-  using Reader =
-      std::function<std::shared_ptr<const WorkImage>(const T_RasterInfo &info, void *pixels, std::string *error)>;
+  using Reader = FrameReader;
 
   // `state` is what the callback receives as the render state; `instance`
   // and `genotype` are the two engine values.
@@ -45,12 +40,7 @@ public:
   FrameRequests(const FrameRequests &) = delete;
   FrameRequests &operator=(const FrameRequests &) = delete;
 
-  // Frame `frame` of input `input` (counted from 0) as the host returns it,
-  // in working form; null when the host has no such frame. Throws
-  // TarselAbortException when the callback threw (this request or an earlier
-  // one: none is made after a failure) or an abort is requested, and
-  // std::runtime_error when the answer's descriptor does not read.
-  std::shared_ptr<const WorkImage> request(int input, int frame, unsigned char flag);
+  std::shared_ptr<const WorkImage> request(int input, int frame, unsigned char flag) override;
 
 private:
   class Thread;
@@ -66,5 +56,11 @@ private:
   bool failed_ = false;  // guarded by one_at_a_time_
   std::unique_ptr<Thread> thread_;
 };
+
+// The frame requests of one render through the installed callback; null
+// when none is installed. What a render call is given to ask the host for
+// frames (RenderCall::other_frames).
+std::unique_ptr<OtherFrames> host_frame_requests(const T_RenderState &state, void *instance, const Genotype &genotype,
+                                                 FrameReader read);
 
 }  // namespace tarsel_ref

@@ -1,4 +1,4 @@
-// Entry points of the on-screen widgets: installing the host's drawing
+// The on-screen widget calls: installing the host's drawing
 // implementation, drawing an instance's widgets, and its mouse events.
 #include <algorithm>
 #include <atomic>
@@ -33,17 +33,6 @@ int held_index(EffectInstance &instance) {
       hold.param_index >= genotype->n_params)
     return -1;
   return hold.param_index;
-}
-
-std::string values_text(const std::vector<float> &values) {
-  if (!call_log_enabled()) return std::string();
-  std::string text = "[";
-  for (std::size_t i = 0; i < values.size(); ++i) {
-    char buffer[32];
-    std::snprintf(buffer, sizeof buffer, "%s%g", i ? ", " : "", static_cast<double>(values[i]));
-    text += buffer;
-  }
-  return text + "]";
 }
 
 // What both widget calls share: the live instance, its descriptor in use, the
@@ -112,21 +101,25 @@ void move_held(const widgets::Widget &w, const WidgetHold &hold, int mouse_x, in
 }
 
 }  // namespace
-}  // namespace tarsel_ref
+
+std::string values_text(const std::vector<float> &values) {
+  if (!call_log_enabled()) return std::string();
+  std::string text = "[";
+  for (std::size_t i = 0; i < values.size(); ++i) {
+    char buffer[32];
+    std::snprintf(buffer, sizeof buffer, "%s%g", i ? ", " : "", static_cast<double>(values[i]));
+    text += buffer;
+  }
+  return text + "]";
+}
 
 // A plain pointer, process-wide; null removes it. The host keeps the object
 // alive while it is installed.
-void tarsel_set_gfx_impl(GfxInterface *gfx) {
-  auto scope = tarsel_ref::enter("tarsel_set_gfx_impl", static_cast<const void *>(gfx));
-  tarsel_ref::installed_gfx.store(gfx);
-}
+void install_gfx(GfxInterface *gfx) { installed_gfx.store(gfx); }
 
-void tarsel_widget_draw(EffectGlobals_t *globals, const char *param_name, int view_xsize, int view_ysize,
-                        float view_x, float view_y, float view_scale_x, float view_scale_y,
-                        std::vector<float> values) {
-  auto scope = tarsel_ref::enter("tarsel_widget_draw", static_cast<const void *>(globals), param_name, view_xsize,
-                                 view_ysize, view_x, view_y, view_scale_x, view_scale_y,
-                                 tarsel_ref::values_text(values).c_str());
+void draw_widgets(EffectGlobals_t *globals, const char *param_name, int view_xsize, int view_ysize,
+                  float view_x, float view_y, float view_scale_x, float view_scale_y,
+                  std::vector<float> values) {
   tarsel_ref::Call call;
   if (!tarsel_ref::prepare("tarsel_widget_draw", globals, param_name, view_xsize, view_ysize, view_x, view_y,
                            view_scale_x, view_scale_y, values, &call))
@@ -144,13 +137,10 @@ void tarsel_widget_draw(EffectGlobals_t *globals, const char *param_name, int vi
 
 // Status: 0 the event touched no widget, 1 over a widget or holding one, 2 a
 // release ended a drag. The list: the parameters the event changed.
-T_WidgetResult tarsel_widget_mouse_event(EffectGlobals_t *globals, const char *param_name, int view_xsize,
-                                         int view_ysize, float view_x, float view_y, float view_scale_x,
-                                         float view_scale_y, std::vector<float> values, int mouse_x, int mouse_y,
-                                         MouseEventType event) {
-  auto scope = tarsel_ref::enter("tarsel_widget_mouse_event", static_cast<const void *>(globals), param_name,
-                                 view_xsize, view_ysize, view_x, view_y, view_scale_x, view_scale_y,
-                                 tarsel_ref::values_text(values).c_str(), mouse_x, mouse_y, static_cast<int>(event));
+T_WidgetResult widget_mouse_event(EffectGlobals_t *globals, const char *param_name, int view_xsize,
+                                  int view_ysize, float view_x, float view_y, float view_scale_x,
+                                  float view_scale_y, std::vector<float> values, int mouse_x, int mouse_y,
+                                  MouseEventType event) {
   namespace w = tarsel_ref::widgets;
   T_WidgetResult result{0, {}};
   tarsel_ref::Call call;
@@ -213,3 +203,5 @@ T_WidgetResult tarsel_widget_mouse_event(EffectGlobals_t *globals, const char *p
   }
   return result;
 }
+
+}  // namespace tarsel_ref

@@ -127,4 +127,17 @@ void dragged_colour(const float pressed[MAX_CHANNELS], double dx, float out[MAX_
 void paint(GfxInterface &gfx, void *context, const std::vector<Widget> &widgets, int held);
 
 }  // namespace widgets
+// The widget calls: installing the host's drawing object (null: none), drawing
+// an instance's widgets through it, and a mouse event. Each refused call is
+// an Err_Error message naming the entry point.
+void install_gfx(GfxInterface *gfx);
+void draw_widgets(EffectGlobals_t *globals, const char *param_name, int view_xsize, int view_ysize, float view_x,
+                  float view_y, float view_scale_x, float view_scale_y, std::vector<float> values);
+T_WidgetResult widget_mouse_event(EffectGlobals_t *globals, const char *param_name, int view_xsize, int view_ysize,
+                                  float view_x, float view_y, float view_scale_x, float view_scale_y,
+                                  std::vector<float> values, int mouse_x, int mouse_y, MouseEventType event);
+
+// The values as the call log shows them; "" when no log wants arguments.
+std::string values_text(const std::vector<float> &values);
+
 }  // namespace tarsel_ref

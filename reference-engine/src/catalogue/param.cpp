@@ -24,13 +24,6 @@ int live_params() { return param_count.load(); }
 
 using tarsel_ref::store_of;
 
-char *tarsel_malloc_copy_string_func(const char *text) {
-  auto scope = tarsel_ref::enter("tarsel_malloc_copy_string_func", text);
-  char *copy = nullptr;
-  tarsel_ref::replace_text(copy, text);
-  return copy;
-}
-
 // Bounds start at the no-limit values; the slider defaults suit a 0..1
 // quantity, the wide slider a 0..100 one.
 Param::Param()

@@ -1,4 +1,6 @@
 // The free query functions on parameters and descriptors.
+#include "catalogue/param_queries.h"
+
 #include <algorithm>
 #include <cstring>
 #include <string>
@@ -6,8 +8,6 @@
 #include "catalogue/data_files.h"
 #include "catalogue/descriptor.h"
 #include "catalogue/param_store.h"
-#include "core/entry.h"
-#include "tarsel/param_queries.h"
 
 namespace tarsel_ref {
 namespace {
@@ -55,11 +55,8 @@ std::string title_of(const Param &param, int channel) {
 float scaled_bound(float bound, float no_limit, float factor) { return bound == no_limit ? bound : bound * factor; }
 
 }  // namespace
-}  // namespace tarsel_ref
 
-int tarsel_get_fromfile_popup_names(const Param *param, char ***names) {
-  auto scope = tarsel_ref::enter("tarsel_get_fromfile_popup_names", static_cast<const void *>(param),
-                                 static_cast<const void *>(names));
+int fromfile_popup_names(const Param *param, char ***names) {
   if (names) *names = nullptr;
   if (!param || param->ptype != ptype_popup || !param->flags.fromfile_popup_p) return 0;
   const auto id = static_cast<tarsel_ref::FromFileListId>(tarsel_ref::store_of(*param).list_id);
@@ -72,11 +69,8 @@ int tarsel_get_fromfile_popup_names(const Param *param, char ***names) {
 // scale multiplies every value but the no-limit bounds; channel is the
 // channel asked about (all of a parameter's channels share one range; one it
 // does not have gets no limits and an empty slider range); flags as above.
-void tarsel_get_param_bounds2(const Param *param, float scale, int channel, float *min_bound, float *max_bound,
-                              float *slider_min, float *slider_max, int flags) {
-  auto scope = tarsel_ref::enter("tarsel_get_param_bounds2", static_cast<const void *>(param), scale, channel,
-                                 static_cast<const void *>(min_bound), static_cast<const void *>(max_bound),
-                                 static_cast<const void *>(slider_min), static_cast<const void *>(slider_max), flags);
+void param_bounds(const Param *param, float scale, int channel, float *min_bound, float *max_bound,
+                  float *slider_min, float *slider_max, int flags) {
   float lo = tarsel_ref::kNoLowerBound, hi = tarsel_ref::kNoUpperBound, third = 0.0f, fourth = 0.0f;
   if (param && channel >= 0 && channel < std::max<int>(1, param->n_channels)) {
     const float factor =
@@ -97,9 +91,7 @@ void tarsel_get_param_bounds2(const Param *param, float scale, int channel, floa
   if (slider_max) *slider_max = fourth;
 }
 
-char *tarsel_get_param_title(const Param *param, int channel, char *buffer, size_t buffer_size) {
-  auto scope = tarsel_ref::enter("tarsel_get_param_title", static_cast<const void *>(param), channel,
-                                 static_cast<const void *>(buffer), buffer_size);
+char *param_title(const Param *param, int channel, char *buffer, size_t buffer_size) {
   if (!buffer || buffer_size == 0) return buffer;
   const std::string title = param ? tarsel_ref::title_of(*param, channel) : "";
   const std::size_t n = std::min(title.size(), buffer_size - 1);
@@ -108,13 +100,13 @@ char *tarsel_get_param_title(const Param *param, int channel, char *buffer, size
   return buffer;
 }
 
-int tarsel_any_nodes_get_flag(Genotype *genotype, int mask) {
-  auto scope = tarsel_ref::enter("tarsel_any_nodes_get_flag", static_cast<const void *>(genotype), mask);
+int any_node_flags(Genotype *genotype, int mask) {
   return genotype ? tarsel_ref::node_flags(*genotype) & mask : 0;
 }
 
 // The text is the parameter's (see Param::to_string); the caller never frees it.
-char *tarsel_param_to_string(Param *param) {
-  auto scope = tarsel_ref::enter("tarsel_param_to_string", static_cast<const void *>(param));
+char *param_text(Param *param) {
   return param ? param->to_string(nullptr, false) : nullptr;
 }
+
+}  // namespace tarsel_ref

@@ -1,11 +1,10 @@
 // Compositing 8-bit BGRA images over a background for display.
 #include <string>
 
-#include "core/entry.h"
 #include "core/messages.h"
+#include "rendering/image_utils.h"
 #include "rendering/workers.h"
 #include "tarsel/errors.h"
-#include "tarsel/image_utils.h"
 
 namespace tarsel_ref {
 namespace {
@@ -17,12 +16,8 @@ inline unsigned scale(unsigned a, unsigned b) {
 }
 
 }  // namespace
-}  // namespace tarsel_ref
 
-void tarsel_comp_bgra_8(RawImage image, int xsize, int ysize, int line_bytes, int background_argb, int checker_size) {
-  using namespace tarsel_ref;
-  auto scope = enter("tarsel_comp_bgra_8", static_cast<const void *>(image), xsize, ysize, line_bytes,
-                     background_argb, checker_size);
+void composite_bgra(RawImage image, int xsize, int ysize, int line_bytes, int background_argb, int checker_size) {
   if (xsize <= 0 || ysize <= 0) return;
   if (!image) {
     emit_message(Err_Error, "tarsel_comp_bgra_8: no image");
@@ -50,3 +45,5 @@ void tarsel_comp_bgra_8(RawImage image, int xsize, int ysize, int line_bytes, in
     }
   });
 }
+
+}  // namespace tarsel_ref

@@ -7,14 +7,13 @@
 #include <string>
 #include <vector>
 
-#include "core/entry.h"
 #include "core/messages.h"
 #include "rendering/colour.h"
+#include "rendering/image_utils.h"
 #include "rendering/luts.h"
 #include "rendering/pixels.h"
 #include "rendering/workers.h"
 #include "tarsel/errors.h"
-#include "tarsel/image_utils.h"
 
 namespace tarsel_ref {
 namespace {
@@ -28,15 +27,9 @@ unsigned char to_byte(float v, float dither) {
 }
 
 }  // namespace
-}  // namespace tarsel_ref
 
-void tarsel_convert_to_bgra_8(EffectGlobals_t *instance, T_RasterInfo *src_info, RawImage src, RawImage dst,
-                              int alpha_mode, int dither, int flip, const char *src_colorspace,
-                              const char *display_colorspace) {
-  using namespace tarsel_ref;
-  auto scope = enter("tarsel_convert_to_bgra_8", static_cast<const void *>(instance),
-                     static_cast<const void *>(src_info), static_cast<const void *>(src),
-                     static_cast<const void *>(dst), alpha_mode, dither, flip, src_colorspace, display_colorspace);
+void convert_to_bgra(T_RasterInfo *src_info, RawImage src, RawImage dst, int alpha_mode, int dither, int flip,
+                     const char *src_colorspace, const char *display_colorspace) {
   auto fail = [](const std::string &why) { emit_message(Err_Error, ("tarsel_convert_to_bgra_8: " + why).c_str()); };
   if (!src_info) return fail("no source descriptor");
   RasterView source;
@@ -90,3 +83,5 @@ void tarsel_convert_to_bgra_8(EffectGlobals_t *instance, T_RasterInfo *src_info,
     fail("not enough memory");
   }
 }
+
+}  // namespace tarsel_ref

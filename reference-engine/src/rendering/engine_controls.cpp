@@ -1,16 +1,16 @@
 // Process-wide engine controls and the instance queries that go with them.
+#include "rendering/engine_controls.h"
+
 #include <cmath>
 #include <string>
 
 #include "catalogue/descriptor.h"
-#include "core/entry.h"
 #include "core/messages.h"
 #include "rendering/buffers.h"
 #include "rendering/instance.h"
 #include "rendering/luts.h"
 #include "rendering/stamps.h"
 #include "rendering/workers.h"
-#include "tarsel/effect.h"
 #include "tarsel/errors.h"
 
 namespace tarsel_ref {
@@ -31,18 +31,16 @@ void update_table(std::vector<float> &table, const char *path) {
 }
 
 }  // namespace
-}  // namespace tarsel_ref
 
-void set_tarsel_luts(const char *input_lut_path, const char *output_lut_path, float lut_scale) {
-  auto scope = tarsel_ref::enter("set_tarsel_luts", input_lut_path, output_lut_path, lut_scale);
-  tarsel_ref::LutSet next = *tarsel_ref::current_luts();
-  tarsel_ref::update_table(next.input, input_lut_path);
-  tarsel_ref::update_table(next.display, output_lut_path);
+void set_luts(const char *input_lut_path, const char *output_lut_path, float lut_scale) {
+  LutSet next = *current_luts();
+  update_table(next.input, input_lut_path);
+  update_table(next.display, output_lut_path);
   if (std::isfinite(lut_scale) && lut_scale >= 0.0f)
     next.exposure = lut_scale;
   else
-    tarsel_ref::emit_message(Err_Error, "set_tarsel_luts: the exposure must be a finite factor of 0 or more");
-  tarsel_ref::install_luts(std::move(next));
+    emit_message(Err_Error, "set_tarsel_luts: the exposure must be a finite factor of 0 or more");
+  install_luts(std::move(next));
 }
 
 // param_values null or "": the effect as a whole, which varies when it reads
@@ -50,41 +48,34 @@ void set_tarsel_luts(const char *input_lut_path, const char *output_lut_path, fl
 // canonical name of one parameter of the descriptor in use, which varies when
 // it animates (automatic animation or transition). -1 for an unknown name or
 // instance. The answers hold for every frame.
-int tarsel_effect_is_time_varying(EffectGlobals_t *globals, const char *param_values, int frame) {
-  auto scope = tarsel_ref::enter("tarsel_effect_is_time_varying", static_cast<const void *>(globals), param_values,
-                                 frame);
-  tarsel_ref::InstanceUse instance(globals);
+int time_varying(EffectGlobals_t *globals, const char *param_values) {
+  InstanceUse instance(globals);
   if (!instance) return -1;
   const Genotype &genotype = *instance->effect_genotype;
   if (param_values && *param_values) {
-    const Param *param = tarsel_ref::find_param(genotype, param_values);
-    return param ? (tarsel_ref::animates(*param) ? 1 : 0) : -1;
+    const Param *param = find_param(genotype, param_values);
+    return param ? (animates(*param) ? 1 : 0) : -1;
   }
   if (genotype.flags.need_other_frames_p || genotype.flags.use_prev_dest_p) return 1;
   for (int i = 0; i < genotype.n_params; ++i)
-    if (tarsel_ref::animates(*genotype.params[i])) return 1;
+    if (animates(*genotype.params[i])) return 1;
   return 0;
 }
 
-const char *tarsel_get_gpu_status(EffectGlobals_t *globals) {
-  auto scope = tarsel_ref::enter("tarsel_get_gpu_status", static_cast<const void *>(globals));
+const char *gpu_status(EffectGlobals_t *globals) {
   // The text lives in the instance: valid until the instance is freed.
-  if (tarsel_ref::InstanceUse instance{globals}) return instance->gpu_status.c_str();
+  if (InstanceUse instance{globals}) return instance->gpu_status.c_str();
   return "CPU: the reference engine has no graphics-processor path";
-}
-
-void tarsel_free_all_stamp_collections() {
-  auto scope = tarsel_ref::enter("tarsel_free_all_stamp_collections");
-  tarsel_ref::clear_stamps();
 }
 
 // The engine runs no helper applications; what it lets go of are its
 // process-wide caches (stamps, tables, kept pixel buffers) and its worker
 // threads. Everything is made again on demand afterwards.
-void tarsel_shutdown_apps() {
-  auto scope = tarsel_ref::enter("tarsel_shutdown_apps");
-  tarsel_ref::clear_stamps();
-  tarsel_ref::clear_luts();
-  tarsel_ref::release_workers();
-  tarsel_ref::release_buffer_cache();
+void release_caches() {
+  clear_stamps();
+  clear_luts();
+  release_workers();
+  release_buffer_cache();
 }
+
+}  // namespace tarsel_ref

@@ -2,12 +2,12 @@
 // buffer covers.
 #include <climits>
 
-#include "core/entry.h"
+#include "rendering/image_utils.h"
 #include "rendering/pixels.h"
-#include "tarsel/image_utils.h"
 
-int make_tarsel_raster_info(T_RasterInfo *info, int xsize, int ysize) {
-  auto scope = tarsel_ref::enter("make_tarsel_raster_info", static_cast<const void *>(info), xsize, ysize);
+namespace tarsel_ref {
+
+int fill_raster_info(T_RasterInfo *info, int xsize, int ysize) {
   if (!info) return 0;
   const tarsel_ref::PixelLayout *layout = tarsel_ref::pixel_layout(info->pixel_type);
   if (!layout || xsize < 0 || ysize < 0) return 0;
@@ -25,9 +25,7 @@ int make_tarsel_raster_info(T_RasterInfo *info, int xsize, int ysize) {
   return static_cast<int>(bytes);
 }
 
-void tarsel_get_native_image_dims(T_RasterInfo *info, int *out_xsize, int *out_ysize) {
-  auto scope = tarsel_ref::enter("tarsel_get_native_image_dims", static_cast<const void *>(info),
-                                 static_cast<const void *>(out_xsize), static_cast<const void *>(out_ysize));
+void native_image_dims(T_RasterInfo *info, int *out_xsize, int *out_ysize) {
   long long x = 0, y = 0;
   if (info) {
     const long long factor = info->res_factor == 0 ? 1 : info->res_factor;
@@ -38,3 +36,5 @@ void tarsel_get_native_image_dims(T_RasterInfo *info, int *out_xsize, int *out_y
   if (out_xsize) *out_xsize = narrow(x);
   if (out_ysize) *out_ysize = narrow(y);
 }
+
+}  // namespace tarsel_ref

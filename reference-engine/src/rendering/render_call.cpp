@@ -7,7 +7,6 @@
 #include <utility>
 #include <vector>
 
-#include "callbacks/frame_requests.h"
 #include "catalogue/param_store.h"
 #include "rendering/instance.h"
 #include "rendering/pixels.h"
@@ -340,11 +339,10 @@ void load_inputs(const RenderCall &call, const Checked &checked, const Inputs &i
 // Other frames of the inputs, asked of the host by effects that read them or
 // rebuild their previous output; read like the inputs. None when no host
 // answers requests or the effect needs none. `ctx` must outlive the result.
-std::unique_ptr<FrameRequests> frames_from_host(const RenderCall &call, const Checked &checked,
-                                                const Inputs &inputs, KernelContext *ctx) {
+std::unique_ptr<OtherFrames> frames_from_host(const RenderCall &call, const Checked &checked, const Inputs &inputs,
+                                              KernelContext *ctx) {
   const Genotype &g = *checked.g;
-  const T_LoadOtherFrameFun request_fun = installed_frame_request();
-  if (!request_fun || call.flare_call || !(g.flags.need_other_frames_p || g.flags.use_prev_dest_p)) return nullptr;
+  if (!call.other_frames || call.flare_call || !(g.flags.need_other_frames_p || g.flags.use_prev_dest_p)) return nullptr;
   T_RenderState state;
   std::memset(&state, 0, sizeof state);
   for (int i = 0; i < inputs.count() && i < MAX_INPUTS; ++i)
@@ -356,7 +354,7 @@ std::unique_ptr<FrameRequests> frames_from_host(const RenderCall &call, const Ch
     if (!check_resolution(frame_info, checked.downsample, "the frame", why)) return nullptr;
     return read_image(frame, *ctx, checked.spaces, checked.spaces.input, call.premultiplied);
   };
-  return std::make_unique<FrameRequests>(request_fun, state, call.instance, g, read_frame);
+  return call.other_frames(state, call.instance, g, read_frame);
 }
 
 // Runs the kernel (unless the mix leaves input 1 as it is) and writes every
@@ -393,6 +391,14 @@ void write_result(const RenderCall &call, const KernelContext &ctx, const Checke
 
 }  // namespace
 
+std::shared_ptr<const WorkImage> KernelContext::other_frame(int input, int wanted) const {
+  const std::size_t i = static_cast<std::size_t>(input);
+  if (wanted == frame) return inputs[i];
+  if (!requests) return nullptr;
+  if (!connected[i]) return inputs[i];  // every frame of an unconnected input is its fallback
+  return requests->request(input, wanted, kRequestOtherFrame);
+}
+
 bool render(const RenderCall &call, std::string *error) {
   const InstanceUse use(call.instance);  // the instance outlives this render, whoever frees it meanwhile
   EffectInstance *instance = use.get();
@@ -416,7 +422,7 @@ bool render(const RenderCall &call, std::string *error) {
     return false;
   }
   const float mix = call.flare_call ? 1.0f : std::clamp(call.mix, 0.0f, 1.0f) * slot_mix(*instance);
-  const std::unique_ptr<FrameRequests> requests = frames_from_host(call, checked, inputs, &ctx);
+  const std::unique_ptr<OtherFrames> requests = frames_from_host(call, checked, inputs, &ctx);
   ctx.requests = requests.get();
   if (g.flags.use_prev_dest_p && !ctx.previous && ctx.requests)
     if (const History history = find_history(g.name)) {

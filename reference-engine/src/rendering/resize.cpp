@@ -8,13 +8,12 @@
 #include <string>
 #include <vector>
 
-#include "core/entry.h"
 #include "core/messages.h"
 #include "rendering/colour.h"
+#include "rendering/image_utils.h"
 #include "rendering/pixels.h"
 #include "rendering/workers.h"
 #include "tarsel/errors.h"
-#include "tarsel/image_utils.h"
 
 namespace tarsel_ref {
 namespace {
@@ -129,12 +128,9 @@ Taps make_taps(int n, int m, double offset, int filter, double sharpness) {
 }
 
 }  // namespace
-}  // namespace tarsel_ref
 
-size_t tarsel_get_resized_image_size(T_RasterInfo *src_info, int new_xsize, int new_ysize, int pixel_type,
-                                     int extra_line_elts, float scale, int flags) {
-  auto scope = tarsel_ref::enter("tarsel_get_resized_image_size", static_cast<const void *>(src_info), new_xsize,
-                                 new_ysize, pixel_type, extra_line_elts, scale, flags);
+size_t resized_image_size(T_RasterInfo *src_info, int new_xsize, int new_ysize, int pixel_type,
+                          int extra_line_elts, float scale) {
   tarsel_ref::Plan plan;
   std::string error;
   if (!tarsel_ref::plan_resize(src_info, new_xsize, new_ysize, pixel_type, extra_line_elts, scale, &plan, &error))
@@ -142,14 +138,9 @@ size_t tarsel_get_resized_image_size(T_RasterInfo *src_info, int new_xsize, int 
   return tarsel_ref::image_bytes(*plan.dst_layout, plan.width, plan.height, extra_line_elts);
 }
 
-void tarsel_resize_native_image(T_RasterInfo *src_info, RawImage src, int new_xsize, int new_ysize, int pixel_type,
-                                int extra_line_elts, float scale, T_RasterInfo *dst_info, RawImage dst, int filter,
-                                float x_offset, float y_offset, float sharpness, int *out_xsize, int *out_ysize) {
-  using namespace tarsel_ref;
-  auto scope = enter("tarsel_resize_native_image", static_cast<const void *>(src_info), static_cast<const void *>(src),
-                     new_xsize, new_ysize, pixel_type, extra_line_elts, scale, static_cast<const void *>(dst_info),
-                     static_cast<const void *>(dst), filter, x_offset, y_offset, sharpness,
-                     static_cast<const void *>(out_xsize), static_cast<const void *>(out_ysize));
+void resize_image(T_RasterInfo *src_info, RawImage src, int new_xsize, int new_ysize, int pixel_type,
+                  int extra_line_elts, float scale, T_RasterInfo *dst_info, RawImage dst, int filter,
+                  float x_offset, float y_offset, float sharpness, int *out_xsize, int *out_ysize) {
   if (out_xsize) *out_xsize = 0;
   if (out_ysize) *out_ysize = 0;
   auto fail = [](const std::string &why) {
@@ -234,3 +225,5 @@ void tarsel_resize_native_image(T_RasterInfo *src_info, RawImage src, int new_xs
     fail("not enough memory");
   }
 }
+
+}  // namespace tarsel_ref

@@ -4,8 +4,8 @@
 #include <memory>
 #include <string>
 
+#include "catalogue/catalogue.h"
 #include "core/messages.h"
-#include "effects/registry.h"
 #include "tarsel/errors.h"
 
 namespace tarsel_ref {

@@ -1,4 +1,4 @@
-// The flare-texture store and its entry points.
+// The flare-texture store.
 #include "rendering/textures.h"
 
 #include <algorithm>
@@ -9,8 +9,6 @@
 #include <mutex>
 #include <new>
 
-#include "core/entry.h"
-#include "tarsel/effect.h"
 
 namespace tarsel_ref {
 namespace {
@@ -98,12 +96,7 @@ std::shared_ptr<const Texture> find_texture(int index) {
   return store().textures[static_cast<std::size_t>(index)];
 }
 
-}  // namespace tarsel_ref
-
-using tarsel_ref::failed;
-
-int tarsel_load_flare_texture(const char *path) {
-  auto scope = tarsel_ref::enter("tarsel_load_flare_texture", path);
+int load_texture(const char *path) {
   try {
     tarsel_ref::Texture texture;
     std::string error;
@@ -114,15 +107,12 @@ int tarsel_load_flare_texture(const char *path) {
   }
 }
 
-const char *tarsel_get_flare_texture_error() {
-  auto scope = tarsel_ref::enter("tarsel_get_flare_texture_error");
+const char *texture_error() {
   const tarsel_ref::LastError &error = tarsel_ref::last_error();
   return error.failed ? error.text.c_str() : nullptr;
 }
 
-int tarsel_register_flare_texture(int xsize, int ysize, int n_channels, int bytes_per_channel, RawImage pixels) {
-  auto scope = tarsel_ref::enter("tarsel_register_flare_texture", xsize, ysize, n_channels, bytes_per_channel,
-                                 static_cast<const void *>(pixels));
+int register_texture(int xsize, int ysize, int n_channels, int bytes_per_channel, RawImage pixels) {
   if (xsize <= 0 || ysize <= 0 || xsize > 16384 || ysize > 16384)
     return failed("a texture of " + std::to_string(xsize) + " x " + std::to_string(ysize) + " pixels is not possible");
   if (n_channels < 1 || n_channels > 4)
@@ -146,11 +136,7 @@ int tarsel_register_flare_texture(int xsize, int ysize, int n_channels, int byte
   }
 }
 
-int tarsel_get_texture_info(int index, int *xsize, int *ysize, int *n_channels, int *bytes_per_channel,
-                            size_t *n_bytes) {
-  auto scope = tarsel_ref::enter("tarsel_get_texture_info", index, static_cast<const void *>(xsize),
-                                 static_cast<const void *>(ysize), static_cast<const void *>(n_channels),
-                                 static_cast<const void *>(bytes_per_channel), static_cast<const void *>(n_bytes));
+int texture_info(int index, int *xsize, int *ysize, int *n_channels, int *bytes_per_channel, size_t *n_bytes) {
   const auto texture = tarsel_ref::find_texture(index);
   if (!texture) return failed("no texture " + std::to_string(index));
   if (xsize) *xsize = texture->xsize;
@@ -162,8 +148,7 @@ int tarsel_get_texture_info(int index, int *xsize, int *ysize, int *n_channels, 
   return 0;
 }
 
-int tarsel_get_texture_pixels(int index, void *dest, size_t dest_size) {
-  auto scope = tarsel_ref::enter("tarsel_get_texture_pixels", index, static_cast<const void *>(dest), dest_size);
+int texture_pixels(int index, void *dest, size_t dest_size) {
   const auto texture = tarsel_ref::find_texture(index);
   if (!texture) return failed("no texture " + std::to_string(index));
   const std::size_t n = std::min({dest ? dest_size : 0, texture->bytes.size(),
@@ -173,8 +158,7 @@ int tarsel_get_texture_pixels(int index, void *dest, size_t dest_size) {
   return static_cast<int>(n);
 }
 
-void tarsel_free_all_flare_textures() {
-  auto scope = tarsel_ref::enter("tarsel_free_all_flare_textures");
+void free_textures() {
   std::vector<std::shared_ptr<const tarsel_ref::Texture>> released;
   {
     std::lock_guard<std::mutex> lock(tarsel_ref::store().mutex);
@@ -182,3 +166,5 @@ void tarsel_free_all_flare_textures() {
   }
   tarsel_ref::succeeded();
 }
+
+}  // namespace tarsel_ref

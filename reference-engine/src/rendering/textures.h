@@ -8,6 +8,8 @@
 #include <string>
 #include <vector>
 
+#include "tarsel/raster_info.h"
+
 namespace tarsel_ref {
 
 struct Texture {
@@ -24,5 +26,15 @@ std::shared_ptr<const Texture> find_texture(int index);
 // Reads a PNG file into `texture` (bytes only); false with `error` set when
 // it cannot.
 bool read_png_file(const char *path, Texture *texture, std::string *error);
+
+// The store's operations. The calls that add or describe a texture record on
+// the calling thread whether they failed and why (texture_error); those that
+// fail return -1.
+int load_texture(const char *path);
+const char *texture_error();
+int register_texture(int xsize, int ysize, int n_channels, int bytes_per_channel, RawImage pixels);
+int texture_info(int index, int *xsize, int *ysize, int *n_channels, int *bytes_per_channel, size_t *n_bytes);
+int texture_pixels(int index, void *dest, size_t dest_size);
+void free_textures();
 
 }  // namespace tarsel_ref

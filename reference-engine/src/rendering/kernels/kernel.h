@@ -28,7 +28,22 @@ struct FlareCall {
   float brightness = 1.0f;
 };
 
-class FrameRequests;  // callbacks/frame_requests.h
+// The request flag: why a frame is wanted.
+constexpr unsigned char kRequestOtherFrame = 0;      // another frame of an input
+constexpr unsigned char kRequestPreviousOutput = 1;  // a frame of an input the previous output is rebuilt from
+
+// Frames of the inputs other than those a render call hands over, asked of
+// the host during the render (made by callbacks/frame_requests.h).
+class OtherFrames {
+public:
+  virtual ~OtherFrames() = default;
+  // Frame `frame` of input `input` (counted from 0) as the host returns it,
+  // in working form; null when the host has no such frame. Throws
+  // TarselAbortException when the host's callback threw (this request or an
+  // earlier one: none is made after a failure) or an abort is requested, and
+  // std::runtime_error when the answer's descriptor does not read.
+  virtual std::shared_ptr<const WorkImage> request(int input, int frame, unsigned char flag) = 0;
+};
 
 // frame + offset, kept within the frames an int can name: a run of frames
 // around the first or last one stops there instead of wrapping.
@@ -56,7 +71,7 @@ struct KernelContext {
   std::vector<bool> connected;
   std::shared_ptr<const WorkImage> previous;  // the previous output; null when none was given
   const FlareCall *flare_call = nullptr;
-  FrameRequests *requests = nullptr;  // the host's frames; null when only the current frame is at hand
+  OtherFrames *requests = nullptr;  // the host's frames; null when only the current frame is at hand
 
   const ParamReader &p() const { return *params; }
   const WorkImage &input(int i) const { return *inputs[static_cast<std::size_t>(i)]; }
@@ -64,7 +79,7 @@ struct KernelContext {
   // rendered, the fallback (every frame) of an unconnected input, otherwise
   // the host's answer to a frame request; null when the host has no such
   // frame or takes no requests. Call it outside rows(): requests are made
-  // one at a time and may end the render (see FrameRequests::request).
+  // one at a time and may end the render (see OtherFrames::request).
   std::shared_ptr<const WorkImage> other_frame(int i, int frame) const;
   // A length in full-resolution pixels as render pixels.
   double length(double full_resolution) const { return full_resolution / downsample; }

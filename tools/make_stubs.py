@@ -90,18 +90,18 @@ PYOBJECT_RESULTS = {
     "value_map_values": "list[tuple[float, ...]]",
     "value_map_items": "list[tuple[str, tuple[float, ...]]]",
     "value_map_asdict": "dict[str, tuple[float, ...]]",
-    # model/effect_globals.i: (Param view, Genotype view) pairs, a Param of None
+    # catalogue/effect_globals.i: (Param view, Genotype view) pairs, a Param of None
     # for an index outside the table.
     "EffectGlobals_t__get_shared_params": "list[tuple[Param | None, Genotype | None]]",
-    # model/effect_def.i: one number as a float, any other count as a tuple.
+    # catalogue/effect_def.i: one number as a float, any other count as a tuple.
     "effect_def_get_arg_hardcoded_values": "dict[str, float | tuple[float, ...]]",
-    # model/param.i: titles are std::string; state and popup names are engine
+    # catalogue/param.i: titles are std::string; state and popup names are engine
     # texts, None where the engine has a null.
     "Param_get_titles": "list[str]",
     "Param_get_limits": "tuple[float | None, float | None, float, float]",
     "Param_get_state_names": "list[str | None]",
     "Param_get_fromfile_popup_names": "list[str | None]",
-    # render/raster_serialisation.i: the 104-byte image.
+    # rendering/raster_serialisation.i: the 104-byte image.
     "raster_info_to_bytearray": "bytearray",
     # error_handler.i: Py_RETURN_NONE.
     "set_error_handler": "None",

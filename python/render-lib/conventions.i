@@ -1,4 +1,14 @@
-// Conventions shared by the descriptor classes.
+// Conventions of the module's wrappers, and those shared by the descriptor
+// classes.
+
+// Proxy methods pass their arguments on as given, so that an omitted argument
+// takes the default of the engine's declaration and every overload set
+// reports its own prototypes.
+%feature("python:cdefaultargs");
+
+// Wrappers keep the interpreter lock unless an interface file lets a long
+// engine call run without it (%threadallow).
+%nothreadallow;
 
 // %record_identity(TYPE): engine records compare by identity, not contents.
 // Two proxies are equal exactly when they hold the same native address, and

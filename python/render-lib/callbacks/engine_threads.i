@@ -15,6 +15,23 @@
 // The thread that ends the interpreter is never shut out: its atexit
 // functions, finalizers and __del__ methods may still render.
 
+%begin %{
+// Import enables thread support last; see renderlib_initialize_threads.
+#define SWIG_PYTHON_INITIALIZE_THREADS renderlib_initialize_threads()
+%}
+
+%{
+// From Python 3.9 on the interpreter always runs with thread support and
+// PyEval_InitThreads is deprecated; before that the module must enable it so
+// that wrappers can release the lock and engine threads can re-enter Python.
+static void renderlib_initialize_threads()
+{
+#if PY_VERSION_HEX < 0x03090000
+  PyEval_InitThreads();
+#endif
+}
+%}
+
 %{
 #include <atomic>
 #include <chrono>

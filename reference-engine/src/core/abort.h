@@ -9,4 +9,9 @@ bool abort_requested();
 // Throws TarselAbortException when an abort has been requested.
 void throw_if_aborted();
 
+// Sets the request; it stays set until cleared.
+void request_abort();
+
+void clear_abort_request();
+
 }  // namespace tarsel_ref

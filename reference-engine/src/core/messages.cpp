@@ -2,7 +2,6 @@
 
 #include <atomic>
 
-#include "core/entry.h"
 #include "tarsel/errors.h"
 
 namespace tarsel_ref {
@@ -14,9 +13,6 @@ void emit_message(int level, const char *text) {
   if (T_ErrHandler handler = installed_handler.load()) handler(level, text);
 }
 
-}  // namespace tarsel_ref
+T_ErrHandler install_message_handler(T_ErrHandler handler) { return installed_handler.exchange(handler); }
 
-T_ErrHandler T_set_err_handler(T_ErrHandler handler) {
-  tarsel_ref::enter("T_set_err_handler", reinterpret_cast<const void *>(handler));
-  return tarsel_ref::installed_handler.exchange(handler);
-}
+}  // namespace tarsel_ref

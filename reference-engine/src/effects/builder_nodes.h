@@ -7,7 +7,7 @@
 #include <string>
 #include <vector>
 
-#include "model/definition.h"
+#include "catalogue/definition.h"
 
 namespace tarsel_ref {
 

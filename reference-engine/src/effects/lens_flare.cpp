@@ -1,7 +1,7 @@
 // Lens Flare: the glows, rings and ghosts a bright light makes in a lens,
 // drawn over the input along the axis from the light through the centre.
+#include "catalogue/flare.h"
 #include "effects/registry.h"
-#include "model/flare.h"
 
 namespace tarsel_ref {
 namespace {

@@ -1,10 +1,9 @@
 // The effect definitions the engine is built with, one file each in this
-// folder, in catalogue order.
+// folder, in catalogue order; the lists themselves are declared with the
+// catalogue (catalogue/catalogue.h).
 #pragma once
 
-#include <vector>
-
-#include "model/definition.h"
+#include "catalogue/catalogue.h"
 
 namespace tarsel_ref {
 
@@ -21,12 +20,5 @@ const PluginDefinition &transform_plugin();
 const PluginDefinition &time_blur_plugin();
 const PluginDefinition &builder_mix_plugin();
 const PluginDefinition &builder_matte_plugin();
-
-// The effect catalogue and the effect builder's, each in its order.
-const std::vector<const PluginDefinition *> &effect_plugins();
-const std::vector<const PluginDefinition *> &builder_plugins();
-
-// The plug-in of that name in one of the catalogues; null when none.
-const PluginDefinition *find_plugin(const char *name, bool builder);
 
 }  // namespace tarsel_ref

@@ -1,5 +1,6 @@
-// ShmemManager: making, joining and resetting named segments; freeing
-// transports; the error texts.
+// Making, joining and resetting named segments, and the error texts.
+#include "ipc/manager.h"
+
 #include <dirent.h>
 #include <errno.h>
 #include <fcntl.h>
@@ -12,12 +13,9 @@
 #include <new>
 #include <string>
 
-#include "core/entry.h"
-#include "core/messages.h"
 #include "ipc/segment.h"
 #include "ipc/transport.h"
 #include "ipc/truncation.h"
-#include "tarsel/errors.h"
 #include "tarsel/ipc.h"
 
 using Tarsel::IPC::ShmemError;
@@ -103,12 +101,6 @@ bool init_segment(const Mapping &mapping, uint64_t capacity0, uint64_t capacity1
   store(header->magic, kSegmentMagic);
   return true;
 }
-
-// Makes the contract's transport object around a new endpoint, which takes
-// over the mapping, and says which endpoint that is. Supplied by
-// ShmemManager, which alone may construct one.
-using Construct = ShmemTransport *(*)(const Mapping &mapping, bool server, const std::string &object,
-                                      Endpoint **endpoint);
 
 ShmemTransport *make_transport(const Mapping &mapping, bool server, const std::string &object, Construct construct);
 
@@ -222,55 +214,15 @@ void reset_object(const std::string &object, bool always) {
 }
 
 }  // namespace
-}  // namespace ipc
-}  // namespace tarsel_ref
 
-using namespace tarsel_ref::ipc;
-
-void free_tarsel_ipc_shmemtransport(ShmemTransport *transport) {
-  auto scope = tarsel_ref::enter("free_tarsel_ipc_shmemtransport", static_cast<const void *>(transport));
-  if (!transport) return;
-  if (!unregister_endpoint(transport)) {
-    tarsel_ref::emit_message(Err_Error, "free_tarsel_ipc_shmemtransport: not a live transport of this engine");
-    return;
-  }
-  delete transport;
-}
-
-const char *Tarsel::IPC::shmem_error_to_string(ShmemError error) {
-  auto scope = tarsel_ref::enter("shmem_error_to_string", static_cast<int>(error));
-  switch (error) {
-    case ShmemError::SHMEM_NO_ERROR:
-      return "no error";
-    case ShmemError::INVALID_SEGMENT:
-      return "invalid segment: removed, reset or not a transport segment";
-    case ShmemError::TIMEOUT:
-      return "timed out";
-    case ShmemError::LOCK_ERROR:
-      return "the segment's lock cannot be taken";
-    case ShmemError::RETRY:
-      return "try again: the operation would have to wait, the peer process is gone, or a signal came";
-    case ShmemError::MSG_TOO_LARGE:
-      return "message too large for the queue";
-  }
-  return nullptr;
-}
-
-ShmemTransport *ShmemManager::serve(const char *const name, size_t size1, size_t size2) {
-  auto scope = tarsel_ref::enter("ShmemManager::serve", name, size1, size2);
+ShmemTransport *serve_segment(const char *name, size_t size1, size_t size2, Construct construct) {
   std::string object;
   const uint64_t capacity0 = capacity_for(size1);
   const uint64_t capacity1 = capacity_for(size2);
   if (!object_name(name, &object) || !capacity0 || !capacity1) return nullptr;
   for (int attempt = 0; attempt < kServeAttempts; ++attempt) {
     const int fd = shm_open(object.c_str(), O_CREAT | O_EXCL | O_RDWR, 0600);
-    if (fd >= 0)
-      return create_segment(fd, object, capacity0, capacity1,
-                            [](const Mapping &mapping, bool server, const std::string &object, Endpoint **endpoint) {
-                              auto *impl = new ShmemTransport::Impl(mapping, server, object);
-                              *endpoint = impl;
-                              return new ShmemTransport(impl);
-                            });
+    if (fd >= 0) return create_segment(fd, object, capacity0, capacity1, construct);
     if (errno != EEXIST) return nullptr;
     switch (examine_existing(object, attempt >= kServeAttempts / 2)) {
       case Existing::kGone:
@@ -286,8 +238,7 @@ ShmemTransport *ShmemManager::serve(const char *const name, size_t size1, size_t
   return nullptr;
 }
 
-ShmemTransport *ShmemManager::connect(const char *const name) {
-  auto scope = tarsel_ref::enter("ShmemManager::connect", name);
+ShmemTransport *connect_segment(const char *name, Construct construct) {
   std::string object;
   Mapping mapping;
   if (!object_name(name, &object) || !open_object(object, &mapping)) return nullptr;
@@ -310,11 +261,6 @@ ShmemTransport *ShmemManager::connect(const char *const name) {
       break;
     }
   }
-  const Construct construct = [](const Mapping &mapping, bool server, const std::string &object, Endpoint **endpoint) {
-    auto *impl = new ShmemTransport::Impl(mapping, server, object);
-    *endpoint = impl;
-    return new ShmemTransport(impl);
-  };
   ShmemTransport *transport = usable ? make_transport(mapping, false, object, construct) : nullptr;
   if (!transport) {
     if (usable) {
@@ -326,14 +272,12 @@ ShmemTransport *ShmemManager::connect(const char *const name) {
   return transport;
 }
 
-void ShmemManager::reset(const char *const name, bool flag) {
-  auto scope = tarsel_ref::enter("ShmemManager::reset", name, flag);
+void reset_segment(const char *name, bool flag) {
   std::string object;
   if (object_name(name, &object)) reset_object(object, flag);
 }
 
-void ShmemManager::reset_all(bool flag) {
-  auto scope = tarsel_ref::enter("ShmemManager::reset_all", flag);
+void reset_all_segments(bool flag) {
   DIR *directory = opendir("/dev/shm");
   if (!directory) return;
   const std::string prefix = kObjectPrefix + 1;  // without the "/"
@@ -349,17 +293,23 @@ void ShmemManager::reset_all(bool flag) {
   closedir(directory);
 }
 
-ShmemManager::ShmemManager() { auto scope = tarsel_ref::enter("ShmemManager::ShmemManager", static_cast<const void *>(this)); }
-
-ShmemManager::ShmemManager(const ShmemManager &other) {
-  auto scope = tarsel_ref::enter("ShmemManager::ShmemManager", static_cast<const void *>(this),
-                                 static_cast<const void *>(&other));
+const char *error_text(ShmemError error) {
+  switch (error) {
+    case ShmemError::SHMEM_NO_ERROR:
+      return "no error";
+    case ShmemError::INVALID_SEGMENT:
+      return "invalid segment: removed, reset or not a transport segment";
+    case ShmemError::TIMEOUT:
+      return "timed out";
+    case ShmemError::LOCK_ERROR:
+      return "the segment's lock cannot be taken";
+    case ShmemError::RETRY:
+      return "try again: the operation would have to wait, the peer process is gone, or a signal came";
+    case ShmemError::MSG_TOO_LARGE:
+      return "message too large for the queue";
+  }
+  return nullptr;
 }
 
-ShmemManager &ShmemManager::operator=(const ShmemManager &other) {
-  auto scope = tarsel_ref::enter("ShmemManager::operator=", static_cast<const void *>(this),
-                                 static_cast<const void *>(&other));
-  return *this;
-}
-
-ShmemManager::~ShmemManager() { tarsel_ref::note_entry("ShmemManager::~ShmemManager", static_cast<const void *>(this)); }
+}  // namespace ipc
+}  // namespace tarsel_ref

@@ -12,19 +12,19 @@
 #include <pthread.h>
 #include <unistd.h>
 
+#include "callbacks/frame_requests.h"
+#include "catalogue/param_values.h"
 #include "core/abort.h"
 #include "core/entry.h"
 #include "core/identity.h"
 #include "core/messages.h"
 #include "core/thread_end.h"
 #include "ipc/transport.h"
-#include "model/instance.h"
-#include "model/param_values.h"
-#include "model/stamps.h"
 #include "probe/call_log.h"
-#include "render/frame_requests.h"
-#include "render/render_stats.h"
-#include "render/workers.h"
+#include "rendering/instance.h"
+#include "rendering/render_stats.h"
+#include "rendering/stamps.h"
+#include "rendering/workers.h"
 #include "tarsel/errors.h"
 #include "tarsel_probe.h"
 

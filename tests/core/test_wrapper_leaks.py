@@ -3,11 +3,7 @@ called over and over: the process's memory stays flat (resident size, the C
 heap in use and the interpreter's own blocks), the objects handed to the calls
 keep their reference counts, and the engine's and the monitor library's live
 objects come back to their counts. A function added to the module without a
-case here fails test_every_wrapper_is_exercised.
-
-A failure that every wrapper reaches alike (too many or too few arguments, a
-first argument of a type none takes, None for any argument) is left to the
-sweep of argument_errors; the other families call what is their own."""
+case here fails test_every_wrapper_is_exercised."""
 import ast
 import base64
 import contextlib
@@ -27,8 +23,12 @@ import _renderlib
 import renderlib
 from engine_probe import EngineProbe, loaded_library_path
 from process_memory import UNDER_ADDRESS_SANITIZER, resident_kib
-from _renderlib import MouseEventType_DRAG, MouseEventType_PRESS
 from renderlib import effects, png
+
+# A failure that every wrapper reaches alike (too many or too few arguments,
+# a first argument of a type none takes, None for any argument) is left to
+# the sweep of argument_errors; the other families make the calls that are
+# their own.
 
 REPO = pathlib.Path(__file__).resolve().parents[2]
 
@@ -42,10 +42,8 @@ MEASURE_MEMORY = not (UNDER_ADDRESS_SANITIZER or UNDER_VALGRIND)
 # Functions of the module no case calls, and why: SWIG's registration of
 # each proxy class (<Class>_swigregister), run once as renderlib is imported;
 # calling it again would re-register the class.
-NOT_EXERCISED = {
-    name: "SWIG's registration of the proxy class %s" % name[:-len("_swigregister")]
-    for name in dir(_renderlib) if name.endswith("_swigregister")
-}
+NOT_EXERCISED = {name: "SWIG's registration of the proxy class %s" % name[:-len("_swigregister")]
+                 for name in dir(_renderlib) if name.endswith("_swigregister")}
 
 
 class Stranger:
@@ -58,8 +56,8 @@ ANY = object()  # any result will do
 
 
 def text(value):
-    """A str equal to `value` but not the interned constant, so that its
-    reference count belongs to the test alone."""
+    # A str equal to `value` but not the interned constant, so that its
+    # reference count belongs to the test alone.
     return (value + "#")[:-1]
 
 
@@ -92,22 +90,22 @@ def module_functions():
 
 # --- The memory of the C heap, the engine and the monitor library ----------
 
-class _MallInfo2(ctypes.Structure):
+class MallInfo2(ctypes.Structure):
     _fields_ = [(name, ctypes.c_size_t) for name in
                 "arena ordblks smblks hblks hblkhd usmblks fsmblks uordblks fordblks keepcost".split()]
 
 
 try:
-    _mallinfo2 = ctypes.CDLL(None).mallinfo2  # glibc 2.33 and later
-    _mallinfo2.restype = _MallInfo2
+    mallinfo2 = ctypes.CDLL(None).mallinfo2  # glibc 2.33 and later
+    mallinfo2.restype = MallInfo2
 except (AttributeError, OSError, TypeError):
-    _mallinfo2 = None
+    mallinfo2 = None
 
 
 def heap_in_use():
-    """Bytes of the C heap in use (every arena and mapped block); 0 where
-    the C library does not tell."""
-    info = _mallinfo2() if _mallinfo2 else None
+    # Bytes of the C heap in use (every arena and mapped block); 0 where the
+    # C library does not tell.
+    info = mallinfo2() if mallinfo2 else None
     return info.uordblks + info.hblkhd if info else 0
 
 
@@ -119,6 +117,16 @@ MONITOR.qrv_probe_set_init_fails.argtypes = MONITOR.qrv_probe_set_no_devices.arg
 def live_objects():
     return {"instances": ENGINE.live_instances(), "params": ENGINE.live_params(), "stamps": ENGINE.stamp_count(),
             "displays+images": (MONITOR.qrv_probe_live_displays(), MONITOR.qrv_probe_live_images())}
+
+
+@contextlib.contextmanager
+def switched(switch):
+    """One of the monitor library's fault switches, on for the block."""
+    switch(1)
+    try:
+        yield
+    finally:
+        switch(0)
 
 
 # --- Calling by name ---------------------------------------------------------
@@ -146,11 +154,11 @@ class Calls:
             return
         raise AssertionError("%s%r gave %r instead of raising %s" % (name, args, result, error))
 
-    # Each row is (want, name, *arguments): `want` is the error the call
-    # raises, ANY, a test of its result, or the result itself (None, a bool
-    # and NotImplemented the very object).
+    # Each row is (want, name, *arguments), or a name alone for (ANY, name):
+    # `want` is the error the call raises, ANY, a test of its result, or the
+    # result itself (None, a bool and NotImplemented the very object).
     def rows(self, *rows):
-        for want, name, *args in rows:
+        for want, name, *args in ((ANY, row) if isinstance(row, str) else row for row in rows):
             if is_error(want):
                 self.fails(want, name, *args)
                 continue
@@ -162,7 +170,8 @@ class Calls:
 
     def on(self, prefix, obj, *rows):
         """rows(), each row (want, member, *arguments) a call of `<prefix>member` on `obj`."""
-        self.rows(*[(want, prefix + member, obj, *args) for want, member, *args in rows])
+        self.rows(*[(want, prefix + member, obj, *args)
+                    for want, member, *args in ((ANY, row) if isinstance(row, str) else row for row in rows)])
 
     def aborted(self, name, *args):
         """The engine fails the call: the probe makes its next entry throw."""
@@ -182,12 +191,16 @@ def construct(call, cls, *args):
     return proxy
 
 
-# Calls every one-argument `<prefix>*` on `obj` (its getters among them)
-# but the class's static methods and, when `write`, writes back what each
-# getter read through its setter (but those named in `keep`), refusing a
-# wrong type and, for an int, a value out of range.
+# Calls every one-argument `<prefix>*` on `obj` (its getters among them) but
+# the class's static methods and, when `write`, writes back what each getter
+# read through its setter (but those named in `keep`), refusing a wrong type
+# and, for an int, a value out of range. An object that compares is equal to
+# itself and leaves the comparison with a stranger to Python.
 def members(call, prefix, obj, write=True, keep=()):
     cls = getattr(renderlib, prefix[:-1])
+    if hasattr(_renderlib, prefix + "__eq__"):
+        call.on(prefix, obj, (True, "__eq__", obj), (False, "__ne__", obj), (NotImplemented, "__eq__", STRANGER),
+                (NotImplemented, "__ne__", STRANGER))
     for name in sorted(dir(_renderlib)):
         if not name.startswith(prefix) or name.endswith("_swigregister") or arities()[name] != (1, 1) or \
                 isinstance(inspect.getattr_static(cls, name[len(prefix):], None), staticmethod):
@@ -255,10 +268,14 @@ def engine_genotypes(call, builder_too=True):
     return made_effects, [genotype for effect in made_effects for genotype in effect._get_genotypes()]
 
 
+def changed(row, at, value):
+    return row[:at] + [value] + row[at + 1:]
+
+
 @family
 def records(call, helpers, tmp_path):
     # Every record a host can make on its own: made, each field read and
-    # written back, deleted.
+    # written back, deleted; then the engine's catalogue, walked.
     classes = (renderlib.Plugin_Info, renderlib.Genotype, renderlib.ParamFlags, renderlib.T_RasterInfo,
                renderlib.T_RenderInfo, renderlib.MessageHeader_t, renderlib.ShmemManager)
 
@@ -267,6 +284,13 @@ def records(call, helpers, tmp_path):
             record = construct(call, cls)
             members(call, cls.__name__ + "_", record)
             call("delete_" + cls.__name__, record)
+        for count_of, entry in (("get_n_tarsel_effects", "get_tarsel_plugin_info_i"),
+                                ("get_n_tarsel_builder_effects", "get_tarsel_builder_info_i")):
+            count = call(count_of)
+            assert count > 0
+            for i in range(count):
+                members(call, "Plugin_Info_", call(entry, i))
+            call.rows((None, entry, count), (None, entry, -1), (OverflowError, entry, BIG))
 
     return step, [], nothing
 
@@ -282,8 +306,7 @@ def effect_instances(call, helpers, tmp_path):
         effect = call("init_tarsel_effect", name, False)
         members(call, "EffectGlobals_t_", effect, write=False)
         call.on("EffectGlobals_t_", effect, (name, "plugin_name_get"), (bool, "_get_shared_params"),
-                (True, "__eq__", effect), (True, "__ne__", kept), (NotImplemented, "__eq__", STRANGER),
-                (NotImplemented, "__ne__", STRANGER))
+                (True, "__ne__", kept))
         call.rows((TypeError, "EffectGlobals_t__get_genotypes", kept.effect_genotype),
                   (ANY, "tarsel_effect_is_time_varying", effect, name, 0),
                   (OverflowError, "tarsel_effect_is_time_varying", effect, name, BIG),
@@ -303,20 +326,6 @@ def effect_instances(call, helpers, tmp_path):
 
 
 @family
-def catalogue(call, helpers, tmp_path):
-    def step():
-        for count_of, entry in (("get_n_tarsel_effects", "get_tarsel_plugin_info_i"),
-                                ("get_n_tarsel_builder_effects", "get_tarsel_builder_info_i")):
-            count = call(count_of)
-            assert count > 0
-            for i in range(count):
-                members(call, "Plugin_Info_", call(entry, i))
-            call.rows((None, entry, count), (None, entry, -1), (OverflowError, entry, BIG))
-
-    return step, [], nothing
-
-
-@family
 def genotypes(call, helpers, tmp_path):
     made_effects, genotypes = engine_genotypes(call)
     collected = []
@@ -327,9 +336,8 @@ def genotypes(call, helpers, tmp_path):
             members(call, "Genotype_", genotype)
             for param in call("Genotype__get_params", genotype)[:3]:
                 call("Genotype_get_param_group_name", genotype, param)
-            call.on("Genotype_", genotype, (TypeError, "get_param_group_name", genotype), (True, "__eq__", genotype),
-                    (NotImplemented, "__ne__", STRANGER))
-            call.rows((ANY, "tarsel_any_nodes_get_flag", genotype, 0x20000),
+            call.rows((TypeError, "Genotype_get_param_group_name", genotype, genotype),
+                      (ANY, "tarsel_any_nodes_get_flag", genotype, 0x20000),
                       (0, "add_param_to_list", genotype, 0, collector),
                       (0, "add_param_to_list", genotype, 10_000, collector))
             info = call("Genotype_effect_info_get", genotype)
@@ -362,6 +370,7 @@ def params(call, helpers, tmp_path):
     bounds = [renderlib.ValueArray() for _ in range(4)]
     pointers = [values.data for values in bounds]
     title, label = text(" " * 255), text("Radius")
+    inputs = [call("Genotype_input_optional_p_get", genotype) for genotype in genotypes]
 
     def step():
         for param in params:
@@ -373,8 +382,7 @@ def params(call, helpers, tmp_path):
                         (ANY, "__getitem__", 0))
             call.on("Param_", param, (ANY, "needs_old_default", 1.0), (ANY, "maybe_set_to_old_default", None, 1.0),
                     (ANY, "maybe_set_to_old_default", None, 1.0, 0), (ANY, "to_string", None),
-                    (ANY, "to_string", None, True), (ANY, "to_string_const", None), (True, "__eq__", param),
-                    (NotImplemented, "__ne__", STRANGER))
+                    (ANY, "to_string", None, True), (ANY, "to_string_const", None))
             call.rows((ANY, "tarsel_param_to_string", param), (ANY, "tarsel_get_param_title", param, 0, title, 256),
                       (ANY, "tarsel_get_fromfile_popup_names", param, None),
                       (ANY, "tarsel_get_param_bounds2", param, 1.0, 0, *pointers, 0))
@@ -394,16 +402,6 @@ def params(call, helpers, tmp_path):
             call.on("Param_", own, (None, "name_set", label), (None, "name_set", None),
                     (OverflowError, "n_channels_set", 256))
             call("delete_Param", own)
-
-    return step, made_effects + params + bounds + pointers + [title, label], lambda: free_all(call, made_effects)
-
-
-@family
-def value_arrays(call, helpers, tmp_path):
-    made_effects, genotypes = engine_genotypes(call, builder_too=False)
-    inputs = [call("Genotype_input_optional_p_get", genotype) for genotype in genotypes]
-
-    def step():
         for cls, value, wrong in ((renderlib.ValueArray, 1.5, 1e39), (renderlib.ShortInputArray, 7, 32768)):
             array, other = construct(call, cls), construct(call, cls)
             call.on(cls.__name__ + "_", array, (bool, "__len__"), (None, "__setitem__", 1, value),
@@ -412,13 +410,14 @@ def value_arrays(call, helpers, tmp_path):
                     (TypeError, "__setitem__", 0, "1"), (ValueError, "data_set", None),
                     (TypeError, "data_set", [value]))
             call(cls.__name__ + "_data_set", other, call(cls.__name__ + "_data_get", array))
-            call("delete_" + cls.__name__, array)
-            call("delete_" + cls.__name__, other)
+            for each in (array, other):
+                call("delete_" + cls.__name__, each)
         for shorts in inputs:
             for i in range(call("ShortInputArray___len__", shorts)):
                 call("ShortInputArray___getitem__", shorts, i)
 
-    return step, made_effects + inputs, lambda: free_all(call, made_effects)
+    return step, made_effects + params + bounds + pointers + inputs + [title, label], \
+        lambda: free_all(call, made_effects)
 
 
 @family
@@ -434,10 +433,10 @@ def raster_descriptors(call, helpers, tmp_path):
         # Neither the record nor the text is given as None to the two record
         # writers: they pass it on to memcpy and strlen unchecked.
         call.rows((None, "T_RasterInfo_pixel_type_set", info, _renderlib.pixel_rgba8),
-                  (200, "make_tarsel_raster_info", info, 10, 5),
-                  (None, "T_RasterInfo_pixel_type_set", info, 27),  # no such layout
-                  (0, "make_tarsel_raster_info", info, 10, 5), (OverflowError, "make_tarsel_raster_info", info, BIG, 5),
-                  (ANY, "tarsel_get_native_image_dims", info), (ANY, "tarsel_get_native_image_dims", None),
+                  (200, "make_tarsel_raster_info", info, 10, 5), (None, "T_RasterInfo_pixel_type_set", info, 27),
+                  (0, "make_tarsel_raster_info", info, 10, 5),  # no such layout as 27
+                  (OverflowError, "make_tarsel_raster_info", info, BIG, 5), (ANY, "tarsel_get_native_image_dims", info),
+                  (ANY, "tarsel_get_native_image_dims", None),
                   (lambda data: len(data) == 104, "raster_info_to_bytearray", info),
                   (None, "make_tarsel_raster_info_from_bits", info, bits),
                   (ValueError, "make_tarsel_raster_info_from_bits", info, short_bits),
@@ -446,10 +445,9 @@ def raster_descriptors(call, helpers, tmp_path):
                   (TypeError, "make_tarsel_raster_info_from_base64", info, 5),
                   (ANY, "base64decode", encoded, decoded_at, 120), (ANY, "base64decode", three, None, 0),
                   (TypeError, "base64decode", three, decoded, 4),
-                  (OverflowError, "base64decode", three, decoded_at, BIG),
-                  (ValueError, "delete_RenderContext", None))
+                  (OverflowError, "base64decode", three, decoded_at, BIG), (ValueError, "delete_RenderContext", None))
         call.on("RenderContext_", first, (True, "__eq__", first), (True, "__ne__", second),
-                (NotImplemented, "__eq__", 3), (ANY, "__hash__"))
+                (NotImplemented, "__eq__", 3), "__hash__")
 
     return step, [bits, short_bits, raw_bits, encoded, three, decoded, decoded_at] + contexts, nothing
 
@@ -462,10 +460,9 @@ def renders(call, helpers, tmp_path):
     source_info, source = effects.raster(_renderlib.pixel_rgba8, 8, 8)
     float_info, _ = effects.raster(_renderlib.pixel_rgbaf, 8, 8)
     array = numpy.zeros((8, 8, 4), numpy.float32)
-    rasters, images = [dest_info, source_info], [None, source]
-    alone, nothing_in, floats = [dest_info], [None], [float_info]
-    wrong_rasters, wrong_images = (dest_info, source_info), [None, 5]
-    other_record = renderlib.T_RenderInfo()
+    rasters, images, alone, nothing_in, floats = [dest_info, source_info], [None, source], [dest_info], [None], \
+        [float_info]
+    wrong_rasters, wrong_images, other_record = (dest_info, source_info), [None, 5], renderlib.T_RenderInfo()
     blurred = render_arguments(blur, dest, rasters, images)
 
     def step():
@@ -486,38 +483,32 @@ def renders(call, helpers, tmp_path):
         lambda: free_all(call, made_effects)
 
 
-def changed(row, at, value):
-    return row[:at] + [value] + row[at + 1:]
-
-
 @family
 def image_services(call, helpers, tmp_path):
     source_info, source = effects.raster(_renderlib.pixel_rgbaf, 2, 1)
     source[:] = numpy.array([0, 0, 0, 1, 1, 1, 1, 1], numpy.float32).tobytes()
     size = _renderlib.tarsel_get_resized_image_size(source_info, 8, 1, 0, 0, 1.0, 0)
-    dest_info, dest = renderlib.T_RasterInfo(), bytearray(size)
-    shown, empty = bytearray(8), text("")
+    dest_info, dest, shown, empty = renderlib.T_RasterInfo(), bytearray(size), bytearray(8), text("")
     effect = call("init_tarsel_effect", text("T_Glow"), False)
     lut = tmp_path / "gamma.lut"
     lut.write_text("\n".join("%.6f" % ((i / 255) ** (1 / 2.2)) for i in range(256)))
     lut_path, missing = text(str(lut)), text(str(tmp_path / "missing.lut"))
     messages = []
     handler = listener(messages)
+    sized = ["tarsel_get_resized_image_size", source_info, 8, 1, 0, 0, 1.0, 0]
     resize = ["tarsel_resize_native_image", source_info, source, 8, 1, 0, 0, 1.0, dest_info, dest, 1, 0.0, 0.0, 0.0]
     convert = ["tarsel_convert_to_bgra_8", None, source_info, source, shown, _renderlib.RGBA_OK, 0, 0, LINEAR, LINEAR]
     comp = ["tarsel_comp_bgra_8", shown, 2, 1, 8, -16711936, 0]
 
     def step():
-        call.rows((size, "tarsel_get_resized_image_size", source_info, 8, 1, 0, 0, 1.0, 0),
-                  (TypeError, "tarsel_get_resized_image_size", source_info, 8, 1, 0, 0, "1", 0),
-                  ([8, 1], *resize), (TypeError, *changed(resize, 9, "d")), (OverflowError, *changed(resize, 3, BIG)),
-                  (ANY, *convert), (ANY, *changed(convert, 1, effect)), (TypeError, *changed(convert, 8, 5)),
+        call.rows((size, *sized), (TypeError, *changed(sized, 6, "1")), ([8, 1], *resize),
+                  (TypeError, *changed(resize, 9, "d")), (OverflowError, *changed(resize, 3, BIG)), (ANY, *convert),
+                  (ANY, *changed(convert, 1, effect)), (TypeError, *changed(convert, 8, 5)),
                   (TypeError, *changed(convert, 3, "pixels")), (ANY, *comp), (TypeError, *changed(comp, 1, "pixels")),
                   (OverflowError, *changed(comp, 5, BIG)), (None, "set_error_handler", handler),
                   (ANY, "set_tarsel_luts", lut_path, empty, 1.0),
                   (ANY, "set_tarsel_luts", missing, empty, 1.0),  # reported to the handler
-                  (None, "set_error_handler", None), (TypeError, "set_tarsel_luts", empty, empty, "1"),
-                  (ANY, "get_ocio_path"))
+                  (None, "set_error_handler", None), (TypeError, "set_tarsel_luts", empty, empty, "1"), "get_ocio_path")
         messages.clear()
 
     def cleanup():
@@ -533,21 +524,18 @@ def flare_textures(call, helpers, tmp_path):
     path = tmp_path / "spot.png"
     png.write_rgba8(path, bytes(8 * 8 * 4), 8, 8)
     spot, missing = text(str(path)), text(str(tmp_path / "missing.png"))
+    register = ["tarsel_register_flare_texture", 2, 2, 4, 1, pixels]
 
     def step():
-        index = call("tarsel_register_flare_texture", 2, 2, 4, 1, pixels)
+        index = call(*register)
         assert index >= 0
-        call.rows((None, "tarsel_get_flare_texture_error"),
-                  (lambda info: info[0] == 0, "tarsel_get_texture_info", index),
+        call.rows((None, "tarsel_get_flare_texture_error"), (lambda got: got[0] == 0, "tarsel_get_texture_info", index),
                   (16, "tarsel_get_texture_pixels", index, out), (TypeError, "tarsel_get_texture_pixels", index, 16),
-                  (TypeError, "tarsel_register_flare_texture", 2, 2, 4, 1, "pixels"),
-                  (TypeError, "tarsel_register_flare_texture", 2, 2, 4.0, 1, pixels),
-                  (OverflowError, "tarsel_register_flare_texture", BIG, 2, 4, 1, pixels),
-                  (lambda i: i >= 0, "tarsel_load_flare_texture", spot),
+                  (TypeError, *changed(register, 5, "pixels")), (TypeError, *changed(register, 3, 4.0)),
+                  (OverflowError, *changed(register, 1, BIG)), (lambda i: i >= 0, "tarsel_load_flare_texture", spot),
                   (lambda i: i < 0, "tarsel_load_flare_texture", missing), (bool, "tarsel_get_flare_texture_error"),
                   (lambda i: i < 0, "tarsel_load_flare_texture", None), (TypeError, "tarsel_load_flare_texture", path),
-                  (None, "tarsel_free_all_flare_textures"),
-                  (lambda info: info[0] != 0, "tarsel_get_texture_info", index),
+                  (None, "tarsel_free_all_flare_textures"), (lambda got: got[0] != 0, "tarsel_get_texture_info", index),
                   (lambda n: n < 0, "tarsel_get_texture_pixels", index, wrong_out),
                   (OverflowError, "tarsel_get_texture_info", BIG))
 
@@ -555,8 +543,8 @@ def flare_textures(call, helpers, tmp_path):
 
 
 def director_lifetimes(call, cls, *args):
-    """An object of `cls` made as its proxy class makes one, and another handed
-    over to the native side and deleted there: the first is returned."""
+    # An object of `cls` made as its proxy class makes one, and another handed
+    # over to the native side and deleted there: the first is returned.
     base = next(c.__name__ for c in cls.__mro__ if c.__module__ == "renderlib")
     fresh = cls.__new__(cls)
     call(base + "_swiginit", fresh, call("new_" + base, fresh))
@@ -578,19 +566,15 @@ QuietDrawing = type("QuietDrawing", (renderlib.GfxInterface,), dict(
     get_text_length_in_pixels=lambda self, text: 6 * len(text)))
 
 
-class WrongResult(QuietDrawing):
-    def get_text_length_in_pixels(self, text):
-        return "wide"
-
-
-class RaisingDrawing(QuietDrawing):
-    def circle(self, x, y, r):
-        raise KeyError("the host's own error")
+def raise_key_error(self, *args):
+    raise KeyError("the host's own error")
 
 
 @family
 def drawing_callbacks(call, helpers, tmp_path):
-    drawing, wrong, raising = QuietDrawing(), WrongResult(), RaisingDrawing()
+    drawing = QuietDrawing()
+    wrong = type("WrongResult", (QuietDrawing,), {"get_text_length_in_pixels": lambda self, text: "wide"})()
+    raising = type("RaisingDrawing", (QuietDrawing,), {"circle": raise_key_error})()
     xs, ys = renderlib.float_vector([1, 2]), renderlib.float_vector([3, 4])
     flare = call("init_tarsel_effect", text("T_LensFlare"), False)
     words, empty = text("abcd"), text("")
@@ -600,6 +584,8 @@ def drawing_callbacks(call, helpers, tmp_path):
              ("stipple_on",), ("stipple_off",), ("stipple_pattern", 0xF0F0), ("line_width", 2.0), ("flush",),
              ("circle", 1, 2, 3), ("dot", 1, 2, 3), ("rect_filled", 1, 2, 3, 4), ("draw_text", words, 5, 6),
              ("get_text_length_in_pixels", words)]
+    draw, mouse = ["tarsel_widget_draw", flare, empty, *VIEW, values], \
+        ["tarsel_widget_mouse_event", flare, empty, *VIEW, values, 10, 10, _renderlib.MouseEventType_PRESS]
 
     def step():
         call.on("GfxInterface_", drawing.this, *[(ANY, *each) for each in calls],
@@ -612,12 +598,10 @@ def drawing_callbacks(call, helpers, tmp_path):
         fresh = director_lifetimes(call, QuietDrawing)
         call("GfxInterface_flush", fresh.this)
         del fresh
-        call.rows((None, "tarsel_set_gfx_impl", drawing), (ANY, "tarsel_widget_draw", flare, empty, *VIEW, values),
-                  (ANY, "tarsel_widget_draw", flare, empty, *VIEW, short_values),
-                  (ANY, "tarsel_widget_mouse_event", flare, empty, *VIEW, values, 10, 10, MouseEventType_PRESS),
-                  (ANY, "tarsel_widget_mouse_event", flare, empty, *VIEW, short_values, 10, 10, MouseEventType_DRAG),
-                  (None, "tarsel_set_gfx_impl", None), (TypeError, "tarsel_widget_draw", flare, empty, *VIEW, 5),
-                  (OverflowError, "tarsel_widget_mouse_event", flare, empty, *VIEW, values, BIG, 10, 0))
+        call.rows((None, "tarsel_set_gfx_impl", drawing), (ANY, *draw), (ANY, *changed(draw, 9, short_values)),
+                  (ANY, *mouse), (ANY, *changed(changed(mouse, 9, short_values), 12, _renderlib.MouseEventType_DRAG)),
+                  (None, "tarsel_set_gfx_impl", None), (TypeError, *changed(draw, 9, 5)),
+                  (OverflowError, *changed(mouse, 10, BIG)))
 
     def cleanup():
         _renderlib.tarsel_set_gfx_impl(None)
@@ -692,10 +676,9 @@ def engine_controls(call, helpers, tmp_path):
         call("get_tarsel_version_info")
         ENGINE.set_version_text(b"engine \xff\xfe")
         call.rows((None, "set_error_handler", None), (None, "tarsel_free_all_stamp_collections"),
-                  (ANY, "tarsel_shutdown_apps"), (ANY, "get_tarsel_version_info"), (ANY, "ext_build_id"),
-                  (ANY, "get_tarsel_build_id"), (True, "check_build_id"), (True, "check_user", me),
-                  (False, "check_user", someone), (False, "check_user", None),
-                  *[(ANY, "shmem_error_to_string", error) for error in range(7)],
+                  "tarsel_shutdown_apps", "get_tarsel_version_info", "ext_build_id", "get_tarsel_build_id",
+                  (True, "check_build_id"), (True, "check_user", me), (False, "check_user", someone),
+                  (False, "check_user", None), *[(ANY, "shmem_error_to_string", error) for error in range(7)],
                   (OverflowError, "shmem_error_to_string", BIG), (ANY, "SWIG_PyInstanceMethod_New", draw_nothing))
         ENGINE.set_version_text(None)
         heard.clear()
@@ -714,33 +697,31 @@ def shared_memory(call, helpers, tmp_path):
     message, payload, sixteen = text("a message"), bytes(range(100)), bytes(range(16))
     note, oversized, size = text("leak check"), 1 << 20, 1 << 16
     readers = [("read_pybuf",), ("try_read_pybuf",), ("timed_read_pybuf", 1.0), ("read_pybuf_and_retry", 1.0)]
+    t = "ShmemTransport_"
 
     def step():
         server, client = call("ShmemManager_serve", name, size, size), call("ShmemManager_connect", name)
         assert server is not None and client is not None
-        call.on("ShmemTransport_", server, (bool, "write_string", message), (bool, "write_string", message, note),
+        call.on(t, server, (bool, "write_string", message), (bool, "write_string", message, note),
                 (bool, "try_write_string", message), (bool, "timed_write_string", message, 1.0, note),
                 (bool, "write_pybuf", payload), (bool, "try_write_pybuf", payload, note),
                 (bool, "timed_write_pybuf", payload, 1.0))
         for reserve, *extra in (("reserve_pybuf",), ("try_reserve_pybuf",), ("timed_reserve_pybuf", 1.0)):
-            view = call("ShmemTransport_" + reserve, server, 16, *extra, note)
+            view = call(t + reserve, server, 16, *extra, note)
             view[:] = sixteen
             del view
-            assert call("ShmemTransport_commit", server)
+            assert call(t + "commit", server)
         for i in range(10):
-            header = call("ShmemTransport_get_msg_header", client)
+            header = call(t + "get_msg_header", client)
             members(call, "MessageHeader_t_", header)
             reader, *extra = readers[i % len(readers)]
-            view = call("ShmemTransport_" + reader, client, *extra)
-            assert view is not None, reader
-            bytes(view)
-            del view, header
-        call.on("ShmemTransport_", client, (None, "try_read_pybuf"), (None, "timed_read_pybuf", 0.0),
-                (None, "get_msg_header"), (bool, "is_segment_valid"), (TypeError, "timed_read_pybuf", "1"),
+            bytes(call(t + reader, client, *extra))
+            del header
+        call.on(t, client, (None, "try_read_pybuf"), (None, "timed_read_pybuf", 0.0), (None, "get_msg_header"),
+                (bool, "is_segment_valid"), (TypeError, "timed_read_pybuf", "1"),
                 (lambda error: error != _renderlib.ShmemError_SHMEM_NO_ERROR, "get_last_error"))
-        call.on("ShmemTransport_", server, (None, "try_reserve_pybuf", oversized),
-                (operator.not_, "try_write_pybuf", bytes(oversized)), (bool, "client_pid_exists"),
-                (ANY, "print_stats"), (ANY, "get_server_pid"),
+        call.on(t, server, (None, "try_reserve_pybuf", oversized), (operator.not_, "try_write_pybuf", bytes(oversized)),
+                (bool, "client_pid_exists"), "print_stats", "get_server_pid",
                 # A message without the buffer protocol: a SystemError caused by the TypeError.
                 (SystemError, "write_pybuf", STRANGER), (SystemError, "try_write_pybuf", 5),
                 (SystemError, "timed_write_pybuf", message, 1.0), (TypeError, "write_string", 5),
@@ -749,13 +730,13 @@ def shared_memory(call, helpers, tmp_path):
                   (None, "ShmemManager_serve", other, 16, 16),  # queues too small
                   (None, "ShmemManager_serve", bad, size, size), (None, "ShmemManager_connect", missing),
                   (None, "ShmemManager_connect", None), (OverflowError, "ShmemManager_serve", other, -1, 1),
-                  (TypeError, "ShmemManager_reset_all", 1), (bool, "ShmemTransport_remove", server))
+                  (TypeError, "ShmemManager_reset_all", 1), (bool, t + "remove", server))
         client.this.disown()
         call.rows((None, "free_tarsel_ipc_shmemtransport", client), (None, "free_tarsel_ipc_shmemtransport", None),
                   (None, "delete_ShmemTransport", server), (None, "ShmemManager_reset", name),
                   (None, "ShmemManager_reset", name, True), (None, "ShmemManager_reset", missing, True),
                   (None, "ShmemManager_reset_all"), (None, "ShmemManager_reset_all", False))
-        assert call("ShmemTransport_remove", call("ShmemManager_serve", name, size, size))  # freed by its proxy
+        assert call(t + "remove", call("ShmemManager_serve", name, size, size))  # freed by its proxy
 
     def cleanup():
         for segment in (name, other):
@@ -764,58 +745,43 @@ def shared_memory(call, helpers, tmp_path):
     return step, [name, other, missing, bad, message, payload, sixteen, note], cleanup
 
 
-@contextlib.contextmanager
-def switched(switch):
-    """One of the monitor library's fault switches, on for the block."""
-    switch(1)
-    try:
-        yield
-    finally:
-        switch(0)
-
-
 @family
 def monitor(call, helpers, tmp_path):
     preview, nowhere, mode = text("preview"), text("nowhere"), text("640x360p25")
     pixels, frame_name, frame = bytearray(8 * 4 * 4), text("leak check"), bytearray(640 * 360 * 4)
     none, not_found = _renderlib.EM_errorNone, _renderlib.EM_errorNotFound
-
-    def wrap(display, *changes):
-        arguments = ["EM_Display_EM_XIImageWrapper", display, pixels, 8, 4, 32, frame_name, False,
-                     _renderlib.EM_ImageFormat_32BitIntBGRA, 1.0, 2.2, False, True]
-        for at, value in changes:
-            arguments[at + 1] = value
-        return arguments
+    d = "EM_Display_"
 
     def step():
         display = call("EM_DisplayInit")
-        image = call(*wrap(display))
-        call.on("EM_Display_", display, (bool, "devices"), (bool, "device_modes", preview),
-                ([], "device_modes", nowhere),
+        wrap = [d + "EM_XIImageWrapper", display, pixels, 8, 4, 32, frame_name, False,
+                _renderlib.EM_ImageFormat_32BitIntBGRA, 1.0, 2.2, False, True]
+        image = call(*wrap)
+        call.on(d, display, (bool, "devices"), (bool, "device_modes", preview), ([], "device_modes", nowhere),
                 (none, "connect", preview, mode), (640, "get_width", preview), (360, "get_height", preview),
                 # A frame not of the connected mode's size is refused.
                 (lambda error: error != none, "display_frame", preview, image),
                 (not_found, "display_frame", nowhere, image))
         call.on("EM_XIImage_", image, (8, "getWidth"), (4, "getHeight"), (32, "getRowBytes"), (2, "addRef"),
                 (1, "removeRef"))
-        assert call("EM_Display_display_frame", display, preview,
-                    call(*wrap(display, (1, frame), (2, 640), (3, 360), (4, 640 * 4)))) == none
+        whole = call(*wrap[:2], frame, 640, 360, 640 * 4, *wrap[6:])
+        assert call(d + "display_frame", display, preview, whole) == none
+        del whole
         call("delete_EM_XIImage", image)
         call.fails(ValueError, "EM_XIImage_getWidth", image)  # its last reference went
-        call(*wrap(display, (5, None)))  # the proxy gives its reference back
-        call.rows((TypeError, *wrap(display, (1, "pixels"))), (TypeError, *wrap(display, (6, 1))),
-                  (OverflowError, *wrap(display, (2, BIG))), (TypeError, "EM_XIImage_addRef", display))
-        call.on("EM_Display_", display, (_renderlib.EM_errorParam, "connect", None, mode),
-                (not_found, "connect", nowhere, mode), (TypeError, "connect", preview, 5),
-                (none, "disconnect", preview), (0, "get_width", preview))
+        call(*changed(wrap, 6, None))  # the proxy gives its reference back
+        call.rows((TypeError, *changed(wrap, 2, "pixels")), (TypeError, *changed(wrap, 7, 1)),
+                  (OverflowError, *changed(wrap, 3, BIG)), (TypeError, "EM_XIImage_addRef", display))
+        call.on(d, display, (_renderlib.EM_errorParam, "connect", None, mode), (not_found, "connect", nowhere, mode),
+                (TypeError, "connect", preview, 5), (none, "disconnect", preview), (0, "get_width", preview))
         call.rows((None, "release_external_monitor", display),
                   (ValueError, "release_external_monitor", display),  # released already
-                  (ValueError, "EM_Display_devices", display))
+                  (ValueError, d + "devices", display))
         with switched(MONITOR.qrv_probe_set_init_fails):
             assert call("EM_DisplayInit") is None
         with switched(MONITOR.qrv_probe_set_no_devices):
             bare = call("EM_DisplayInit")
-        call.on("EM_Display_", bare, ([], "devices"), (not_found, "connect", preview, mode))
+        call.on(d, bare, ([], "devices"), (not_found, "connect", preview, mode))
         call("release_external_monitor", bare)
 
     return step, [preview, nowhere, mode, pixels, frame_name, frame], nothing
@@ -830,7 +796,7 @@ def vector_calls(call, kind, first, second):
         call("delete_" + kind, construct(call, cls, *arguments))
     call.rows((TypeError, "new_" + kind, STRANGER), ((OverflowError, TypeError), "new_" + kind, -1))
     call.on(p, vector, (3, "__len__"), (3, "size"), (True, "__bool__"), (True, "__nonzero__"), (False, "empty"),
-            (ANY, "get_allocator"), (ANY, "reserve", 8), (lambda n: n >= 8, "capacity"), (ANY, "append", second),
+            "get_allocator", (ANY, "reserve", 8), (lambda n: n >= 8, "capacity"), (ANY, "append", second),
             (ANY, "push_back", first), (ANY, "__getitem__", 0), (ANY, "__getitem__", -1),
             (ANY, "__getitem__", slice(0, 2)), (IndexError, "__getitem__", 99), (TypeError, "__getitem__", "0"),
             (ANY, "__setitem__", 0, second), (ANY, "__setitem__", slice(0, 1), [first]),
@@ -840,14 +806,14 @@ def vector_calls(call, kind, first, second):
             (ANY, "__setslice__", 0, 1, [second]), (ANY, "__setslice__", 0, 1), (ANY, "__delslice__", 0, 1),
             # back, front and pop_back are only ever called on a vector that
             # has elements: on an empty one they read or free what is not there.
-            (ANY, "append", first), (ANY, "append", second), (ANY, "append", first), (lambda n: n >= 3, "size"),
-            (ANY, "back"), (ANY, "front"), (ANY, "pop"), (ANY, "pop_back"), (ANY, "assign", 3, second),
-            (ANY, "resize", 4), (ANY, "resize", 5, first), (TypeError, "resize", 5, STRANGER))
+            (ANY, "append", first), (ANY, "append", second), (ANY, "append", first), (lambda n: n >= 3, "size"), "back",
+            "front", "pop", "pop_back", (ANY, "assign", 3, second), (ANY, "resize", 4), (ANY, "resize", 5, first),
+            (TypeError, "resize", 5, STRANGER))
     at = call(p + "insert", vector, call(p + "begin", vector), first)
     call(p + "insert", vector, at, 2, second)
     call(p + "erase", vector, call(p + "begin", vector))
     call(p + "erase", vector, call(p + "begin", vector), call(p + "end", vector))
-    call.on(p, vector, (ANY, "rbegin"), (ANY, "rend"), (ANY, "swap", other), (TypeError, "swap", STRANGER))
+    call.on(p, vector, "rbegin", "rend", (ANY, "swap", other), (TypeError, "swap", STRANGER))
     iterate(call, p, three)
     call.on(p, vector, (None, "clear"), (IndexError, "pop"), (TypeError, "append", STRANGER))
     for each in (three, other, vector):
@@ -858,10 +824,9 @@ def iterate(call, prefix, sequence):
     """Every wrapper of SWIG's iterator, over a sequence of three."""
     begin, also_begin, end, closed = (call(prefix + name, sequence) for name in ("begin", "begin", "end", "iterator"))
     p = "SwigPyIterator_"
-    call.on(p, begin, (ANY, "value"), (ANY, "incr"), (ANY, "incr", 1), (ANY, "decr"), (ANY, "decr", 1),
-            (ANY, "distance", end), (True, "equal", also_begin), (True, "__eq__", also_begin),
-            (False, "__ne__", also_begin), (NotImplemented, "__eq__", STRANGER), (ANY, "next"), (ANY, "__next__"),
-            (ANY, "previous"), (ANY, "decr"))
+    call.on(p, begin, "value", "incr", (ANY, "incr", 1), "decr", (ANY, "decr", 1), (ANY, "distance", end),
+            (True, "equal", also_begin), (True, "__eq__", also_begin), (False, "__ne__", also_begin),
+            (NotImplemented, "__eq__", STRANGER), "next", "__next__", "previous", "decr")
     copy = call(p + "copy", begin)
     call.rows((ANY, p + "value", copy), (ANY, p + "advance", begin, 1))
     # The in-place operators hand the iterator over to their result (as
@@ -871,8 +836,8 @@ def iterate(call, prefix, sequence):
     call.rows((ANY, p + "__sub__", end, begin))
     call.on(p, begin, (ANY, "__add__", 1), (TypeError, "distance", STRANGER), (TypeError, "advance", "1"))
     # A closed iterator: nothing before its start, three steps, then the end.
-    call.on(p, closed, (StopIteration, "previous"), (ANY, "__next__"), (ANY, "__next__"), (ANY, "__next__"),
-            (StopIteration, "__next__"), (StopIteration, "__next__"), (StopIteration, "value"))
+    call.on(p, closed, (StopIteration, "previous"), "__next__", "__next__", "__next__", (StopIteration, "__next__"),
+            (StopIteration, "__next__"), (StopIteration, "value"))
     call("delete_SwigPyIterator", copy)
 
 
@@ -883,17 +848,20 @@ def containers(call, helpers, tmp_path):
     elements = {"bool_vector": (True, False), "float_vector": (1.5, 2.5), "string_vector": (text("ab"), text("cd")),
                 "genotype_vector": (genotypes[0], None), "param_vector": (param, None)}
     key, other_key, missing = text("radius"), text("center"), text("missing")
-    values = [2.5, 1.0]
-    numbers = renderlib.float_vector([1.0, 2.0, 3.0])
+    values, numbers = [2.5, 1.0], renderlib.float_vector([1.0, 2.0, 3.0])
     p = "value_map_"
+    # Lists whose first element converts and a later one does not: the
+    # container made for the conversion is freed when it gives up.
+    flare, empty, floats = call("init_tarsel_effect", text("T_LensFlare"), False), text(""), [1.0, STRANGER]
+    kept = renderlib.value_map()
+    refused = {kind: [first, STRANGER] for kind, (first, _) in elements.items()}
 
     def step():
         for kind, (first, second) in elements.items():
             vector_calls(call, kind, first, second)
         mapping = construct(call, renderlib.value_map)
-        call.on(p, mapping, (None, "__setitem__", key, values),
-                (None, "__setitem__", other_key, renderlib.float_vector(values)),
-                (None, "__setitem__", missing, values))
+        call.on(p, mapping, (None, "__setitem__", key, values), (None, "__setitem__", missing, values),
+                (None, "__setitem__", other_key, renderlib.float_vector(values)))
         iterate(call, p, mapping)
         call(p + "__setitem__", mapping, missing)  # without a value: removes the key
         copy = construct(call, renderlib.value_map, mapping)
@@ -903,44 +871,28 @@ def containers(call, helpers, tmp_path):
                 ((2.5, 1.0), "__getitem__", key), (IndexError, "__getitem__", missing), (True, "__contains__", key),
                 (True, "has_key", key), (TypeError, "__contains__", 5), (1, "count", key), (2, "__len__"), (2, "size"),
                 (True, "__bool__"), (True, "__nonzero__"), (False, "empty"), (ANY, "lower_bound", key),
-                (ANY, "upper_bound", key), *[(ANY, name) for name in ("keys", "values", "items", "asdict",
-                                                                     "key_iterator", "value_iterator", "rbegin",
-                                                                     "rend", "end", "get_allocator")])
+                (ANY, "upper_bound", key),
+                "keys", "values", "items", "asdict", "end", "key_iterator", "value_iterator", "rbegin", "rend",
+                "get_allocator")
         call(p + "erase", mapping, call(p + "find", mapping, key))
         call.on(p, mapping, (1, "erase", other_key), (IndexError, "__delitem__", missing), (ANY, "swap", copy))
         call(p + "erase", mapping, call(p + "begin", mapping), call(p + "end", mapping))
-        call.on(p, mapping, (TypeError, "swap", STRANGER), (ANY, "clear"))
+        call.on(p, mapping, (TypeError, "swap", STRANGER), "clear")
         call.rows((None, "delete_value_map", copy), (None, "delete_value_map", mapping),
                   # `iterator - n` and `iterator + n` past either end make a
                   # copy and then stop: the copy is freed.
                   (ANY, "SwigPyIterator___sub__", numbers.end(), 1),
                   (ANY, "SwigPyIterator___sub__", numbers.begin(), 1),
-                  (ANY, "SwigPyIterator___add__", numbers.begin(), 5))
-
-    return step, made_effects + [param, key, other_key, missing, values, numbers] + \
-        [e for pair in elements.values() for e in pair], lambda: free_all(call, made_effects)
-
-
-@family
-def sequences_refused_midway(call, helpers, tmp_path):
-    # A list whose first element converts and a later one does not: the
-    # container made for the conversion is freed when it gives up.
-    flare = call("init_tarsel_effect", text("T_LensFlare"), False)
-    empty, key = text(""), text("radius")
-    mapping = renderlib.value_map()
-    lists = {kind: [first, STRANGER] for kind, first in (("bool_vector", True), ("float_vector", 1.0),
-                                                         ("string_vector", key), ("genotype_vector", None),
-                                                         ("param_vector", None))}
-    floats = [1.0, STRANGER]
-
-    def step():
-        call.rows((TypeError, "tarsel_widget_draw", flare, empty, *VIEW, floats),
+                  (ANY, "SwigPyIterator___add__", numbers.begin(), 5),
+                  (TypeError, "tarsel_widget_draw", flare, empty, *VIEW, floats),
                   (TypeError, "tarsel_widget_mouse_event", flare, empty, *VIEW, floats, 10, 10, 0),
-                  (TypeError, "value_map___setitem__", mapping, key, floats),
+                  (TypeError, "value_map___setitem__", kept, key, floats),
                   (TypeError, "new_value_map", {"radius": [1.0], "size": floats}),
-                  *[(TypeError, "new_" + kind, elements) for kind, elements in lists.items()])
+                  *[(TypeError, "new_" + kind, items) for kind, items in refused.items()])
 
-    return step, [flare, empty, key, mapping, floats] + list(lists.values()), lambda: call("free_tarsel_effect", flare)
+    return step, made_effects + [param, key, other_key, missing, values, numbers, flare, empty, floats, kept] + \
+        list(refused.values()) + [e for pair in elements.values() for e in pair], \
+        lambda: free_all(call, made_effects + [flare])
 
 
 @family
@@ -956,18 +908,18 @@ def argument_errors(call, helpers, tmp_path):
     takes_anything = {"SWIG_PyInstanceMethod_New", "new_GfxInterface", "new_LoadFrameInterface"}
     unsafe_with_none = {"make_tarsel_raster_info_from_base64", "make_tarsel_raster_info_from_bits",
                         "raster_info_to_bytearray"}
-    functions = [name for name in module_functions() if name not in NOT_EXERCISED]
     # SWIG's overload dispatch of this operator answers three arguments with
     # NotImplemented while leaving its TypeError set (a SystemError results).
     no_extra_argument = {"SwigPyIterator___sub__"}
+    functions = [name for name in module_functions() if name not in NOT_EXERCISED]
 
     def expect(name, arguments, anything=False):
         try:
             result = call(name, *arguments)
         except refused:
             return
-        if not (anything or (name.endswith(operators) and result is NotImplemented)):
-            raise AssertionError("%s%r gave %r" % (name, tuple(arguments), result))
+        assert anything or (name.endswith(operators) and result is NotImplemented), \
+            "%s%r gave %r" % (name, tuple(arguments), result)
 
     def step():
         for name in functions:
@@ -998,62 +950,54 @@ def shared_constant(item):
         (type(item) is str and len(item) < 2)
 
 
+# Interpreter blocks, C heap bytes and resident KiB in use. A full collection
+# empties the interpreter's free lists. The method cache is emptied too: each
+# of its 4096 entries keeps the name last looked up through it, and a name
+# made for one lookup ("prefix" + "name" here, or a director's method name,
+# which SWIG's director calls make afresh on each call) lands in the slot of
+# its own address, so the cache holds more of them as the heap shifts, up to
+# its size, without any leak.
 def memory():
-    """Interpreter blocks, C heap bytes and resident KiB in use. A full
-    collection empties the interpreter's free lists. The method cache is
-    emptied too: each of its 4096 entries keeps the name last looked up
-    through it, and a name made for one lookup ("prefix" + "name" here,
-    a director's method name, which SWIG's director calls make afresh on
-    each call) lands in a slot of its own address, so the cache holds more
-    of them as the heap shifts, up to its size, without any leak."""
     gc.collect()
     sys._clear_type_cache()
     return sys.getallocatedblocks(), heap_in_use(), resident_kib()
 
 
+# Runs a family WARM_UP rounds, which fill the engine's and the interpreter's
+# caches and pools, then two stretches of ROUNDS rounds. A leak grows memory
+# in both stretches alike; the interpreter's own one-off growth (a table that
+# doubles) shows in one only.
 def check_flat(name, make, helpers, tmp_path):
-    """Runs family `name` WARM_UP rounds, which fill the engine's and the
-    interpreter's caches and pools, then two stretches of ROUNDS rounds. A
-    leak grows memory in both stretches alike; the interpreter's own
-    one-off growth (a table that doubles) shows in one only."""
     _renderlib.tarsel_free_all_stamp_collections()
     before = live_objects()
     call = Calls()
     step, watched, cleanup = make(call, helpers, tmp_path)
     watched = [item for item in watched if not shared_constant(item)]
-
-    def one_round():
-        step()
-        MONITOR.qrv_probe_clear_calls()  # the library's call log has no switch to pause it
+    def run(rounds):
+        for _ in range(rounds):
+            step()
+            MONITOR.qrv_probe_clear_calls()  # the library's call log has no switch to pause it
+        return memory()
 
     try:
-        for _ in range(WARM_UP):
-            one_round()
-        references = [sys.getrefcount(item) for item in watched]
-        live = live_objects()
-        growth = []
-        start = memory()
-        for _ in range(2):
-            for _ in range(ROUNDS):
-                one_round()
-            end = memory()
-            growth.append([later - earlier for later, earlier in zip(end, start)])
-            start = end
+        run(WARM_UP)
+        references, live = [sys.getrefcount(item) for item in watched], live_objects()
+        start, middle, end = memory(), run(ROUNDS), run(ROUNDS)
         after = [sys.getrefcount(item) for item in watched]
         moved = ["%s %.60r: %+d" % (type(item).__name__, item, now - then)
                  for item, then, now in zip(watched, references, after) if now != then]
         assert moved == [], "%s: references gained or lost over %d rounds: %s" % (name, 2 * ROUNDS, moved)
         assert live_objects() == live, "%s: engine or monitor objects left alive" % name
-        if MEASURE_MEMORY:
-            (blocks, heap, rss), (more_blocks, more_heap, more_rss) = growth
-            # A leak of one object, or of one small block of the C heap (32
-            # bytes), a round shows as ROUNDS blocks or ROUNDS * 32 bytes a stretch.
-            assert min(blocks, more_blocks) < ROUNDS // 2, \
-                "%s: %d and %d interpreter blocks more in %d rounds" % (name, blocks, more_blocks, ROUNDS)
-            assert min(heap, more_heap) < ROUNDS * 16, \
-                "%s: the C heap grew by %d and %d bytes in %d rounds" % (name, heap, more_heap, ROUNDS)
-            assert rss + more_rss < 1024, \
-                "%s: resident memory grew by %d KiB in %d rounds" % (name, rss + more_rss, 2 * ROUNDS)
+        (blocks, heap, rss), (more_blocks, more_heap, more_rss) = [
+            [b - a for a, b in zip(earlier, later)] for earlier, later in ((start, middle), (middle, end))]
+        # A leak of one object, or of one small block of the C heap (32 bytes),
+        # a round shows as ROUNDS blocks or ROUNDS * 32 bytes a stretch.
+        assert not MEASURE_MEMORY or min(blocks, more_blocks) < ROUNDS // 2, \
+            "%s: %d and %d interpreter blocks more in %d rounds" % (name, blocks, more_blocks, ROUNDS)
+        assert not MEASURE_MEMORY or min(heap, more_heap) < ROUNDS * 16, \
+            "%s: the C heap grew by %d and %d bytes in %d rounds" % (name, heap, more_heap, ROUNDS)
+        assert not MEASURE_MEMORY or rss + more_rss < 1024, \
+            "%s: resident memory grew by %d KiB in %d rounds" % (name, rss + more_rss, 2 * ROUNDS)
     finally:
         cleanup()
         ENGINE.abort_next_call(False)
@@ -1080,21 +1024,19 @@ def test_a_family_of_wrappers_leaks_nothing(name, shared_registry, tmp_path):
 
 
 def test_every_wrapper_is_exercised(shared_registry, tmp_path):
-    """Each function of the module has cases of its own in a family; the
-    sweep of argument_errors, which calls every function alike, does not
-    count."""
+    # Each function of the module has cases of its own in a family; the sweep
+    # of argument_errors, which calls every function alike, does not count.
     exercised = set()
     for name, make in FAMILIES.items():
-        if name == "argument_errors":
-            continue
-        call = Calls()
-        (tmp_path / name).mkdir()
-        step, watched, cleanup = make(call, shared_registry, tmp_path / name)
-        try:
-            step()
-        finally:
-            cleanup()
-        exercised |= call.names
+        if name != "argument_errors":
+            call = Calls()
+            (tmp_path / name).mkdir()
+            step, watched, cleanup = make(call, shared_registry, tmp_path / name)
+            try:
+                step()
+            finally:
+                cleanup()
+            exercised |= call.names
     functions = set(module_functions())
     assert exercised - functions == set()
     assert NOT_EXERCISED and all(isinstance(getattr(renderlib, name[:-len("_swigregister")], None), type)

@@ -100,13 +100,6 @@ def test_every_engine_call_is_guarded(probe, call):
     assert not probe.abort_armed()
 
 
-def test_abort_request_is_set_and_cleared_by_the_engine(probe):
-    _renderlib.tarsel_abort_render()
-    assert probe.abort_requested()
-    _renderlib.tarsel_clear_abort()
-    assert not probe.abort_requested()
-
-
 def test_a_handler_exception_surfaces_from_the_call_whatever_it_returns():
     """Each call raises SystemError caused by the handler's exception, as the
     interpreter reports a result returned with an exception set. A fresh

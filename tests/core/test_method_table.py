@@ -34,18 +34,13 @@ class PyCFunctionObjectPrefix(ctypes.Structure):
 
 def read_list(path=LIST_FILE):
     """The hand-written list: {name: convention}."""
-    entries, problems = {}, []
+    entries = {}
     for number, line in enumerate(path.read_text(encoding="utf-8").splitlines(), 1):
         fields = line.split()
-        if not fields or fields[0].startswith("#"):
-            continue
-        if len(fields) != 2 or fields[1] not in CONVENTIONS.values():
-            problems.append(f"line {number}: {line!r}")
-        elif fields[0] in entries:
-            problems.append(f"line {number}: {fields[0]} listed twice")
-        else:
+        if fields and not fields[0].startswith("#"):
+            assert len(fields) == 2 and fields[1] in CONVENTIONS.values() and fields[0] not in entries, \
+                f"{path.name} line {number} is malformed or names a function twice: {line!r}"
             entries[fields[0]] = fields[1]
-    assert not problems, f"{path.name} is malformed:\n  " + "\n  ".join(problems)
     return entries
 
 
@@ -87,17 +82,13 @@ def table():
 
 
 def test_the_module_s_table_equals_the_list(table):
-    expected, seen = read_list(), {}
-    for name, convention in table:
-        seen.setdefault(name, []).append(convention)
-    report = {
-        "in the list, missing from the module": sorted(set(expected) - set(seen)),
-        "in the module, not in the list": sorted(set(seen) - set(expected)),
-        "wrong calling convention": sorted(f"{name}: listed {expected[name]}, module has {seen[name][0]}"
-                                           for name in set(expected) & set(seen) if expected[name] != seen[name][0]),
-        "in the module's table more than once": sorted(name for name, found in seen.items() if len(found) > 1),
-    }
-    report = [f"{title} ({len(names)}):\n    " + "\n    ".join(names) for title, names in report.items() if names]
+    listed, found, names = read_list(), dict(table), [name for name, _ in table]
+    report = {"in the list, missing from the module": set(listed) - set(found),
+              "in the module, not in the list": set(found) - set(listed),
+              "wrong calling convention": {f"{name}: listed {listed[name]}, module has {found[name]}"
+                                           for name in set(listed) & set(found) if listed[name] != found[name]},
+              "in the module's table more than once": {name for name in names if names.count(name) > 1}}
+    report = [f"{title} ({len(found)}):\n    " + "\n    ".join(sorted(found)) for title, found in report.items() if found]
     assert not report, "_renderlib's method table differs from method_table.txt:\n  " + "\n  ".join(report)
 
 

@@ -6,7 +6,6 @@ objects come back to their counts. A function added to the module without a
 case here fails test_every_wrapper_is_exercised."""
 import ast
 import base64
-import contextlib
 import ctypes
 import functools
 import gc
@@ -95,11 +94,9 @@ class MallInfo2(ctypes.Structure):
                 "arena ordblks smblks hblks hblkhd usmblks fsmblks uordblks fordblks keepcost".split()]
 
 
-try:
-    mallinfo2 = ctypes.CDLL(None).mallinfo2  # glibc 2.33 and later
+mallinfo2 = getattr(ctypes.CDLL(None), "mallinfo2", None)  # glibc 2.33 and later
+if mallinfo2:
     mallinfo2.restype = MallInfo2
-except (AttributeError, OSError, TypeError):
-    mallinfo2 = None
 
 
 def heap_in_use():
@@ -117,16 +114,6 @@ MONITOR.qrv_probe_set_init_fails.argtypes = MONITOR.qrv_probe_set_no_devices.arg
 def live_objects():
     return {"instances": ENGINE.live_instances(), "params": ENGINE.live_params(), "stamps": ENGINE.stamp_count(),
             "displays+images": (MONITOR.qrv_probe_live_displays(), MONITOR.qrv_probe_live_images())}
-
-
-@contextlib.contextmanager
-def switched(switch):
-    """One of the monitor library's fault switches, on for the block."""
-    switch(1)
-    try:
-        yield
-    finally:
-        switch(0)
 
 
 # --- Calling by name ---------------------------------------------------------
@@ -167,6 +154,18 @@ class Calls:
                 result == want
             assert want is ANY or (want(result) if callable(want) else same), \
                 "%s%.200r gave %.200r, not %.200r" % (name, tuple(args), result, want)
+            # The same call with a stranger in each later place is refused once
+            # the arguments before it are converted (and must leak nothing).
+            for at in range(1, len(args)):
+                try:
+                    result = self(name, *args[:at], STRANGER, *args[at + 1:])
+                except (TypeError, ValueError, OverflowError, SystemError):
+                    continue
+                assert result is NotImplemented, "%s took a stranger as argument %d" % (name, at + 1)
+
+    def each(self, name, *rows):
+        """rows(), each row (want, *arguments) a call of `name`."""
+        self.rows(*[(want, name, *args) for want, *args in rows])
 
     def on(self, prefix, obj, *rows):
         """rows(), each row (want, member, *arguments) a call of `<prefix>member` on `obj`."""
@@ -208,7 +207,7 @@ def members(call, prefix, obj, write=True, keep=()):
         value = call(name, obj)
         setter = name[:-len("get")] + "set"
         if write and name.endswith("_get") and hasattr(_renderlib, setter) and setter not in keep:
-            call.rows((None, setter, obj, value), (TypeError, setter, obj, STRANGER))
+            call.rows((None, setter, obj, value))
             if isinstance(value, int):
                 call.fails(OverflowError, setter, obj, BIG)
 
@@ -307,18 +306,14 @@ def effect_instances(call, helpers, tmp_path):
         members(call, "EffectGlobals_t_", effect, write=False)
         call.on("EffectGlobals_t_", effect, (name, "plugin_name_get"), (bool, "_get_shared_params"),
                 (True, "__ne__", kept))
-        call.rows((TypeError, "EffectGlobals_t__get_genotypes", kept.effect_genotype),
-                  (ANY, "tarsel_effect_is_time_varying", effect, name, 0),
-                  (OverflowError, "tarsel_effect_is_time_varying", effect, name, BIG),
-                  (ANY, "tarsel_get_gpu_status", effect), (ANY, "tarsel_get_gpu_status", None),
-                  (None, "free_tarsel_effect", effect), (None, "free_tarsel_effect", None),
-                  (None, "init_tarsel_effect", unknown, False), (TypeError, "init_tarsel_effect", name, 1),
-                  (None, "init_tarsel_effect_from_string", broken), (None, "init_tarsel_effect_from_string", None),
-                  (made, "init_tarsel_effect", builder, True))  # freed by its proxy
+        call.rows((TypeError, "EffectGlobals_t__get_genotypes", kept.effect_genotype))
+        call.each("tarsel_effect_is_time_varying", (ANY, effect, name, 0), (OverflowError, effect, name, BIG))
+        call.each("tarsel_get_gpu_status", (ANY, effect), (ANY, None))
+        call.each("free_tarsel_effect", (None, effect), (None, None))
         assert not effect.thisown
-        again = call("init_tarsel_effect_from_string", saved)
-        assert again is not None
-        call("delete_EffectGlobals_t", again)
+        call.each("init_tarsel_effect", (None, unknown, False), (made, builder, True))  # freed by its proxy
+        call.each("init_tarsel_effect_from_string", (None, broken), (None, None))
+        call("delete_EffectGlobals_t", call("init_tarsel_effect_from_string", saved))
         call.aborted("init_tarsel_effect", name, False)
         call.aborted("init_tarsel_effect_from_string", saved)
 
@@ -334,19 +329,16 @@ def genotypes(call, helpers, tmp_path):
     def step():
         for genotype in genotypes:
             members(call, "Genotype_", genotype)
-            for param in call("Genotype__get_params", genotype)[:3]:
-                call("Genotype_get_param_group_name", genotype, param)
-            call.rows((TypeError, "Genotype_get_param_group_name", genotype, genotype),
-                      (ANY, "tarsel_any_nodes_get_flag", genotype, 0x20000),
-                      (0, "add_param_to_list", genotype, 0, collector),
-                      (0, "add_param_to_list", genotype, 10_000, collector))
+            call.each("Genotype_get_param_group_name",
+                      *[(ANY, genotype, param) for param in call("Genotype__get_params", genotype)[:3]])
+            call.rows((ANY, "tarsel_any_nodes_get_flag", genotype, 0x20000))
+            call.each("add_param_to_list", (0, genotype, 0, collector), (0, genotype, 10_000, collector))
             info = call("Genotype_effect_info_get", genotype)
             if info is not None:
                 members(call, "effect_def_", info, write=False)
             collected.clear()
-        call.rows((TypeError, "add_param_to_list", genotypes[0], 0, collected),
-                  (OverflowError, "add_param_to_list", genotypes[0], BIG, collector),
-                  (OverflowError, "tarsel_any_nodes_get_flag", genotypes[0], BIG))
+        call.fails(OverflowError, "add_param_to_list", genotypes[0], BIG, collector)
+        call.fails(OverflowError, "tarsel_any_nodes_get_flag", genotypes[0], BIG)
 
     return step, made_effects + genotypes + [collected, collector], lambda: free_all(call, made_effects)
 
@@ -388,12 +380,9 @@ def params(call, helpers, tmp_path):
                       (ANY, "tarsel_get_param_bounds2", param, 1.0, 0, *pointers, 0))
         param = params[1]
         # Each Param keeps only its latest cJSON tree: the one before is freed.
-        call.on("Param_", param, (made, "to_json", None), (ANY, "to_json", None, True), (TypeError, "to_json", None, 1),
-                (TypeError, "to_json", STRANGER), (TypeError, "to_string", None, 1), (TypeError, "to_string", STRANGER),
-                (TypeError, "to_string_const", None, 1), (TypeError, "needs_old_default", "1"),
-                (TypeError, "maybe_set_to_old_default", None, 1.0, -1))
+        call.on("Param_", param, (made, "to_json", None), (ANY, "to_json", None, True),
+                (TypeError, "to_string_const", None, 1), (TypeError, "maybe_set_to_old_default", None, 1.0, -1))
         call.rows((OverflowError, "tarsel_get_param_title", param, 0, title, -1),
-                  (TypeError, "tarsel_get_param_bounds2", param, "1", 0, *pointers, 0),
                   (TypeError, "tarsel_get_fromfile_popup_names", param, []), (TypeError, "new_Param", label, 1.0))
         # Parameters a host makes: every constructor overload, every setter.
         for more in ((), (2,), (2, _renderlib.screen_mode_screen_center)):
@@ -407,8 +396,7 @@ def params(call, helpers, tmp_path):
             call.on(cls.__name__ + "_", array, (bool, "__len__"), (None, "__setitem__", 1, value),
                     (value, "__getitem__", 1), (IndexError, "__getitem__", 8), (IndexError, "__setitem__", 8, value),
                     (OverflowError, "__getitem__", -1), (OverflowError, "__setitem__", 0, wrong),
-                    (TypeError, "__setitem__", 0, "1"), (ValueError, "data_set", None),
-                    (TypeError, "data_set", [value]))
+                    (ValueError, "data_set", None), (TypeError, "data_set", [value]))
             call(cls.__name__ + "_data_set", other, call(cls.__name__ + "_data_get", array))
             for each in (array, other):
                 call("delete_" + cls.__name__, each)
@@ -418,38 +406,6 @@ def params(call, helpers, tmp_path):
 
     return step, made_effects + params + bounds + pointers + inputs + [title, label], \
         lambda: free_all(call, made_effects)
-
-
-@family
-def raster_descriptors(call, helpers, tmp_path):
-    bits, short_bits, raw_bits = text("A" * 104 + "ignored"), text("A" * 103), b"A" * 104
-    encoded, three = text(base64.b64encode(bytes(range(1, 105))).decode()), text("QUJD")
-    decoded = bytearray(120)
-    decoded_at = helpers.byte_address(decoded, 0)
-    first, second = contexts = [helpers.context_handle(0), helpers.context_handle(1)]
-
-    def step():
-        info = renderlib.T_RasterInfo()
-        # Neither the record nor the text is given as None to the two record
-        # writers: they pass it on to memcpy and strlen unchecked.
-        call.rows((None, "T_RasterInfo_pixel_type_set", info, _renderlib.pixel_rgba8),
-                  (200, "make_tarsel_raster_info", info, 10, 5), (None, "T_RasterInfo_pixel_type_set", info, 27),
-                  (0, "make_tarsel_raster_info", info, 10, 5),  # no such layout as 27
-                  (OverflowError, "make_tarsel_raster_info", info, BIG, 5), (ANY, "tarsel_get_native_image_dims", info),
-                  (ANY, "tarsel_get_native_image_dims", None),
-                  (lambda data: len(data) == 104, "raster_info_to_bytearray", info),
-                  (None, "make_tarsel_raster_info_from_bits", info, bits),
-                  (ValueError, "make_tarsel_raster_info_from_bits", info, short_bits),
-                  (TypeError, "make_tarsel_raster_info_from_bits", info, raw_bits),
-                  (None, "make_tarsel_raster_info_from_base64", info, encoded),
-                  (TypeError, "make_tarsel_raster_info_from_base64", info, 5),
-                  (ANY, "base64decode", encoded, decoded_at, 120), (ANY, "base64decode", three, None, 0),
-                  (TypeError, "base64decode", three, decoded, 4),
-                  (OverflowError, "base64decode", three, decoded_at, BIG), (ValueError, "delete_RenderContext", None))
-        call.on("RenderContext_", first, (True, "__eq__", first), (True, "__ne__", second),
-                (NotImplemented, "__eq__", 3), "__hash__")
-
-    return step, [bits, short_bits, raw_bits, encoded, three, decoded, decoded_at] + contexts, nothing
 
 
 @family
@@ -484,7 +440,12 @@ def renders(call, helpers, tmp_path):
 
 
 @family
-def image_services(call, helpers, tmp_path):
+def rasters_and_images(call, helpers, tmp_path):
+    bits, short_bits, raw_bits = text("A" * 104 + "ignored"), text("A" * 103), b"A" * 104
+    encoded, three = text(base64.b64encode(bytes(range(1, 105))).decode()), text("QUJD")
+    decoded = bytearray(120)
+    decoded_at = helpers.byte_address(decoded, 0)
+    first, second = contexts = [helpers.context_handle(0), helpers.context_handle(1)]
     source_info, source = effects.raster(_renderlib.pixel_rgbaf, 2, 1)
     source[:] = numpy.array([0, 0, 0, 1, 1, 1, 1, 1], numpy.float32).tobytes()
     size = _renderlib.tarsel_get_resized_image_size(source_info, 8, 1, 0, 0, 1.0, 0)
@@ -501,21 +462,36 @@ def image_services(call, helpers, tmp_path):
     comp = ["tarsel_comp_bgra_8", shown, 2, 1, 8, -16711936, 0]
 
     def step():
-        call.rows((size, *sized), (TypeError, *changed(sized, 6, "1")), ([8, 1], *resize),
-                  (TypeError, *changed(resize, 9, "d")), (OverflowError, *changed(resize, 3, BIG)), (ANY, *convert),
-                  (ANY, *changed(convert, 1, effect)), (TypeError, *changed(convert, 8, 5)),
-                  (TypeError, *changed(convert, 3, "pixels")), (ANY, *comp), (TypeError, *changed(comp, 1, "pixels")),
-                  (OverflowError, *changed(comp, 5, BIG)), (None, "set_error_handler", handler),
-                  (ANY, "set_tarsel_luts", lut_path, empty, 1.0),
-                  (ANY, "set_tarsel_luts", missing, empty, 1.0),  # reported to the handler
-                  (None, "set_error_handler", None), (TypeError, "set_tarsel_luts", empty, empty, "1"), "get_ocio_path")
+        info = renderlib.T_RasterInfo()
+        # Neither the record nor the text is given as None to the two record
+        # writers: they pass it on to memcpy and strlen unchecked.
+        info.pixel_type = _renderlib.pixel_rgba8
+        call.each("make_tarsel_raster_info", (200, info, 10, 5), (OverflowError, info, BIG, 5))
+        info.pixel_type = 27  # no such layout
+        call.each("make_tarsel_raster_info", (0, info, 10, 5))
+        call.each("tarsel_get_native_image_dims", (ANY, info), (ANY, None))
+        call.rows((lambda data: len(data) == 104, "raster_info_to_bytearray", info),
+                  (ValueError, "delete_RenderContext", None))
+        call.each("make_tarsel_raster_info_from_bits", (None, info, bits), (ValueError, info, short_bits),
+                  (TypeError, info, raw_bits))
+        call.each("make_tarsel_raster_info_from_base64", (None, info, encoded))
+        call.each("base64decode", (ANY, encoded, decoded_at, 120), (ANY, three, None, 0),
+                  (OverflowError, three, decoded_at, BIG))
+        call.on("RenderContext_", first, (True, "__eq__", first), (True, "__ne__", second),
+                (NotImplemented, "__eq__", 3), "__hash__")
+        call.rows((size, *sized), ([8, 1], *resize), (OverflowError, *changed(resize, 3, BIG)), (ANY, *convert),
+                  (ANY, *changed(convert, 1, effect)), (ANY, *comp), (OverflowError, *changed(comp, 5, BIG)),
+                  (None, "set_error_handler", handler), "get_ocio_path")
+        call.each("set_tarsel_luts", (ANY, lut_path, empty, 1.0), (ANY, missing, empty, 1.0))  # the handler hears it
+        call("set_error_handler", None)
         messages.clear()
 
     def cleanup():
         _renderlib.set_tarsel_luts("", "", 1.0)
         call("free_tarsel_effect", effect)
 
-    return step, [source_info, source, dest_info, dest, shown, effect, lut_path, missing, messages, handler], cleanup
+    return step, [source_info, source, dest_info, dest, shown, effect, lut_path, missing, messages, handler, bits,
+                  short_bits, raw_bits, encoded, three, decoded, decoded_at] + contexts, cleanup
 
 
 @family
@@ -530,14 +506,15 @@ def flare_textures(call, helpers, tmp_path):
         index = call(*register)
         assert index >= 0
         call.rows((None, "tarsel_get_flare_texture_error"), (lambda got: got[0] == 0, "tarsel_get_texture_info", index),
-                  (16, "tarsel_get_texture_pixels", index, out), (TypeError, "tarsel_get_texture_pixels", index, 16),
                   (TypeError, *changed(register, 5, "pixels")), (TypeError, *changed(register, 3, 4.0)),
-                  (OverflowError, *changed(register, 1, BIG)), (lambda i: i >= 0, "tarsel_load_flare_texture", spot),
-                  (lambda i: i < 0, "tarsel_load_flare_texture", missing), (bool, "tarsel_get_flare_texture_error"),
-                  (lambda i: i < 0, "tarsel_load_flare_texture", None), (TypeError, "tarsel_load_flare_texture", path),
-                  (None, "tarsel_free_all_flare_textures"), (lambda got: got[0] != 0, "tarsel_get_texture_info", index),
-                  (lambda n: n < 0, "tarsel_get_texture_pixels", index, wrong_out),
-                  (OverflowError, "tarsel_get_texture_info", BIG))
+                  (OverflowError, *changed(register, 1, BIG)))
+        call.each("tarsel_get_texture_pixels", (16, index, out))
+        call.each("tarsel_load_flare_texture", (lambda i: i >= 0, spot), (lambda i: i < 0, missing),
+                  (lambda i: i < 0, None))
+        assert call("tarsel_get_flare_texture_error")
+        call("tarsel_free_all_flare_textures")
+        call.each("tarsel_get_texture_info", (lambda got: got[0] != 0, index), (OverflowError, BIG))
+        call.each("tarsel_get_texture_pixels", (lambda n: n < 0, index, wrong_out))
 
     return step, [pixels, out, wrong_out, spot, missing, path], lambda: _renderlib.tarsel_free_all_flare_textures()
 
@@ -590,8 +567,7 @@ def drawing_callbacks(call, helpers, tmp_path):
     def step():
         call.on("GfxInterface_", drawing.this, *[(ANY, *each) for each in calls],
                 (OverflowError, "stipple_pattern", 65536), (ValueError, "lines", None, ys),
-                (TypeError, "lines", [1.0], ys), (TypeError, "set_graphics_context", STRANGER),
-                (TypeError, "draw_text", 5, 0, 0))
+                (TypeError, "lines", [1.0], ys))
         call.rows((TypeError, "GfxInterface_get_text_length_in_pixels", wrong.this, words),
                   (KeyError, "GfxInterface_circle", raising.this, 1, 2, 3),
                   (RuntimeError, "GfxInterface_line", drawing, 0, 0, 1, 1))  # the abstract base's own
@@ -600,8 +576,7 @@ def drawing_callbacks(call, helpers, tmp_path):
         del fresh
         call.rows((None, "tarsel_set_gfx_impl", drawing), (ANY, *draw), (ANY, *changed(draw, 9, short_values)),
                   (ANY, *mouse), (ANY, *changed(changed(mouse, 9, short_values), 12, _renderlib.MouseEventType_DRAG)),
-                  (None, "tarsel_set_gfx_impl", None), (TypeError, *changed(draw, 9, 5)),
-                  (OverflowError, *changed(mouse, 10, BIG)))
+                  (None, "tarsel_set_gfx_impl", None), (OverflowError, *changed(mouse, 10, BIG)))
 
     def cleanup():
         _renderlib.tarsel_set_gfx_impl(None)
@@ -651,8 +626,7 @@ def frame_callbacks(call, helpers, tmp_path):
                   (TypeError, "LoadFrameInterface_current_raster_info", not_a_descriptor.this, 0),
                   (RuntimeError, "LoadFrameInterface_load_frame", source, 0, 0, 0, 0))  # the abstract base's own
         call.on("LoadFrameInterface_", source.this, (lambda pixels: pixels is frame[1], "load_frame", 0, 0, 16, 8),
-                (ANY, "current_raster_info", 0), (TypeError, "load_frame", 0, 0, "1", 1),
-                (OverflowError, "current_raster_info", BIG))
+                (ANY, "current_raster_info", 0), (OverflowError, "current_raster_info", BIG))
         director_lifetimes(call, StillSource, frame)
 
     def cleanup():
@@ -677,9 +651,9 @@ def engine_controls(call, helpers, tmp_path):
         ENGINE.set_version_text(b"engine \xff\xfe")
         call.rows((None, "set_error_handler", None), (None, "tarsel_free_all_stamp_collections"),
                   "tarsel_shutdown_apps", "get_tarsel_version_info", "ext_build_id", "get_tarsel_build_id",
-                  (True, "check_build_id"), (True, "check_user", me), (False, "check_user", someone),
-                  (False, "check_user", None), *[(ANY, "shmem_error_to_string", error) for error in range(7)],
-                  (OverflowError, "shmem_error_to_string", BIG), (ANY, "SWIG_PyInstanceMethod_New", draw_nothing))
+                  (True, "check_build_id"), (ANY, "SWIG_PyInstanceMethod_New", draw_nothing))
+        call.each("check_user", (True, me), (False, someone), (False, None))
+        call.each("shmem_error_to_string", *[(ANY, error) for error in range(7)], (OverflowError, BIG))
         ENGINE.set_version_text(None)
         heard.clear()
 
@@ -707,35 +681,30 @@ def shared_memory(call, helpers, tmp_path):
                 (bool, "write_pybuf", payload), (bool, "try_write_pybuf", payload, note),
                 (bool, "timed_write_pybuf", payload, 1.0))
         for reserve, *extra in (("reserve_pybuf",), ("try_reserve_pybuf",), ("timed_reserve_pybuf", 1.0)):
-            view = call(t + reserve, server, 16, *extra, note)
-            view[:] = sixteen
-            del view
+            call(t + reserve, server, 16, *extra, note)[:] = sixteen
             assert call(t + "commit", server)
         for i in range(10):
-            header = call(t + "get_msg_header", client)
-            members(call, "MessageHeader_t_", header)
+            members(call, "MessageHeader_t_", call(t + "get_msg_header", client))
             reader, *extra = readers[i % len(readers)]
             bytes(call(t + reader, client, *extra))
-            del header
         call.on(t, client, (None, "try_read_pybuf"), (None, "timed_read_pybuf", 0.0), (None, "get_msg_header"),
-                (bool, "is_segment_valid"), (TypeError, "timed_read_pybuf", "1"),
+                (bool, "is_segment_valid"),
                 (lambda error: error != _renderlib.ShmemError_SHMEM_NO_ERROR, "get_last_error"))
         call.on(t, server, (None, "try_reserve_pybuf", oversized), (operator.not_, "try_write_pybuf", bytes(oversized)),
                 (bool, "client_pid_exists"), "print_stats", "get_server_pid",
                 # A message without the buffer protocol: a SystemError caused by the TypeError.
                 (SystemError, "write_pybuf", STRANGER), (SystemError, "try_write_pybuf", 5),
-                (SystemError, "timed_write_pybuf", message, 1.0), (TypeError, "write_string", 5),
+                (SystemError, "timed_write_pybuf", message, 1.0),
                 (TypeError, "reserve_pybuf", -1))  # overloaded: no match
-        call.rows((None, "ShmemManager_serve", name, size, size),  # served already
-                  (None, "ShmemManager_serve", other, 16, 16),  # queues too small
-                  (None, "ShmemManager_serve", bad, size, size), (None, "ShmemManager_connect", missing),
-                  (None, "ShmemManager_connect", None), (OverflowError, "ShmemManager_serve", other, -1, 1),
-                  (TypeError, "ShmemManager_reset_all", 1), (bool, t + "remove", server))
+        call.each("ShmemManager_serve", (None, name, size, size),  # served already
+                  (None, other, 16, 16), (None, bad, size, size), (OverflowError, other, -1, 1))  # queues too small
+        call.each("ShmemManager_connect", (None, missing), (None, None))
+        assert call(t + "remove", server)
         client.this.disown()
-        call.rows((None, "free_tarsel_ipc_shmemtransport", client), (None, "free_tarsel_ipc_shmemtransport", None),
-                  (None, "delete_ShmemTransport", server), (None, "ShmemManager_reset", name),
-                  (None, "ShmemManager_reset", name, True), (None, "ShmemManager_reset", missing, True),
-                  (None, "ShmemManager_reset_all"), (None, "ShmemManager_reset_all", False))
+        call.each("free_tarsel_ipc_shmemtransport", (None, client), (None, None))
+        call("delete_ShmemTransport", server)
+        call.each("ShmemManager_reset", (None, name), (None, name, True), (None, missing, True))
+        call.each("ShmemManager_reset_all", (None,), (None, False), (TypeError, 1))
         assert call(t + "remove", call("ShmemManager_serve", name, size, size))  # freed by its proxy
 
     def cleanup():
@@ -773,14 +742,16 @@ def monitor(call, helpers, tmp_path):
         call.rows((TypeError, *changed(wrap, 2, "pixels")), (TypeError, *changed(wrap, 7, 1)),
                   (OverflowError, *changed(wrap, 3, BIG)), (TypeError, "EM_XIImage_addRef", display))
         call.on(d, display, (_renderlib.EM_errorParam, "connect", None, mode), (not_found, "connect", nowhere, mode),
-                (TypeError, "connect", preview, 5), (none, "disconnect", preview), (0, "get_width", preview))
-        call.rows((None, "release_external_monitor", display),
-                  (ValueError, "release_external_monitor", display),  # released already
-                  (ValueError, d + "devices", display))
-        with switched(MONITOR.qrv_probe_set_init_fails):
-            assert call("EM_DisplayInit") is None
-        with switched(MONITOR.qrv_probe_set_no_devices):
-            bare = call("EM_DisplayInit")
+                (none, "disconnect", preview), (0, "get_width", preview))
+        call.each("release_external_monitor", (None, display), (ValueError, display))  # the second: released already
+        call.fails(ValueError, d + "devices", display)
+        # The library's fault switches: its start fails; it finds no device.
+        MONITOR.qrv_probe_set_init_fails(1)
+        assert call("EM_DisplayInit") is None
+        MONITOR.qrv_probe_set_init_fails(0)
+        MONITOR.qrv_probe_set_no_devices(1)
+        bare = call("EM_DisplayInit")
+        MONITOR.qrv_probe_set_no_devices(0)
         call.on(d, bare, ([], "devices"), (not_found, "connect", preview, mode))
         call("release_external_monitor", bare)
 
@@ -798,24 +769,22 @@ def vector_calls(call, kind, first, second):
     call.on(p, vector, (3, "__len__"), (3, "size"), (True, "__bool__"), (True, "__nonzero__"), (False, "empty"),
             "get_allocator", (ANY, "reserve", 8), (lambda n: n >= 8, "capacity"), (ANY, "append", second),
             (ANY, "push_back", first), (ANY, "__getitem__", 0), (ANY, "__getitem__", -1),
-            (ANY, "__getitem__", slice(0, 2)), (IndexError, "__getitem__", 99), (TypeError, "__getitem__", "0"),
-            (ANY, "__setitem__", 0, second), (ANY, "__setitem__", slice(0, 1), [first]),
-            (ANY, "__setitem__", slice(4, 5)), (TypeError, "__setitem__", 0, STRANGER),
+            (ANY, "__getitem__", slice(0, 2)), (IndexError, "__getitem__", 99), (ANY, "__setitem__", 0, second),
+            (ANY, "__setitem__", slice(0, 1), [first]), (ANY, "__setitem__", slice(4, 5)),
             (ValueError, "__setitem__", slice(0, 4, 2), [first]), (ANY, "__delitem__", 0),
             (ANY, "__delitem__", slice(0, 1)), (IndexError, "__delitem__", 99), (ANY, "__getslice__", 0, 2),
             (ANY, "__setslice__", 0, 1, [second]), (ANY, "__setslice__", 0, 1), (ANY, "__delslice__", 0, 1),
             # back, front and pop_back are only ever called on a vector that
             # has elements: on an empty one they read or free what is not there.
             (ANY, "append", first), (ANY, "append", second), (ANY, "append", first), (lambda n: n >= 3, "size"), "back",
-            "front", "pop", "pop_back", (ANY, "assign", 3, second), (ANY, "resize", 4), (ANY, "resize", 5, first),
-            (TypeError, "resize", 5, STRANGER))
+            "front", "pop", "pop_back", (ANY, "assign", 3, second), (ANY, "resize", 4), (ANY, "resize", 5, first))
     at = call(p + "insert", vector, call(p + "begin", vector), first)
     call(p + "insert", vector, at, 2, second)
     call(p + "erase", vector, call(p + "begin", vector))
     call(p + "erase", vector, call(p + "begin", vector), call(p + "end", vector))
-    call.on(p, vector, "rbegin", "rend", (ANY, "swap", other), (TypeError, "swap", STRANGER))
+    call.on(p, vector, "rbegin", "rend", (ANY, "swap", other))
     iterate(call, p, three)
-    call.on(p, vector, (None, "clear"), (IndexError, "pop"), (TypeError, "append", STRANGER))
+    call.on(p, vector, (None, "clear"), (IndexError, "pop"))
     for each in (three, other, vector):
         call("delete_" + kind, each)
 
@@ -834,7 +803,7 @@ def iterate(call, prefix, sequence):
     begin = call(p + "__iadd__", begin, 1)
     begin = call(p + "__isub__", begin, 2)
     call.rows((ANY, p + "__sub__", end, begin))
-    call.on(p, begin, (ANY, "__add__", 1), (TypeError, "distance", STRANGER), (TypeError, "advance", "1"))
+    call.on(p, begin, (ANY, "__add__", 1))
     # A closed iterator: nothing before its start, three steps, then the end.
     call.on(p, closed, (StopIteration, "previous"), "__next__", "__next__", "__next__", (StopIteration, "__next__"),
             (StopIteration, "__next__"), (StopIteration, "value"))
@@ -867,17 +836,15 @@ def containers(call, helpers, tmp_path):
         copy = construct(call, renderlib.value_map, mapping)
         call("delete_value_map", construct(call, renderlib.value_map, {key: values}))
         call.fails(TypeError, "new_value_map", STRANGER)
-        call.on(p, mapping, (IndexError, "__delitem__", missing), (TypeError, "__setitem__", 5, values),
-                ((2.5, 1.0), "__getitem__", key), (IndexError, "__getitem__", missing), (True, "__contains__", key),
-                (True, "has_key", key), (TypeError, "__contains__", 5), (1, "count", key), (2, "__len__"), (2, "size"),
-                (True, "__bool__"), (True, "__nonzero__"), (False, "empty"), (ANY, "lower_bound", key),
-                (ANY, "upper_bound", key),
-                "keys", "values", "items", "asdict", "end", "key_iterator", "value_iterator", "rbegin", "rend",
-                "get_allocator")
+        call.on(p, mapping, (IndexError, "__delitem__", missing), ((2.5, 1.0), "__getitem__", key),
+                (IndexError, "__getitem__", missing), (True, "__contains__", key), (True, "has_key", key),
+                (1, "count", key), (2, "__len__"), (2, "size"), (True, "__bool__"), (True, "__nonzero__"),
+                (False, "empty"), (ANY, "lower_bound", key), (ANY, "upper_bound", key), "keys", "values", "items",
+                "asdict", "end", "key_iterator", "value_iterator", "rbegin", "rend", "get_allocator")
         call(p + "erase", mapping, call(p + "find", mapping, key))
         call.on(p, mapping, (1, "erase", other_key), (IndexError, "__delitem__", missing), (ANY, "swap", copy))
         call(p + "erase", mapping, call(p + "begin", mapping), call(p + "end", mapping))
-        call.on(p, mapping, (TypeError, "swap", STRANGER), "clear")
+        call("value_map_clear", copy)
         call.rows((None, "delete_value_map", copy), (None, "delete_value_map", mapping),
                   # `iterator - n` and `iterator + n` past either end make a
                   # copy and then stop: the copy is freed.
@@ -1000,6 +967,8 @@ def check_flat(name, make, helpers, tmp_path):
             "%s: resident memory grew by %d KiB in %d rounds" % (name, rss + more_rss, 2 * ROUNDS)
     finally:
         cleanup()
+        MONITOR.qrv_probe_set_init_fails(0)
+        MONITOR.qrv_probe_set_no_devices(0)
         ENGINE.abort_next_call(False)
         _renderlib.tarsel_clear_abort()
         _renderlib.tarsel_free_all_stamp_collections()

@@ -53,23 +53,6 @@ def test_the_module_holds_exactly_one_reference_to_the_handler(error_handler_rem
     assert sys.getrefcount(handler) == before
 
 
-def test_an_exception_raised_by_the_handler_stays_pending_in_the_calling_thread(probe, error_handler_removed):
-    def handler(level, message):
-        raise ValueError("handler failed on " + message)
-
-    _renderlib.set_error_handler(handler)
-    # The engine's own call returns normally; the exception is left set in the
-    # thread that called the engine, so the interpreter finds it when the
-    # foreign call returns.
-    with pytest.raises(SystemError) as raised:
-        probe.emit_here(_renderlib.Err_Error, "frame 7")
-    assert isinstance(raised.value.__cause__, ValueError)
-    assert str(raised.value.__cause__) == "handler failed on frame 7"
-    # On an engine worker the exception goes with the worker's temporary
-    # thread state; the engine and the calling thread carry on.
-    assert probe.emit_from_worker(3, _renderlib.Err_Error, "worker") == 3
-
-
 def test_an_engine_abort_becomes_runtime_error_and_changes_nothing(probe, error_handler_removed):
     received = []
     _renderlib.set_error_handler(lambda level, message: received.append(message))
@@ -93,10 +76,12 @@ def test_every_engine_call_is_guarded(probe, name, arguments):
 
 
 def test_a_handler_exception_surfaces_from_the_call_whatever_it_returns():
-    """Each call raises SystemError caused by the handler's exception, as the
-    interpreter reports a result returned with an exception set. A fresh
-    process: the first proxy of a class the module makes is the case that
-    lost the exception."""
+    # The engine's own call returns normally; the exception stays set in the
+    # thread that called the engine, so each call raises SystemError caused
+    # by it, as the interpreter reports a result returned with an exception
+    # set. On an engine worker the exception goes with the worker's temporary
+    # thread state, and the engine carries on. A fresh process: the first
+    # proxy of a class the module makes is the case that lost the exception.
     out = run_cleanly("""
         import _renderlib
         from engine_probe import EngineProbe
@@ -115,6 +100,7 @@ def test_a_handler_exception_surfaces_from_the_call_whatever_it_returns():
                                            colorspace="cmyk"),
             "tuple": lambda: _renderlib.tarsel_widget_mouse_event(glow, "no_such", 960, 540, 0.0, 0.0, 0.5, 0.5,
                                                                   [], 0, 0, 0),
+            "engine": lambda: probe.emit_here(_renderlib.Err_Error, "frame 7"),
         }
         glow = None
         _renderlib.set_error_handler(handler)
@@ -127,7 +113,9 @@ def test_a_handler_exception_surfaces_from_the_call_whatever_it_returns():
                 _renderlib.set_error_handler(None)
                 glow = _renderlib.init_tarsel_effect("T_Glow", False)
                 _renderlib.set_error_handler(handler)
+        print(probe.emit_from_worker(3, _renderlib.Err_Error, "worker"))
         # The instance the failed call made went with its result.
         print(probe.live_instances() - made)
     """)
-    assert out.splitlines() == ["proxy ValueError", "None ValueError", "bool ValueError", "tuple ValueError", "1"]
+    assert out.splitlines() == ["proxy ValueError", "None ValueError", "bool ValueError", "tuple ValueError",
+                                "engine ValueError", "3", "1"]

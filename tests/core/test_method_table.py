@@ -60,11 +60,11 @@ def convention_name(flags):
 
 @pytest.fixture(scope="module")
 def table():
-    """The module's method table, walked from its first entry to the null
-    entry: a list of (name, convention) in table order. What the tests rely
-    on is checked first: the functions' entries lie next to each other in one
-    array, ordered by address as the module dictionary is, and the walked
-    entries are the function objects' own."""
+    # The module's method table, walked from its first entry to the null
+    # entry: a list of (name, convention) in table order. What the tests rely
+    # on is checked on the way: the functions' entries lie next to each other
+    # in one array, ordered by address as the module dictionary is, and the
+    # walked entries are the function objects' own.
     functions = module_functions()
     assert functions and all(method_def(f).ml_name.decode("ascii") == f.__name__ == name
                              for name, f in functions.items())

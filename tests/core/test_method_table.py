@@ -88,7 +88,8 @@ def test_the_module_s_table_equals_the_list(table):
               "wrong calling convention": {f"{name}: listed {listed[name]}, module has {found[name]}"
                                            for name in set(listed) & set(found) if listed[name] != found[name]},
               "in the module's table more than once": {name for name in names if names.count(name) > 1}}
-    report = [f"{title} ({len(found)}):\n    " + "\n    ".join(sorted(found)) for title, found in report.items() if found]
+    report = [f"{title} ({len(entries)}):\n    " + "\n    ".join(sorted(entries))
+              for title, entries in report.items() if entries]
     assert not report, "_renderlib's method table differs from method_table.txt:\n  " + "\n  ".join(report)
 
 

@@ -53,30 +53,24 @@ def test_unsigned_and_float_ranges(shared_registry):
         shared_registry.halve(2 ** 1100)
 
 
-def test_argument_count_messages_name_the_function():
-    info = renderlib.T_RasterInfo()
-    with pytest.raises(TypeError, match=r"^T_RasterInfo_ds_xsize_set expected 2 arguments, got 1$"):
-        _renderlib.T_RasterInfo_ds_xsize_set(info)
-    with pytest.raises(TypeError, match=r"^T_RasterInfo_ds_xsize_set expected 2 arguments, got 3$"):
-        _renderlib.T_RasterInfo_ds_xsize_set(info, 1, 2)
-
-
-def test_argument_count_messages_with_optional_arguments(shared_registry):
-    with pytest.raises(TypeError, match=r"^scaled expected at least 1 arguments, got 0$"):
-        shared_registry.scaled()
-    with pytest.raises(TypeError, match=r"^scaled expected at most 2 arguments, got 3$"):
-        shared_registry.scaled(1, 2, 3)
-    # An overload set adds its prototypes to the count message.
-    with pytest.raises(TypeError, match=r"^arity expected at most 2 arguments, got 3\nAdditional information:\n"
-                                        r"Wrong number or type of arguments for overloaded function 'arity'"):
-        shared_registry.arity(1, 2, 3)
-    with pytest.raises(TypeError, match=r"^Wrong number or type of arguments for overloaded function 'arity'"):
-        shared_registry.arity()
-
-
-def test_the_first_failing_argument_is_the_one_named():
-    with pytest.raises(TypeError, match=r"argument 1 of type 'T_RasterInfo \*'$"):
-        _renderlib.T_RasterInfo_ds_xsize_set(5, "not an int")
+# The message of a refused call names the function and, for a count, what it
+# takes (an overload set adds its prototypes); of a refused argument, the
+# first one that fails.
+@pytest.mark.parametrize("call, message", [
+    (lambda helpers: _renderlib.T_RasterInfo_ds_xsize_set(renderlib.T_RasterInfo()),
+     r"^T_RasterInfo_ds_xsize_set expected 2 arguments, got 1$"),
+    (lambda helpers: _renderlib.T_RasterInfo_ds_xsize_set(renderlib.T_RasterInfo(), 1, 2),
+     r"^T_RasterInfo_ds_xsize_set expected 2 arguments, got 3$"),
+    (lambda helpers: helpers.scaled(), r"^scaled expected at least 1 arguments, got 0$"),
+    (lambda helpers: helpers.scaled(1, 2, 3), r"^scaled expected at most 2 arguments, got 3$"),
+    (lambda helpers: helpers.arity(1, 2, 3), r"^arity expected at most 2 arguments, got 3\nAdditional information:\n"
+                                             r"Wrong number or type of arguments for overloaded function 'arity'"),
+    (lambda helpers: helpers.arity(), r"^Wrong number or type of arguments for overloaded function 'arity'"),
+    (lambda helpers: _renderlib.T_RasterInfo_ds_xsize_set(5, "not an int"), r"argument 1 of type 'T_RasterInfo \*'$"),
+])
+def test_a_refused_call_names_the_function_and_what_it_takes(shared_registry, call, message):
+    with pytest.raises(TypeError, match=message):
+        call(shared_registry)
 
 
 def test_proxy_objects():

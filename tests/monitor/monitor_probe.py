@@ -21,8 +21,6 @@ class MonitorProbe:
         lib.qrv_probe_preview_frame.argtypes = [
             ctypes.c_void_p, ctypes.c_void_p, ctypes.c_int, ctypes.POINTER(ctypes.c_int),
             ctypes.POINTER(ctypes.c_int), ctypes.POINTER(ctypes.c_longlong), ctypes.c_char_p, ctypes.c_int]
-        lib.qrv_probe_set_init_fails.argtypes = [ctypes.c_int]
-        lib.qrv_probe_set_no_devices.argtypes = [ctypes.c_int]
 
     def calls(self):
         """The call log, oldest first."""
@@ -60,9 +58,3 @@ class MonitorProbe:
         self.lib.qrv_probe_preview_frame(address(display), pixels, size, ctypes.byref(width),
                                          ctypes.byref(height), ctypes.byref(frames), name, len(name))
         return pixels.raw[:size], width.value, height.value, frames.value, name.value.decode()
-
-    def init_fails(self, on):
-        self.lib.qrv_probe_set_init_fails(int(on))
-
-    def no_devices(self, on):
-        self.lib.qrv_probe_set_no_devices(int(on))

@@ -1,13 +1,8 @@
 """What the fuzz targets share: the reader that turns fuzz data into choices,
-the inputs of a short run, and the driver of a Python target, under atheris
-(coverage guided, libFuzzer's flags) or, with --replay, over the corpus and
-a fixed number of generated inputs (the short run of the test suite):
-
-    python fuzz_<subject>.py [libFuzzer flags] [corpus folders]       atheris
-    python fuzz_<subject>.py --replay [--inputs N] [--seed S] [paths]  no atheris
-
-A replay prints "replayed N inputs" once every input passed; a failing input
-is printed (base64) before the exception ends the run."""
+the inputs of a short run, and the driver of a Python target: atheris with
+libFuzzer's flags, or --replay [--inputs N] [--seed S] [paths] without it,
+which runs the files under paths and N generated inputs, prints "replayed M
+inputs" once all passed, and a failing input (base64) before its exception."""
 import base64
 import faulthandler
 import inspect
@@ -17,8 +12,7 @@ import random
 import struct
 import sys
 
-FUZZ_DIR = pathlib.Path(__file__).resolve().parent
-TESTS_DIR = FUZZ_DIR.parent
+TESTS_DIR = pathlib.Path(__file__).resolve().parents[1]
 if str(TESTS_DIR) not in sys.path:
     sys.path.insert(0, str(TESTS_DIR))
 
@@ -51,8 +45,7 @@ class ByteReader:
     def flag(self):
         return bool(self.byte() & 1)
 
-    def one_in(self, count):
-        """True about once in `count` draws; False once the data is used up."""
+    def one_in(self, count):  # never once the data is used up
         return self.byte() % count == count - 1
 
     def pick(self, options):
@@ -102,16 +95,15 @@ def main(test_one_input, max_len, default_inputs=2000):
         for arg in args:
             if arg in options:
                 options[arg] = int(next(args))
-            elif not arg.startswith("--"):  # the target's own flags start with "--"
+            elif not arg.startswith("--"):  # the target's own flags start with "--" too
                 paths.append(arg)
         ran = 0
-        for data in inputs(paths, options["--inputs"], options["--seed"], max_len):
+        for ran, data in enumerate(inputs(paths, options["--inputs"], options["--seed"], max_len), start=1):
             try:
                 test_one_input(data)
             except BaseException:
                 sys.stderr.write("failing input (base64): %s\n" % base64.b64encode(data).decode())
                 raise
-            ran += 1
         print("replayed %d inputs" % ran, flush=True)
         return
     import atheris

@@ -1,19 +1,10 @@
-"""Fuzz target: raster descriptors from base64 text and from 104-byte images,
-and the module's base64 decoder writing into a caller's bytes.
-
-Each input is a short sequence of calls on one record (and on other records
-and wrong objects). Every call must either be refused with the exception and
-argument the binding's rules give, leaving the record as it was, or do
-exactly what the decoder's rules say, checked against a model of them
-written here: a text's UTF-8 bytes up to the first NUL or '=', each
-character's value (a byte outside the alphabet is its own value), four
-characters to three bytes, only the second write of phases 1 and 2 bounded
-by the length. The decoder is given a length it documents as enough (at
-least the bytes its unbounded writes reach), and guard bytes around the
-destination must stay untouched.
-
-Run under atheris by tools/fuzz.sh; `--replay` runs it without atheris (see
-fuzz_common)."""
+"""Fuzz target: raster records from base64 text and from 104-byte images, and
+the module's base64 decoder writing into a caller's bytes. Each input is a
+few calls on one record (and on other records and wrong objects); each must
+be refused with the exception and argument the binding's rules give, the
+record left as it was, or do what a model of the decoder written here does,
+the bytes around the decoder's destination untouched. Run under atheris by
+tools/fuzz.sh, without it by --replay (see fuzz_common)."""
 import base64
 import re
 
@@ -36,6 +27,11 @@ def decoded(raw):
     return re.split(rb"[\0=]", raw, maxsplit=1)[0]
 
 
+# The decoder's rules: a text's UTF-8 bytes up to the first NUL or '=', each
+# character's value (a byte outside the alphabet is its own value), four
+# characters to three bytes, the length's bytes cleared first, and only the
+# second write of phases 1 and 2 bounded by the length: the caller gives a
+# length that covers the others (reach()).
 def decode_into(raw, dest, start, length):
     """base64decode(raw, &dest[start], length) done on bytearray `dest`; False
     when a write would fall outside `dest`."""
@@ -63,8 +59,7 @@ def reach(raw):
     return (n - 1) // 4 * 3 + (1, 1, 2, 3)[(n - 1) % 4] if n else 0
 
 
-class TextSubclass(str):
-    pass
+TextSubclass = type("TextSubclass", (str,), {})
 
 
 def text_argument(r):

@@ -1,17 +1,9 @@
 """Fuzz target: the argument conversion of render_tarsel_effect_to_native_image.
-
-Each input builds the call's twenty arguments (sometimes fewer or more): effect
-instances, descriptor names, destinations of every kind the buffer protocol
-offers, lists of records, None and buffers, numbers at and past their ranges,
-objects of the wrong type and look-alikes of a T_RasterInfo. Every call must
-return or raise TypeError, ValueError, OverflowError or BufferError.
-  conversion (default)  the engine probe makes the render return at once; a
-      model of the typemaps says which argument is refused first and how, and
-      a call that converts returns what the probe answers.
-  --render  real renders of tiny frames, every argument of its type, buffers
-      as large as their descriptors say, descriptors otherwise arbitrary:
-      inputs stay as they were, a field render leaves the other field alone.
-Run under atheris by tools/fuzz.sh; `--replay` runs it without atheris."""
+Each input builds the call's twenty arguments (sometimes fewer or more), right
+and wrong, and the call must return or raise TypeError, ValueError,
+OverflowError or BufferError: with the render returning at once (the
+default), as a model of the typemaps says; with --render, rendering tiny
+frames for real. Run under atheris by tools/fuzz.sh, without it by --replay."""
 import array
 import base64
 import ctypes
@@ -171,6 +163,12 @@ def list_argument(r, kind, wrong):
     return (ListSubclass(items) if choice == 1 else items), len(items), TypeError if any(refused) else None
 
 
+# Conversion: effect instances, descriptor names, destinations of every kind
+# the buffer protocol offers, lists of records, None and buffers, numbers at
+# and past their ranges, objects of the wrong type and look-alikes of a
+# T_RasterInfo. The engine probe makes the render return at once; the first
+# argument that does not convert is refused, and with the exception its kind
+# gives, and a call that converts returns what the probe answers.
 def conversion_case(r):
     args, errors, lengths, chosen_instance = [], [], {}, None
     wrong_positions = {r.int_in(1, 20) for _ in range(r.pick([0, 0, 0, 1, 1, 2, 4]))}
@@ -261,6 +259,9 @@ def make_raster(r):
     return info, size
 
 
+# Render: every argument of its type, buffers as large as their descriptors
+# say (the caller's side of the contract), descriptors otherwise arbitrary.
+# Inputs stay as they were, and a field render leaves the other field alone.
 def render_case(r):
     instance, names = r.pick(instances)
     if r.one_in(30):

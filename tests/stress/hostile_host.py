@@ -47,16 +47,21 @@ def make(name, params):
 
 
 def attempt(call, what):
-    """Counts `what` done, or refused (a freed instance) or aborted; any
-    other exception goes on to end the worker as a fault."""
+    """Counts `what` done, refused (a freed instance) or aborted; any other
+    exception ends the worker as a fault."""
     try:
         result = call()
+    except RuntimeError as error:
+        if str(error) != "Tarsel Abort":
+            raise
+        counts[what + " aborted"] += 1
+    except ValueError as error:
+        if not str(error).endswith(FREED):
+            raise
+        counts[what + " refused"] += 1
+    else:
         counts[what] += 1
         return result
-    except (RuntimeError, ValueError) as error:
-        if str(error) != "Tarsel Abort" and not str(error).endswith(FREED):
-            raise
-        counts[what + (" aborted" if isinstance(error, RuntimeError) else " refused")] += 1
 
 
 installed = {"sources swapped": stress_frames.SharedFrameSource(), "drawings swapped": Drawing()}  # kept alive here
@@ -70,82 +75,78 @@ expected = [{frame: stress_frames.render(instance, frame, 48, 27)[1] for frame i
 stop = threading.Event()
 
 
-def renderer(index):
-    local = random.Random(SEED * 10 + index)
-    while not stop.is_set():
-        slot, frame = local.randrange(len(slots)), local.choice(FRAMES)
-        done = attempt(lambda: stress_frames.render(slots[slot], frame, 48, 27), "renders")
-        if done:
-            counts["failed"] += not done[0]
-            counts["wrong pixels"] += done[0] and done[1] != expected[slot][frame]
+# The workers, each a step repeated until the run stops, with a random
+# generator of its own.
+def renderer(local):
+    slot, frame = local.randrange(len(slots)), local.choice(FRAMES)
+    done = attempt(lambda: stress_frames.render(slots[slot], frame, 48, 27), "renders")
+    if done:
+        counts["failed"] += not done[0]
+        counts["wrong pixels"] += done[0] and done[1] != expected[slot][frame]
 
 
-def drawer():
-    while not stop.is_set():
-        if attempt(lambda: _renderlib.tarsel_widget_draw(widget[0], "", 480, 270, 0.0, 0.0, 0.25, 0.25,
-                                                         [1920, 1080, 0]) or True, "draws") is None:
-            time.sleep(0.001)  # until the remaker puts a new instance in place, or the abort is cleared
+def drawer(local):
+    if attempt(lambda: _renderlib.tarsel_widget_draw(widget[0], "", 480, 270, 0.0, 0.0, 0.25, 0.25,
+                                                     [1920, 1080, 0]) or True, "draws") is None:
+        time.sleep(0.001)  # until the remaker puts a new instance in place, or the abort is cleared
 
 
-def remaker():
-    local = random.Random(SEED + 1)
-    while not stop.is_set():
-        time.sleep(local.uniform(0.0, 0.01))
-        if local.random() < 0.7:
-            slot = local.randrange(len(slots))
-            old, slots[slot] = slots[slot], make(*RENDERED[slot])
-        else:
-            old, widget[0] = widget[0], _renderlib.init_tarsel_effect("T_LensFlare", False)
-        try:
-            _renderlib.free_tarsel_effect(old)  # often while a render or a draw uses it
-        except ValueError:
-            pass  # a drawing method freed it first
-        counts["instances remade"] += 1
+def remaker(local):
+    time.sleep(local.uniform(0.0, 0.01))
+    if local.random() < 0.7:
+        slot = local.randrange(len(slots))
+        old, slots[slot] = slots[slot], make(*RENDERED[slot])
+    else:
+        old, widget[0] = widget[0], _renderlib.init_tarsel_effect("T_LensFlare", False)
+    try:
+        _renderlib.free_tarsel_effect(old)  # often while a render or a draw uses it
+    except ValueError:
+        pass  # a drawing method freed it first
+    counts["instances remade"] += 1
 
 
-def swapper():
-    local = random.Random(SEED + 2)
-    handlers = [lambda level, text: None, lambda level, text: 1 / 0]  # the second raises on engine threads
-    # Each new object is installed first; the one before then loses its last
+HANDLERS = [lambda level, text: None, lambda level, text: 1 / 0]  # the second raises on engine threads
+SWAPS = [(_renderlib.set_load_frame_impl, stress_frames.SharedFrameSource, "sources swapped"),
+         (_renderlib.tarsel_set_gfx_impl, Drawing, "drawings swapped"),
+         (_renderlib.set_error_handler, lambda: rng.choice(HANDLERS), "handlers swapped")]
+
+
+def swapper(local):
+    time.sleep(local.uniform(0.0, 0.005))
+    install, new, what = local.choice(SWAPS)
+    # The new object is installed first; the one before then loses its last
     # reference, often while the engine is using it.
-    swaps = [(_renderlib.set_load_frame_impl, stress_frames.SharedFrameSource, "sources swapped"),
-             (_renderlib.tarsel_set_gfx_impl, Drawing, "drawings swapped"),
-             (_renderlib.set_error_handler, lambda: local.choice(handlers), "handlers swapped")]
-    while not stop.is_set():
-        time.sleep(local.uniform(0.0, 0.005))
-        install, new, what = local.choice(swaps)
-        obj = new()
-        install(obj)
-        installed[what] = obj
-        counts[what] += 1
+    obj = new()
+    install(obj)
+    installed[what] = obj
+    counts[what] += 1
 
 
-def aborter():
-    local = random.Random(SEED + 3)
-    while not stop.is_set():
-        time.sleep(local.uniform(0.01, 0.1))
-        _renderlib.tarsel_abort_render()
-        counts["aborts asked"] += 1
-        time.sleep(local.uniform(0.0, 0.003))
-        _renderlib.tarsel_clear_abort()
+def aborter(local):
+    time.sleep(local.uniform(0.01, 0.1))
+    _renderlib.tarsel_abort_render()
+    counts["aborts asked"] += 1
+    time.sleep(local.uniform(0.0, 0.003))
+    _renderlib.tarsel_clear_abort()
 
 
-def messenger():
-    while not stop.is_set():
-        counts["messages sent"] += probe.emit_from_worker(10, _renderlib.Err_Info, "hostile")
+def messenger(local):
+    counts["messages sent"] += probe.emit_from_worker(10, _renderlib.Err_Info, "hostile")
 
 
-def guarded(body, *args):
+def worker(step, seed):
     def run():
+        local = random.Random(seed)
         try:
-            body(*args)
+            while not stop.is_set():
+                step(local)
         except BaseException as error:  # noqa: B902 - anything that escapes is a fault
-            faults.append("%s: %r" % (body.__name__, error))
+            faults.append("%s: %r" % (step.__name__, error))
     return threading.Thread(target=run, daemon=True)
 
 
-threads = [guarded(renderer, i) for i in range(3)] + [guarded(body) for body in
-                                                       (drawer, remaker, swapper, aborter, messenger)]
+threads = [worker(step, SEED * 10 + i) for i, step in enumerate([renderer] * 3 + [drawer, remaker, swapper, aborter,
+                                                                                  messenger])]
 for thread in threads:
     thread.start()
 if not STEADY:

@@ -13,7 +13,6 @@ import _renderlib
 import stress_frames
 from engine_probe import loaded_library_path
 from renderlib import effects
-from renderlib.widgets import SvgDrawing
 
 started = threading.Event()
 
@@ -26,6 +25,7 @@ class SlowFrames(stress_frames.SharedFrameSource):
 
 
 def frames():
+    _renderlib.set_load_frame_impl(slow_frames)
     echo = effects.recreate(_renderlib.init_tarsel_effect("T_Echo", False), {"echoes": "8"})
     dest, source = effects.raster(_renderlib.pixel_rgbaf, 64, 36), effects.raster(_renderlib.pixel_rgbaf, 64, 36)
     for frame in range(10 ** 9):
@@ -39,6 +39,9 @@ def messages():
 
 
 def widgets():
+    from renderlib.widgets import SvgDrawing
+    drawing = SvgDrawing(char_width=4)
+    _renderlib.tarsel_set_gfx_impl(drawing)
     flare = _renderlib.init_tarsel_effect("T_LensFlare", False)
     while True:
         drawing.calls.clear()
@@ -46,9 +49,7 @@ def widgets():
         started.set()
 
 
-source, drawing = SlowFrames(), SvgDrawing(char_width=4)
-_renderlib.set_load_frame_impl(source)
-_renderlib.tarsel_set_gfx_impl(drawing)
+slow_frames = SlowFrames()
 _renderlib.set_error_handler(lambda level, text: None)
 for mode in sys.argv[1:]:
     threading.Thread(target=globals()[mode], daemon=True).start()

@@ -47,18 +47,10 @@ def test_the_interpreter_ends_cleanly_with_a_thread_drawing_widgets():
 RENDER_ON_ENDING_THREAD = """
 import os, sys
 {before}
-import _renderlib
-import renderlib
+import _renderlib, stress_frames
 from renderlib import effects
 
-class Frames(renderlib.LoadFrameInterface):
-    def load_frame(self, input, frame, width, height):
-        self.info, self.pixels = effects.raster(_renderlib.pixel_rgbaf, width, height)
-        return self.pixels
-    def current_raster_info(self, input):
-        return self.info
-
-frames = Frames()
+frames = stress_frames.SharedFrameSource()
 _renderlib.set_load_frame_impl(frames)
 echo = effects.recreate(_renderlib.init_tarsel_effect("T_Echo", False), {{"echoes": "3"}})
 dest, source = effects.raster(_renderlib.pixel_rgbaf, 16, 8), effects.raster(_renderlib.pixel_rgbaf, 16, 8)

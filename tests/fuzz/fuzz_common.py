@@ -18,8 +18,7 @@ if str(TESTS_DIR) not in sys.path:
 
 
 class ByteReader:
-    """Choices drawn from fuzz data, front to back; an exhausted reader
-    answers zeros, so every input decodes to something."""
+    """Choices drawn from fuzz data, front to back; zeros once it is used up."""
 
     def __init__(self, data):
         self.data, self.at = data, 0
@@ -88,7 +87,6 @@ def inputs(paths, count, seed, max_len):
 
 
 def main(test_one_input, max_len, default_inputs=2000):
-    """The entry point of a Python target."""
     faulthandler.enable()
     if "--replay" in sys.argv:
         options, paths, args = {"--inputs": default_inputs, "--seed": 0}, [], iter(sys.argv[1:])
@@ -121,10 +119,8 @@ def main(test_one_input, max_len, default_inputs=2000):
 
 
 def byte_address_module(folder=None):
-    """The tests' second SWIG module (tests/shared_registry.i), whose
-    byte_address(buffer, offset) gives the uchar_t pointer base64decode
-    takes; built into `folder` (default: $RENDERLIB_FUZZ_HELPERS, else
-    build-fuzz/helpers/ of the work tree) unless it is there already."""
+    """tests/shared_registry.i, whose byte_address(buffer, offset) gives base64decode's
+    uchar_t pointer, built into `folder`, $RENDERLIB_FUZZ_HELPERS or build-fuzz/helpers/."""
     import importlib
     import sysconfig
     from native_build import REPO, build_swig_module

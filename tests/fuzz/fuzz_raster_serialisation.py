@@ -33,8 +33,7 @@ def decoded(raw):
 # second write of phases 1 and 2 bounded by the length: the caller gives a
 # length that covers the others (reach()).
 def decode_into(raw, dest, start, length):
-    """base64decode(raw, &dest[start], length) done on bytearray `dest`; False
-    when a write would fall outside `dest`."""
+    """base64decode(raw, &dest[start], length) on bytearray `dest`; False for a write outside it."""
     if length == 0:
         return True
     dest[start:start + length] = bytes(length)
@@ -90,8 +89,7 @@ def text_argument(r):
 
 
 def check(call, args, refusal):
-    """Makes the call; `refusal` is None for a call that must go through, else
-    (exception class, the argument the message names)."""
+    """`refusal`: None for a call that must go through, else (exception, argument number)."""
     try:
         result = call(*args)
     except (TypeError, ValueError, OverflowError) as error:
@@ -107,8 +105,7 @@ class Case:
         self.r, self.info, self.shadow = r, renderlib.T_RasterInfo(), bytes(IMAGE)
 
     def record_argument(self):
-        """(argument, "ok" for this case's record as its proxy or its bare
-        pointer object, "wrong" for an object the call refuses, None for None)."""
+        """(argument, "ok" for the record or its bare pointer, "wrong" for another object, or None)."""
         choice = self.r.int_in(0, 11)
         if choice == 0:
             return self.r.pick([renderlib.T_RenderInfo(), 7, "record", bytearray(IMAGE)]), "wrong"

@@ -1,9 +1,9 @@
 """Fuzz target: the argument conversion of render_tarsel_effect_to_native_image.
-Each input builds the call's twenty arguments (sometimes fewer or more), right
-and wrong, and the call must return or raise TypeError, ValueError,
-OverflowError or BufferError: with the render returning at once (the
-default), as a model of the typemaps says; with --render, rendering tiny
-frames for real. Run under atheris by tools/fuzz.sh, without it by --replay."""
+Each input builds the call's twenty arguments, right and wrong, and the call
+must return or raise TypeError, ValueError, OverflowError or BufferError: as
+a model of the typemaps says with the render returning at once (the default),
+or rendering tiny frames for real (--render). Run under atheris by
+tools/fuzz.sh, without it by --replay."""
 import array
 import base64
 import ctypes
@@ -38,14 +38,12 @@ IntSubclass, FloatSubclass, TextSubclass = (type(t.__name__ + "Subclass", (t,), 
 ListSubclass = type("ListSubclass", (list,), {})
 
 
-class NamedRaster(renderlib.T_RasterInfo):
-    """A real record under another class name: refused by name."""
+NamedRaster = type("NamedRaster", (renderlib.T_RasterInfo,), {})  # a real record under another class name
 
 
 def look_alike(this=None, slots=False, raising=False, on_this=None):
-    """An object of a class named T_RasterInfo that is not the proxy class:
-    its `this` a plain attribute or a property (that may raise, or run
-    `on_this` first)."""
+    """An object of a class named T_RasterInfo, not the proxy class, whose `this`
+    is an attribute or a property (that may raise, or run `on_this` first)."""
     if not slots:
         obj = type("T_RasterInfo", (), {})()
         if this is not None:
@@ -92,8 +90,7 @@ WRONG_IMAGES = [lambda: bytes(8), lambda: readonly_array(4), lambda: memoryview(
                 lambda: numpy.zeros((4, 4), numpy.uint8)[:, ::2], lambda: "pixels", lambda: 8, renderlib.T_RasterInfo]
 
 
-def writable_buffer(r, size):
-    """A writable, contiguous buffer of exactly `size` bytes, of a kind the data chooses."""
+def writable_buffer(r, size):  # writable, contiguous, exactly `size` bytes
     return BUFFER_KINDS[r.int_in(0, 5)](size)
 
 
@@ -103,7 +100,8 @@ def wrong_scalar(r, kind):
     if kind == "int":
         value = r.pick([0, 1, -1, 2 ** 31 - 1, -2 ** 31, 2 ** 31, -2 ** 31 - 1, 2 ** 63, 2 ** 64 + 5, True,
                         IntSubclass(7), r.int32(), 1.0, "1", None, b"\x01"])
-        return value, TypeError if not isinstance(value, int) else None if -2 ** 31 <= value < 2 ** 31 else OverflowError
+        in_range = isinstance(value, int) and -2 ** 31 <= value < 2 ** 31
+        return value, None if in_range else OverflowError if isinstance(value, int) else TypeError
     if kind == "float":
         value = r.pick([0.0, 1.0, -1.0, math.nan, math.inf, -math.inf, 3.5e38, -1e300, FLT_MAX, 1, 2 ** 127,
                         2 ** 128, 10 ** 400, FloatSubclass(0.5), r.float32(), True, "1.0", None, 1j])
@@ -208,15 +206,10 @@ def conversion_case(r):
         args.append(value)
         errors.append(error)
     n_rasters = args[10]
-    if r.one_in(40):
-        args = args[:r.int_in(0, 19)] if r.flag() else args + [None]
     try:
         result, error = render(*args), None
     except ALLOWED as raised:
         result, error = None, raised
-    if len(args) != 20:
-        assert isinstance(error, TypeError) and "expected 20 arguments, got %d" % len(args) in str(error), error
-        return
     # Checked once every argument has converted, in argument order.
     errors += [ValueError if chosen_instance is dead_instance else None,
                ValueError if isinstance(n_rasters, int) and n_rasters > 0 and any(
@@ -231,8 +224,7 @@ def conversion_case(r):
     assert type(error) is first[1], (first, type(error), error)
 
 
-def mostly(r, usual, rare):
-    """One of `usual`, or now and then one of `rare` (settings the engine refuses)."""
+def mostly(r, usual, rare):  # now and then one of `rare`: settings the engine refuses
     return r.pick(rare) if r.one_in(16) else r.pick(usual)
 
 

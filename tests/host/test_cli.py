@@ -5,6 +5,7 @@ import sys
 
 import numpy as np
 import pytest
+import tifffile
 from PIL import Image
 
 from renderlib.cli import main
@@ -34,7 +35,6 @@ def test_render_reads_inputs_and_writes_every_tiff_depth(capsys, tmp_path):
         status, _, err = run(capsys, "render", "T_Transform", "-p", "position=24 16", "-i", str(tmp_path / "in.tif"),
                              "-o", str(out), "--depth", depth, "--colorspace", "linear", "-q")
         assert status == 0, err
-        import tifffile
         stored = tifffile.imread(out)
         assert stored.dtype == dtype and stored.shape == (32, 48, 4)
     # A transform that centres the frame gives the input back (to the 16-bit input's precision).

@@ -1,9 +1,12 @@
-"""A hostile host, run by test_hostile_host.py: python hostile_host.py SECONDS SEED [steady]
+"""A hostile host: threads render, draw widgets, free and re-make the instances
+the others use, swap the frame source, the drawing object and the handler,
+send engine messages and abort renders. Run by test_hostile_host.py:
 
-Without "steady" the main thread ends the interpreter after a random part of
-SECONDS with every worker busy; with it, the workers are stopped at the end,
-everything is freed and the process measures what it left behind. The last
-line of output is a JSON object of counts and faults."""
+    python hostile_host.py SECONDS SEED [steady]
+
+Without "steady" the interpreter ends after a random part of SECONDS with
+every worker busy; with it, the workers stop and everything is freed at the
+end. The last line of output is a JSON object of counts and faults."""
 import collections
 import gc
 import json
@@ -47,8 +50,7 @@ def make(name, params):
 
 
 def attempt(call, what):
-    """Counts `what` done, refused (a freed instance) or aborted; any other
-    exception ends the worker as a fault."""
+    """Counts `what` done, refused (a freed instance) or aborted; anything else is a fault."""
     try:
         result = call()
     except RuntimeError as error:
@@ -161,9 +163,8 @@ stop.set()
 for thread in threads:
     thread.join(30)
 _renderlib.tarsel_clear_abort()
-_renderlib.set_load_frame_impl(None)
-_renderlib.tarsel_set_gfx_impl(None)
-_renderlib.set_error_handler(None)
+for install, _, _ in SWAPS:
+    install(None)
 for instance in slots + widget:
     if instance.thisown:  # not freed by a drawing method
         _renderlib.free_tarsel_effect(instance)

@@ -1,9 +1,6 @@
-"""A hostile host (hostile_host.py): threads render, draw widgets, free and
-re-make the instances the others use, swap frame sources, drawing objects and
-handlers, send messages and abort, in processes of their own, once steady and
-then ending the interpreter at random moments. No crash or hang, every render
-gives the pixels it gives alone, and the steady run leaves nothing behind.
-
+"""A hostile host (hostile_host.py) in processes of their own, once steady and
+then ending the interpreter at random moments: no crash or hang, every render
+gives the pixels it gives alone, the steady run leaves nothing behind.
 RENDERLIB_HOSTILE_SECONDS sets the steady run's length (16 by default; the
 others live a tenth of it), RENDERLIB_HOSTILE_ENDINGS their number (24)."""
 import collections

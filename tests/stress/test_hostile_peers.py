@@ -1,10 +1,7 @@
-"""Shared-memory peers killed at random moments (between messages, holding
-the queue's lock, with a reservation open) while the survivor blocks in its
-reads, reaped at once or left as zombies (hostile_peers.py). No crash, no
-hang, no message committed and lost, duplicated, reordered or changed, and
-the survivor's descriptors, mappings and memory stay flat.
-
-RENDERLIB_PEER_STRESS_SECONDS sets the length (12 by default)."""
+"""Shared-memory peers killed at random moments while the survivor blocks in
+its reads (hostile_peers.py): no message committed and lost, duplicated,
+reordered or changed, and the survivor's descriptors, mappings and memory
+stay flat. RENDERLIB_PEER_STRESS_SECONDS sets the length (12 by default)."""
 import json
 import os
 import pathlib

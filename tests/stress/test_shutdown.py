@@ -1,11 +1,7 @@
-"""The interpreter ends cleanly while engine threads are inside host
-callbacks (a frame source busy in Python, messages from engine workers) and
-while a Python thread draws widgets: every run exits with status 0 within
-5 seconds. A render on the thread that ends the interpreter, after the
-module's exit step, ends as an abort instead of waiting for ever.
-
-RENDERLIB_SHUTDOWN_RUNS sets the number of runs (100 by default; the audit
-runs 1,000)."""
+"""The interpreter ends cleanly, every run within 5 s, while engine threads
+are inside host callbacks or a Python thread draws widgets, and a render on
+the thread that ends it, after the module's exit step, ends as an abort.
+RENDERLIB_SHUTDOWN_RUNS sets the number of runs (100; the audit runs 1,000)."""
 import concurrent.futures
 import os
 import pathlib
@@ -19,8 +15,7 @@ SCRIPT = pathlib.Path(__file__).with_name("shutdown_script.py").read_text()
 
 
 def check_endings(runs, modes):
-    """Runs shutdown_script.py `runs` times, four at a time, with the modes
-    modes(i) names; each must exit with status 0 within 5 s."""
+    """Runs shutdown_script.py with modes(i), four at a time: each exits with 0 within 5 s."""
     def run(index):
         try:
             done = run_python(SCRIPT, timeout=5, args=modes(index))

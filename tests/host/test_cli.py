@@ -86,14 +86,6 @@ def test_bad_options_are_usage_errors(capsys, argv):
     assert "usage: renderlib" in capsys.readouterr().err
 
 
-def test_monitor_shows_a_sequence_on_a_device(capsys, tmp_path, monkeypatch):
-    monkeypatch.setenv("QRV_MONITOR_FOLDER", str(tmp_path))
-    status, out, err = run(capsys, "monitor", "T_Glow", "--device", "folder", "--mode", "320x180p25", "-f", "0-2")
-    assert status == 0, err
-    assert out == "folder: 3 frame(s) of 320x180 shown\n"
-    assert sorted(p.name for p in tmp_path.iterdir()) == ["frame-00000%d.png" % i for i in range(3)]
-
-
 def test_contact_sheet_renders_every_effect(capsys, tmp_path):
     from renderlib import effects
     status, out, err = run(capsys, "contact-sheet", "-o", str(tmp_path), "--size", "64x36", "-q")

@@ -42,15 +42,6 @@ def test_two_displays_are_independent(probe):
     rl.release_external_monitor(second)
 
 
-def test_release_destroys_the_display_and_the_proxy_is_refused_after(display, probe):
-    live, number = probe.live_displays(), probe.number(display)
-    rl.release_external_monitor(display)
-    assert probe.live_displays() == live - 1 and probe.calls()[-1] == "display%d.~EM_Display()" % number
-    for call in (lambda: rl.EM_Display_devices(display), lambda: rl.release_external_monitor(display)):
-        with pytest.raises(ValueError, match=r"^in method '\w+', argument 1 of type 'EM_Display \*': no display"):
-            call()
-
-
 @pytest.mark.parametrize("function, args, position, ctype", [
     ("EM_Display_connect", ("D", "preview", "x"), 1, "EM_Display *"),
     ("EM_Display_connect", (None, 2, "x"), 2, "char const *"),

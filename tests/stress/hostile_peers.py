@@ -65,11 +65,9 @@ for sequence in range(10 ** 9):
 
 
 def dead(process):
-    """Whether the process has died, reaped or not."""
-    try:
-        return pathlib.Path("/proc/%d/stat" % process.pid).read_text().rsplit(")", 1)[1].split()[0] in "ZX"
-    except FileNotFoundError:
-        return True
+    """Whether the process has died, reaped or not (waitid leaves a zombie as it is)."""
+    return process.returncode is not None or os.waitid(os.P_PID, process.pid,
+                                                       os.WEXITED | os.WNOHANG | os.WNOWAIT) is not None
 
 
 def resources():

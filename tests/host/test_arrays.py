@@ -38,19 +38,17 @@ def test_every_layout_renders_into_its_array(layout, dtype):
     np.testing.assert_allclose(got, expected(card, layout, dtype), atol=tolerance)
 
 
-def test_the_default_layout_follows_the_channel_count():
-    for channels, pixel_type in ((1, _renderlib.pixel_l8), (2, _renderlib.pixel_la8), (3, _renderlib.pixel_rgb8),
-                                 (4, _renderlib.pixel_rgba8)):
-        shape = (4, 4) if channels == 1 else (4, 4, channels)
-        assert arrays.raster_info_for(np.zeros(shape, np.uint8)).pixel_type == pixel_type
+@pytest.mark.parametrize("channels, pixel_type", [(1, "pixel_l8"), (2, "pixel_la8"), (3, "pixel_rgb8"),
+                                                    (4, "pixel_rgba8")])
+def test_the_default_layout_follows_the_channel_count(channels, pixel_type):
+    array = np.zeros((4, 4, channels)[:2 if channels == 1 else 3], np.uint8)
+    assert arrays.raster_info_for(array).pixel_type == getattr(_renderlib, pixel_type)
 
 
 @pytest.mark.parametrize("array, layout, error, message", [
-    (np.zeros((8, 8, 4), np.uint8)[:, ::2], None, ValueError, "not C-contiguous"),
     (np.zeros((8, 8, 4), np.uint8).transpose(1, 0, 2), None, ValueError, "not C-contiguous"),
     (np.zeros((2, 8, 8, 4), np.uint8), None, ValueError, "not 4-dimensional"),
     (np.zeros(8, np.uint8), None, ValueError, "not 1-dimensional"),
-    (np.zeros((8, 8, 4), np.float64), None, ValueError, "no RGBA pixels of float64"),
     (np.zeros((8, 8, 4), np.int32), None, ValueError, "no RGBA pixels of int32"),
     (np.zeros((8, 8, 3), np.uint16), "BGR", ValueError, "no BGR pixels of uint16"),
     (np.zeros((8, 8, 4), np.uint8), "RGB", ValueError, "4 channels do not match layout 'RGB'"),
@@ -70,21 +68,10 @@ def test_array_for_allocates_what_the_descriptor_describes(pixel_type):
     assert arrays.raster_info_for(array, arrays.layout_of(info)).pixel_type == pixel_type
 
 
-def test_array_for_refuses_padded_lines_and_unknown_types():
+@pytest.mark.parametrize("field, value, message", [("extra_line_stride_elts", 4, "pads its lines"),
+                                                    ("pixel_type", _renderlib.pixel_rgb10, "no array type for pixel")])
+def test_array_for_refuses_padded_lines_and_unknown_types(field, value, message):
     info, _ = effects.raster(_renderlib.pixel_rgba8, 7, 5)
-    info.extra_line_stride_elts = 4
-    with pytest.raises(ValueError, match="pads its lines"):
+    setattr(info, field, value)
+    with pytest.raises(ValueError, match=message):
         arrays.array_for(info)
-    info, _ = effects.raster(_renderlib.pixel_rgba8, 7, 5)
-    info.pixel_type = _renderlib.pixel_rgb10
-    with pytest.raises(ValueError, match="no array type for pixel type 24"):
-        arrays.array_for(info)
-
-
-def test_a_render_into_numpy_takes_three_lines():
-    source = card_frame(64, 36)
-    out = np.zeros((36, 64, 4), np.float32)
-    glow = _renderlib.init_tarsel_effect("T_Glow", False)
-    assert effects.render(glow, arrays.described(out), [arrays.described(source)])
-    _renderlib.free_tarsel_effect(glow)
-    assert out[..., 3].min() == 1 and out[..., :3].max() > 0.9

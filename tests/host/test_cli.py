@@ -5,6 +5,7 @@ import sys
 
 import numpy as np
 import pytest
+import tifffile
 from PIL import Image
 
 from renderlib.cli import main
@@ -26,23 +27,6 @@ def test_list_shows_both_catalogues_with_categories(capsys):
     assert "Effect builder (" in out and "T_BuilderMix" in out.split("Effect builder")[1]
 
 
-def test_info_describes_inputs_and_parameters(capsys):
-    status, out, _ = run(capsys, "info", "T_Blur")
-    assert status == 0
-    assert "inputs: Source\n" in out
-    assert "  radius             float        default 5  [0 .. 500]\n" in out
-    assert "states: Draft | Normal | High  group: Advanced" in out
-
-
-def test_render_writes_the_frames_of_a_range(capsys, tmp_path):
-    status, out, err = run(capsys, "render", "T_Blur", "-o", str(tmp_path / "blur.##.png"), "--size", "64x36",
-                           "-f", "3-5", "-p", "radius=2", "-q")
-    assert (status, out, err) == (0, "", "")
-    assert sorted(p.name for p in tmp_path.iterdir()) == ["blur.03.png", "blur.04.png", "blur.05.png"]
-    with Image.open(tmp_path / "blur.04.png") as png:
-        assert (png.mode, png.size) == ("RGBA", (64, 36))
-
-
 def test_render_reads_inputs_and_writes_every_tiff_depth(capsys, tmp_path):
     source = card_frame(48, 32, 0)
     write_image(tmp_path / "in.tif", source, "16")
@@ -51,7 +35,6 @@ def test_render_reads_inputs_and_writes_every_tiff_depth(capsys, tmp_path):
         status, _, err = run(capsys, "render", "T_Transform", "-p", "position=24 16", "-i", str(tmp_path / "in.tif"),
                              "-o", str(out), "--depth", depth, "--colorspace", "linear", "-q")
         assert status == 0, err
-        import tifffile
         stored = tifffile.imread(out)
         assert stored.dtype == dtype and stored.shape == (32, 48, 4)
     # A transform that centres the frame gives the input back (to the 16-bit input's precision).
@@ -73,8 +56,6 @@ def test_a_sequence_input_is_read_frame_by_frame(capsys, tmp_path):
     (["render", "T_Nothing", "-o", "x.png"], 2, "renderlib: no effect 'T_Nothing' (see: renderlib list"),
     (["info", "T_Nothing"], 2, "renderlib: no effect 'T_Nothing'"),
     (["render", "T_Blur", "-o", "x.png", "-p", "nothing=1"], 2, "renderlib: T_Blur has no parameter 'nothing'"),
-    (["render", "T_Blur", "-o", "x.png", "-p", "quality=Astonishing"], 2,
-     'renderlib: T_Blur: Parameter "Quality": cannot read "Astonishing" as a popup value'),
     (["render", "T_Blur", "-o", "x.png", "-f", "0-3"], 2, "needs an output pattern such as out.####.png"),
     (["render", "T_Blur", "-o", "x.png", "-i", "a.png", "-i", "b.png"], 4, "renderlib: cannot read a.png"),
     (["render", "T_Gradient", "-o", "x.png", "-i", "{card}"], 2, "T_Gradient takes 0 input(s), 1 given"),
@@ -105,16 +86,6 @@ def test_bad_options_are_usage_errors(capsys, argv):
     assert "usage: renderlib" in capsys.readouterr().err
 
 
-def test_monitor_shows_a_sequence_and_lists_devices(capsys, tmp_path, monkeypatch):
-    monkeypatch.setenv("QRV_MONITOR_FOLDER", str(tmp_path))
-    status, out, err = run(capsys, "monitor", "T_Glow", "--device", "folder", "--mode", "320x180p25", "-f", "0-2")
-    assert status == 0, err
-    assert out == "folder: 3 frame(s) of 320x180 shown\n"
-    assert sorted(p.name for p in tmp_path.iterdir()) == ["frame-00000%d.png" % i for i in range(3)]
-    status, out, _ = run(capsys, "monitor", "--list")
-    assert status == 0 and out.splitlines()[0].startswith("preview    1920x1080p25")
-
-
 def test_contact_sheet_renders_every_effect(capsys, tmp_path):
     from renderlib import effects
     status, out, err = run(capsys, "contact-sheet", "-o", str(tmp_path), "--size", "64x36", "-q")
@@ -139,17 +110,10 @@ def test_contact_sheet_renders_every_effect(capsys, tmp_path):
     assert 0.01 < drawn.mean() < 0.5
 
 
-def test_version_reports_the_build_identity(capsys):
-    status, out, _ = run(capsys, "version")
-    assert status == 0
-    assert "build identity:   match\n" in out and "user check:" in out and "-> ok" in out
-
-
-def test_the_installed_commands_run_the_same_program(tmp_path):
-    script = pathlib.Path(sys.executable).with_name("renderlib")
-    for command in ([sys.executable, "-m", "renderlib"], [str(script)]):
-        done = subprocess.run(command + ["info", "T_Nothing"], capture_output=True, text=True, timeout=60)
-        assert done.returncode == 2 and done.stderr.startswith("renderlib: no effect 'T_Nothing'")
-        done = subprocess.run(command + ["render", "T_Gradient", "--size", "16x9", "-o", str(tmp_path / "g.png")],
-                              capture_output=True, text=True, timeout=60)
-        assert done.returncode == 0 and done.stdout == "%s: 1 frame(s) of 16x9\n" % (tmp_path / "g.png")
+def test_the_installed_command_runs_the_same_program(tmp_path):
+    command = [str(pathlib.Path(sys.executable).with_name("renderlib"))]
+    done = subprocess.run(command + ["info", "T_Nothing"], capture_output=True, text=True, timeout=60)
+    assert done.returncode == 2 and done.stderr.startswith("renderlib: no effect 'T_Nothing'")
+    done = subprocess.run(command + ["render", "T_Gradient", "--size", "16x9", "-o", str(tmp_path / "g.png")],
+                          capture_output=True, text=True, timeout=60)
+    assert done.returncode == 0 and done.stdout == "%s: 1 frame(s) of 16x9\n" % (tmp_path / "g.png")

@@ -21,8 +21,6 @@ class MonitorProbe:
         lib.qrv_probe_preview_frame.argtypes = [
             ctypes.c_void_p, ctypes.c_void_p, ctypes.c_int, ctypes.POINTER(ctypes.c_int),
             ctypes.POINTER(ctypes.c_int), ctypes.POINTER(ctypes.c_longlong), ctypes.c_char_p, ctypes.c_int]
-        lib.qrv_probe_set_init_fails.argtypes = [ctypes.c_int]
-        lib.qrv_probe_set_no_devices.argtypes = [ctypes.c_int]
 
     def calls(self):
         """The call log, oldest first."""
@@ -50,19 +48,10 @@ class MonitorProbe:
 
     def preview_frame(self, display):
         """(bgra bytes, width, height, frames shown since connect, image name)
-        of the preview device's last frame; None for no live display."""
+        of the preview device's last frame (at most 1920x1080)."""
         width, height, frames = ctypes.c_int(), ctypes.c_int(), ctypes.c_longlong()
-        name = ctypes.create_string_buffer(256)
-        size = self.lib.qrv_probe_preview_frame(address(display), None, 0, None, None, None, None, 0)
-        if size < 0:
-            return None
-        pixels = ctypes.create_string_buffer(max(size, 1))
-        self.lib.qrv_probe_preview_frame(address(display), pixels, size, ctypes.byref(width),
-                                         ctypes.byref(height), ctypes.byref(frames), name, len(name))
+        pixels, name = ctypes.create_string_buffer(1920 * 1080 * 4), ctypes.create_string_buffer(256)
+        size = self.lib.qrv_probe_preview_frame(address(display), pixels, len(pixels), ctypes.byref(width),
+                                                ctypes.byref(height), ctypes.byref(frames), name, len(name))
+        assert size >= 0, "no live display"
         return pixels.raw[:size], width.value, height.value, frames.value, name.value.decode()
-
-    def init_fails(self, on):
-        self.lib.qrv_probe_set_init_fails(int(on))
-
-    def no_devices(self, on):
-        self.lib.qrv_probe_set_no_devices(int(on))

@@ -31,24 +31,18 @@ def preview(display):
     return display
 
 
-@pytest.mark.parametrize("fmt, bgra_order", [
-    (rl.EM_ImageFormat_32BitIntBGRA, [0, 1, 2, 3]),
-    (rl.EM_ImageFormat_32BitIntARGB, [3, 2, 1, 0]),
+@pytest.mark.parametrize("fmt, bgra_order, bottom_up, padding", [
+    (rl.EM_ImageFormat_32BitIntBGRA, [0, 1, 2, 3], False, 0),
+    (rl.EM_ImageFormat_32BitIntARGB, [3, 2, 1, 0], False, 0),
+    (rl.EM_ImageFormat_32BitIntBGRA, [0, 1, 2, 3], True, 5),  # rows bottom up, 20 bytes of padding a row
 ])
-def test_a_frame_arrives_pixel_exact_in_either_format(preview, probe, fmt, bgra_order):
-    frame = random_frame(fmt)
-    image = wrap(preview, frame, fmt=fmt, name="exact")
+def test_a_frame_arrives_pixel_exact(preview, probe, fmt, bgra_order, bottom_up, padding):
+    frame = random_frame(fmt + padding, row_pixels=WIDTH + padding)
+    image = wrap(preview, frame, row_bytes=(WIDTH + padding) * 4, bottom_up=bottom_up, fmt=fmt, name="exact")
     assert rl.EM_Display_display_frame(preview, "preview", image) == rl.EM_errorNone
     pixels, frames, name = shown(probe, preview)
-    np.testing.assert_array_equal(pixels, frame[:, :, bgra_order])
+    np.testing.assert_array_equal(pixels, frame[::-1 if bottom_up else 1, :WIDTH][:, :, bgra_order])
     assert (frames, name) == (1, "exact")
-
-
-def test_rows_bottom_up_and_padded_rows(preview, probe):
-    frame = random_frame(3, row_pixels=WIDTH + 5)  # 20 bytes of padding a row
-    image = wrap(preview, frame, row_bytes=(WIDTH + 5) * 4, bottom_up=True)
-    assert preview.display_frame("preview", image) == rl.EM_errorNone
-    np.testing.assert_array_equal(shown(probe, preview)[0], frame[::-1, :WIDTH])
 
 
 def test_premultiplied_video_range_is_shown_straight_full_range(preview, probe):
@@ -76,18 +70,14 @@ def test_the_pixels_go_by_address_and_are_read_only_at_display_time(preview, pro
     assert shown(probe, preview)[0][0, 0].tolist() == [1, 2, 3, 4]
 
 
-def test_read_only_buffers_are_accepted_and_other_objects_refused(preview, probe):
+def test_read_only_buffers_are_accepted(preview, probe):
     frame = bytes(random_frame(5))
-    image = wrap(preview, frame)
-    assert preview.display_frame("preview", image) == rl.EM_errorNone
+    assert preview.display_frame("preview", wrap(preview, frame)) == rl.EM_errorNone
     assert shown(probe, preview)[0].tobytes() == frame
-    for not_pixels in (12, "pixels", None):
-        with pytest.raises(TypeError) as raised:
-            wrap(preview, not_pixels)
-        assert str(raised.value) == "in method 'EM_Display_EM_XIImageWrapper', argument 2 of type '(RawImage)'"
 
 
 @pytest.mark.parametrize("position, bad, ctype", [
+    (2, 12, "(RawImage)"), (2, "pixels", "(RawImage)"), (2, None, "(RawImage)"),
     (3, 1.5, "EM_SInt32"), (4, "w", "EM_SInt32"), (5, None, "EM_SInt32"), (6, 5, "char *"),
     (7, 1, "bool"), (8, "BGRA", "EM_ImageFormat"), (9, "1", "double"), (10, None, "double"),
     (11, 0, "bool"), (12, None, "bool"),
@@ -101,12 +91,6 @@ def test_image_arguments_are_checked_in_order(preview, position, bad, ctype):
     assert str(raised.value) == "in method 'EM_Display_EM_XIImageWrapper', argument %d of type '%s'" % (position, ctype)
 
 
-def test_eleven_arguments_after_the_display_are_required(preview):
-    args = [preview, bytearray(16), 2, 2, 8, "n", False, 0, 1.0, 0.0, False, True]
-    with pytest.raises(TypeError, match=r"^EM_Display_EM_XIImageWrapper expected 12 arguments, got 11$"):
-        rl.EM_Display_EM_XIImageWrapper(*args[:-1])
-
-
 @pytest.mark.parametrize("change", [
     dict(size=(0, 360)), dict(row_bytes=WIDTH * 4 - 1), dict(fmt=2), dict(aspect=0.0),
     dict(aspect=float("nan")), dict(gamma=-1.0),
@@ -117,13 +101,9 @@ def test_values_the_library_cannot_read_make_no_image(preview, change):
 
 def test_frames_are_refused_with_a_status(display, probe):
     image = wrap(display, random_frame(6))
-    small = wrap(display, bytearray(320 * 180 * 4), row_bytes=320 * 4, size=(320, 180))
-    assert display.display_frame("preview", image) == rl.EM_errorDevice   # not connected
     assert display.display_frame("nowhere", image) == rl.EM_errorNotFound
     display.connect("preview", "640x360p25")
-    assert display.display_frame("preview", small) == rl.EM_errorParam    # not the mode's size
-    assert display.display_frame("preview", None) == rl.EM_errorParam
-    assert display.display_frame(None, image) == rl.EM_errorParam
+    assert display.display_frame("preview", None) == display.display_frame(None, image) == rl.EM_errorParam
     assert probe.preview_frame(display)[3] == 0
 
 

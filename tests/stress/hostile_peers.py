@@ -1,19 +1,14 @@
-"""A survivor and a line of peers that die: this process serves a segment
-and starts peer processes one after the other. Each peer connects (taking
-the dead one's place), sends numbered messages (written, or reserved and
-committed), reads what this process sends back, and kills itself with
-SIGKILL at a random moment: between messages, holding the queue's lock, or
-with a reservation open. This process blocks in read_pybuf, takes each death
-as the end of its wait, and reaps the dead at once or leaves them zombies
-for a while. Run by test_hostile_peers.py:
+"""The survivor of test_hostile_peers.py: serves a segment and starts peers
+one after the other, each taking the dead one's place, sending numbered
+messages and killing itself at a random moment; blocks in read_pybuf, takes
+each death as the end of its wait, and reaps the dead at once or leaves them
+zombies for a while. Prints a JSON object of counts last.
 
-    python hostile_peers.py NAME SECONDS SEED
-
-The last line of output is a JSON object of counts. A committed message that
-never arrives, or one that arrives twice, out of order or changed, is a
-fault."""
+    python hostile_peers.py NAME SECONDS SEED"""
+import collections
 import json
 import os
+import pathlib
 import random
 import struct
 import subprocess
@@ -26,12 +21,13 @@ import renderlib  # noqa: F401  (registers the proxy classes)
 from process_memory import resident_kib
 
 NAME, SECONDS, SEED = sys.argv[1], float(sys.argv[2]), int(sys.argv[3])
-E = _renderlib
 rng = random.Random(SEED)
 
 # A message of peer NUMBER: its sequence number and NUMBER, then one byte
-# repeated. The peer notes each message in its ledger after committing it,
-# so the survivor knows the least it must receive.
+# repeated, written or reserved and committed. The peer notes each message in
+# its ledger once committed, so the survivor knows the least it must receive,
+# and dies by SIGKILL between messages, holding the queue's lock or with a
+# reservation open.
 PEER = r"""
 import os, random, signal, struct, sys, threading
 import _renderlib, renderlib
@@ -50,7 +46,7 @@ for sequence in range(10 ** 9):
         if way == 1:  # holding the queue's lock: it never lets go, so a timer kills
             threading.Timer(rng.uniform(0.0, 0.02), os.kill, (os.getpid(), signal.SIGKILL)).start()
             EngineProbe().lib.tarsel_probe_shmem_stall_holding_lock(int(transport.this), 1)
-        elif way == 2:  # with a reservation open
+        elif way == 2:
             transport.reserve_pybuf(len(body), "open")[:] = body
         os.kill(os.getpid(), signal.SIGKILL)
     if sequence % 2:
@@ -69,30 +65,25 @@ for sequence in range(10 ** 9):
 
 
 def dead(process):
-    """Whether the process has died, reaped or not."""
-    try:
-        with open("/proc/%d/stat" % process.pid) as stat:
-            return stat.read().rsplit(")", 1)[1].split()[0] in "ZX"
-    except FileNotFoundError:
-        return True
+    """Whether the process has died, reaped or not (waitid leaves a zombie as it is)."""
+    return process.returncode is not None or os.waitid(os.P_PID, process.pid,
+                                                       os.WEXITED | os.WNOHANG | os.WNOWAIT) is not None
 
 
 def resources():
     """Open descriptors, mappings of shared-memory segments, resident KiB."""
-    with open("/proc/self/maps") as maps:
-        return len(os.listdir("/proc/self/fd")), sum("/dev/shm/" in line for line in maps), resident_kib()
+    maps = pathlib.Path("/proc/self/maps").read_text().splitlines()
+    return len(os.listdir("/proc/self/fd")), sum("/dev/shm/" in line for line in maps), resident_kib()
 
 
 server = _renderlib.ShmemManager_serve(NAME, 1 << 16, 1 << 16)
-assert server is not None
-ledgers = tempfile.mkdtemp(prefix="peer-ledgers-")
-counts = {"peers": 0, "deaths": 0, "left as zombies": 0, "messages": 0, "bytes": 0, "echoes": 0,
-          "lost": 0, "out of order": 0, "changed": 0}
+ledgers = pathlib.Path(tempfile.mkdtemp(prefix="peer-ledgers-"))
+counts = collections.Counter(dict.fromkeys(["left as zombies", "lost", "out of order", "changed"], 0))
 faults, zombies = [], []
 
 
 def serve_one_peer(number):
-    ledger = os.path.join(ledgers, str(number))
+    ledger = ledgers / str(number)
     peer = subprocess.Popen([sys.executable, "-c", PEER, NAME, str(number), str(rng.randrange(10 ** 9)), ledger])
     received = 0
     while True:
@@ -104,18 +95,17 @@ def serve_one_peer(number):
                 break  # RETRY: the peer died (its committed messages were all read first)
             continue
         data = bytes(view)
-        sequence, sender = struct.unpack_from("<QI", data)
-        if (sequence, sender) != (received, number):
+        if struct.unpack_from("<QI", data) != (received, number):
             counts["out of order"] += 1
-        elif data[12:] != bytes([(number * 31 + sequence) % 251]) * (len(data) - 12):
+        elif data[12:] != bytes([(number * 31 + received) % 251]) * (len(data) - 12):
             counts["changed"] += 1
         received += 1
-        counts["messages"] += 1
-        counts["bytes"] += len(data)
-        if server.try_write_pybuf(bytes([received % 256]) * 100):
-            counts["echoes"] += 1
-    if server.get_last_error() != E.ShmemError_RETRY:
+        counts.update(messages=1, bytes=len(data), echoes=server.try_write_pybuf(bytes([received % 256]) * 100))
+    if server.get_last_error() != _renderlib.ShmemError_RETRY:
         faults.append("peer %d: the wait ended with error %d" % (number, server.get_last_error()))
+    if not dead(peer):
+        faults.append("peer %d: the wait ended while it was alive" % number)
+        peer.kill()
     counts["deaths"] += 1
     if rng.random() < 0.5:
         zombies.append(peer)
@@ -126,14 +116,11 @@ def serve_one_peer(number):
         for zombie in zombies:
             zombie.wait()
         zombies.clear()
-    with open(ledger) as notes:
-        committed = len(notes.read().split())
-    os.unlink(ledger)
+    committed = len(ledger.read_text().split()) if ledger.exists() else 0  # none: the peer never connected
+    ledger.unlink(missing_ok=True)
     # The peer may die between committing a message and noting it: one more.
-    if received < committed:
-        counts["lost"] += committed - received
-    if received > committed + 1:
-        counts["out of order"] += received - committed - 1
+    counts["lost"] += max(committed - received, 0)
+    counts["out of order"] += max(received - committed - 1, 0)
     if peer.poll() not in (None, -9):
         faults.append("peer %d ended with %s" % (number, peer.returncode))
 
@@ -146,10 +133,9 @@ while time.monotonic() - start < SECONDS:
         warm = resources()
 for zombie in zombies:
     zombie.wait()
-os.rmdir(ledgers)
+ledgers.rmdir()
 server.remove()
 now = resources()
 warm = warm or now
-counts.update(files_growth=now[0] - warm[0], mappings_growth=now[1] - warm[1], rss_growth_kib=now[2] - warm[2],
-              faults=faults)
-print(json.dumps(counts))
+counts.update(files_growth=now[0] - warm[0], mappings_growth=now[1] - warm[1], rss_growth_kib=now[2] - warm[2])
+print(json.dumps(dict(counts, faults=faults)))

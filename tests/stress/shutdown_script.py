@@ -1,54 +1,56 @@
-"""Ends the interpreter while engine threads are inside host callbacks: a
-render in a daemon thread whose frame source is busy in Python, and an
-engine worker sending messages to a Python handler. Exits with status 0
-when the interpreter's end is clean."""
+"""Ends the interpreter while engine threads are inside host callbacks, each
+thread of the modes named on the command line started first:
+    frames    a render in a daemon thread whose frame source is busy in Python
+    messages  an engine worker sending messages to a Python handler
+    widgets   a daemon Python thread drawing widgets through a Python drawing object
+Exits with status 0 when the interpreter's end is clean."""
+import ctypes
 import sys
 import threading
 import time
 
-import numpy
-
 import _renderlib
-import renderlib
+import stress_frames
+from engine_probe import loaded_library_path
 from renderlib import effects
 
-inside = threading.Event()
+started = threading.Event()
 
 
-class SlowFrames(renderlib.LoadFrameInterface):
-    def load_frame(self, input, frame, width, height):
-        self.info, pixels = effects.raster(_renderlib.pixel_rgbaf, width, height)
-        numpy.frombuffer(pixels, numpy.float32)[:] = 0.5
-        self.pixels = pixels
-        inside.set()
+class SlowFrames(stress_frames.SharedFrameSource):
+    def load_frame(self, *request):
+        started.set()
         time.sleep(0.002)  # the engine thread is in Python when the interpreter ends
-        return pixels
-
-    def current_raster_info(self, input):
-        return self.info
+        return super().load_frame(*request)
 
 
-def render_forever(instance):
-    dest = effects.raster(_renderlib.pixel_rgbaf, 64, 36)
-    source = effects.raster(_renderlib.pixel_rgbaf, 64, 36)
-    frame = 0
+def frames():
+    _renderlib.set_load_frame_impl(slow_frames)
+    echo = effects.recreate(_renderlib.init_tarsel_effect("T_Echo", False), {"echoes": "8"})
+    dest, source = effects.raster(_renderlib.pixel_rgbaf, 64, 36), effects.raster(_renderlib.pixel_rgbaf, 64, 36)
+    for frame in range(10 ** 9):
+        effects.render(echo, dest, [source], frame=frame)
+
+
+def messages():
+    engine = ctypes.CDLL(loaded_library_path("tarsel_ps"))
     while True:
-        effects.render(instance, dest, [source], frame=frame)
-        frame += 1
+        engine.tarsel_probe_emit_from_worker(50, _renderlib.Err_Info, b"late message")
 
 
-def emit_forever(probe):
+def widgets():
+    from renderlib.widgets import SvgDrawing
+    drawing = SvgDrawing(char_width=4)
+    _renderlib.tarsel_set_gfx_impl(drawing)
+    flare = _renderlib.init_tarsel_effect("T_LensFlare", False)
     while True:
-        probe.tarsel_probe_emit_from_worker(50, _renderlib.Err_Info, b"late message")
+        drawing.calls.clear()
+        _renderlib.tarsel_widget_draw(flare, "", 960, 540, 0.0, 0.0, 0.5, 0.5, [1920, 1080, 0])
+        started.set()
 
 
-frames = SlowFrames()
-_renderlib.set_load_frame_impl(frames)
+slow_frames = SlowFrames()
 _renderlib.set_error_handler(lambda level, text: None)
-echo = effects.recreate(_renderlib.init_tarsel_effect("T_Echo", False), {"echoes": "8"})
-threading.Thread(target=render_forever, args=(echo,), daemon=True).start()
-if len(sys.argv) > 1:
-    import ctypes
-    from engine_probe import loaded_library_path
-    threading.Thread(target=emit_forever, args=(ctypes.CDLL(loaded_library_path("tarsel_ps")),), daemon=True).start()
-inside.wait(5)
+for mode in sys.argv[1:]:
+    threading.Thread(target=globals()[mode], daemon=True).start()
+started.wait(5)

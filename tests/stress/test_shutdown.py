@@ -1,77 +1,39 @@
-"""The interpreter ends cleanly while engine threads are inside host
-callbacks (a frame source busy in Python, messages from engine workers) and
-while a Python thread draws widgets: every run exits with status 0 within
-5 seconds. A render on the thread that ends the interpreter, after the
-module's exit step, ends as an abort instead of waiting for ever.
-
-RENDERLIB_SHUTDOWN_RUNS sets the number of runs (100 by default; the audit
-runs 1,000)."""
+"""The interpreter ends cleanly, every run within 5 s, while engine threads
+are inside host callbacks or a Python thread draws widgets, and a render on
+the thread that ends it, after the module's exit step, ends as an abort.
+RENDERLIB_SHUTDOWN_RUNS sets the number of runs (100; the audit runs 1,000)."""
 import concurrent.futures
 import os
 import pathlib
-import subprocess
-import sys
 
 import pytest
 
 from isolated import ending, run_cleanly, run_python
 
 RUNS = int(os.environ.get("RENDERLIB_SHUTDOWN_RUNS", "100"))
-SCRIPT = pathlib.Path(__file__).with_name("shutdown_script.py")
-TESTS = pathlib.Path(__file__).parents[1]
+SCRIPT = pathlib.Path(__file__).with_name("shutdown_script.py").read_text()
 
 
-def run_once(index):
-    """(index, None) for a clean exit, else (index, what went wrong)."""
-    arguments = [sys.executable, str(SCRIPT)] + (["messages"] if index % 2 else [])
-    env = dict(os.environ, PYTHONPATH=os.pathsep.join([str(TESTS)] + sys.path))
-    try:
-        done = subprocess.run(arguments, capture_output=True, text=True, timeout=5, env=env)
-    except subprocess.TimeoutExpired:
-        return index, "did not exit within 5 s"
-    if done.returncode != 0:
-        return index, "exit status %d: %s" % (done.returncode, done.stderr.strip()[-300:])
-    return index, None
+def check_endings(runs, modes):
+    """Runs shutdown_script.py with modes(i), four at a time: each exits with 0 within 5 s."""
+    def run(index):
+        try:
+            done = run_python(SCRIPT, timeout=5, args=modes(index))
+        except AssertionError as hung:
+            return str(hung)[:300]
+        return None if done.returncode == 0 else "%s: %s" % (ending(done), done.stderr.strip()[-300:])
+
+    with concurrent.futures.ThreadPoolExecutor(max_workers=4) as pool:
+        failures = [what for what in pool.map(run, range(runs)) if what]
+    assert failures == [], "%d of %d runs failed, first: %s" % (len(failures), runs, failures[:3])
 
 
 def test_the_interpreter_ends_cleanly_with_engine_threads_in_callbacks():
-    with concurrent.futures.ThreadPoolExecutor(max_workers=4) as pool:
-        failures = [(i, what) for i, what in pool.map(run_once, range(RUNS)) if what]
-    assert failures == [], "%d of %d runs failed, first: %s" % (len(failures), RUNS, failures[:3])
-
-
-# A daemon thread drawing widgets in a loop through a Python drawing object
-# while the main thread ends the interpreter.
-DRAWING_AT_EXIT = """
-import threading
-import _renderlib
-from renderlib.widgets import SvgDrawing
-
-drawing = SvgDrawing(char_width=4)
-_renderlib.tarsel_set_gfx_impl(drawing)
-flare = _renderlib.init_tarsel_effect("T_LensFlare", False)
-drawn = threading.Event()
-
-def draw_forever():
-    while True:
-        drawing.calls.clear()
-        _renderlib.tarsel_widget_draw(flare, "", 960, 540, 0.0, 0.0, 0.5, 0.5, [1920, 1080, 0])
-        drawn.set()
-
-threading.Thread(target=draw_forever, daemon=True).start()
-drawn.wait(5)
-"""
+    check_endings(RUNS, lambda index: ["frames", "messages"][:1 + index % 2])
 
 
 def test_the_interpreter_ends_cleanly_with_a_thread_drawing_widgets():
-    def run(index):
-        done = run_python(DRAWING_AT_EXIT, timeout=10)
-        return None if done.returncode == 0 else "%s: %s" % (ending(done), done.stderr.strip()[-300:])
-
-    runs = max(RUNS // 4, 10)
-    with concurrent.futures.ThreadPoolExecutor(max_workers=4) as pool:
-        failures = [what for what in pool.map(run, range(runs)) if what]
-    assert failures == [], "%d of %d runs failed, first: %s" % (len(failures), runs, failures[:2])
+    check_endings(max(RUNS // 4, 10), lambda index: ["widgets"])
 
 
 # A render whose frame requests come after the exit step, on the thread that
@@ -80,18 +42,10 @@ def test_the_interpreter_ends_cleanly_with_a_thread_drawing_widgets():
 RENDER_ON_ENDING_THREAD = """
 import os, sys
 {before}
-import _renderlib
-import renderlib
+import _renderlib, stress_frames
 from renderlib import effects
 
-class Frames(renderlib.LoadFrameInterface):
-    def load_frame(self, input, frame, width, height):
-        self.info, self.pixels = effects.raster(_renderlib.pixel_rgbaf, width, height)
-        return self.pixels
-    def current_raster_info(self, input):
-        return self.info
-
-frames = Frames()
+frames = stress_frames.SharedFrameSource()
 _renderlib.set_load_frame_impl(frames)
 echo = effects.recreate(_renderlib.init_tarsel_effect("T_Echo", False), {{"echoes": "3"}})
 dest, source = effects.raster(_renderlib.pixel_rgbaf, 16, 8), effects.raster(_renderlib.pixel_rgbaf, 16, 8)

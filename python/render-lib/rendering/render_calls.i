@@ -1,7 +1,7 @@
 // The two render calls: an effect frame, and a lens flare, into a caller's
 // buffer. Both convert their lists with the same typemaps, release the
 // interpreter lock around the engine call and keep nothing afterwards.
-// reference_engine.h and engine-api/tarsel/effect.h say what each value means.
+// docs/reference-engine.md and engine-api/tarsel/effect.h say what each value means.
 
 %{
 #include "tarsel/effect.h"

@@ -1,6 +1,7 @@
 #!/usr/bin/env bash
 # Prepares a fresh Debian machine: system packages, then a virtual environment
-# in .venv with the package (module and reference engine) and its test tools.
+# in .venv with the package (module and reference engine), its test tools and
+# its lint tools (ruff, clang-format, pre-commit).
 set -euo pipefail
 cd "$(dirname "$0")/.."
 
@@ -16,4 +17,4 @@ fi
 
 python3 -m venv .venv
 .venv/bin/python -m pip install -q --upgrade pip
-.venv/bin/python -m pip install -q '.[test]'
+.venv/bin/python -m pip install -q '.[test,lint]'

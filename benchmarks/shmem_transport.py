@@ -379,7 +379,7 @@ class TransportChannel(Channel):
         try:
             times = timed_round_trips(self.send_function(), self.transport.read_pybuf, payload)
         except RuntimeError as error:
-            raise RuntimeError("%s: error %s" % (error, self.transport.get_last_error()))
+            raise RuntimeError("%s: error %s" % (error, self.transport.get_last_error())) from error
         self.command(STOP)
         return times
 

@@ -118,7 +118,7 @@ def test_param_members_at_their_offsets():
         poke(param, offset, saved)
     floats = [("min_bound", 80), ("max_bound", 84), ("step", 88), ("normalize_scale", 92), ("slider_min", 192),
               ("slider_max", 196), ("big_slider_min", 200), ("big_slider_max", 204)]
-    for i, (name, offset) in enumerate(floats):
+    for i, (_, offset) in enumerate(floats):
         poke(param, offset, struct.pack("<f", 0.5 + i))
     assert [getattr(param, name) for name, _ in floats] == [0.5 + i for i in range(len(floats))]
     poke(param, 40, bytes([200, 201]))
@@ -150,7 +150,7 @@ def test_genotype_members_at_their_offsets():
     assert genotype.name == "N" * 32
     ints = [("disable_gpu", 392), ("force_gpu_enable", 396), ("force_gpu_disable", 400),
             ("gpu_disable_reason", 404), ("rgba_mode", 1224), ("transform_with_warp", 1232)]
-    for i, (name, offset) in enumerate(ints):
+    for i, (_, offset) in enumerate(ints):
         poke(genotype, offset, struct.pack("<i", -100 - i))
     assert [getattr(genotype, name) for name, _ in ints] == [-100 - i for i in range(len(ints))]
     poke(genotype, 1228, struct.pack("<b", -2))

@@ -4,7 +4,6 @@ import math
 
 import pytest
 
-import _renderlib
 import renderlib
 
 

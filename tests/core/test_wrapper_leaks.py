@@ -916,7 +916,7 @@ def check_flat(name, make, helpers, tmp_path):
         ENGINE.abort_next_call(False)
         _renderlib.tarsel_clear_abort()
         _renderlib.tarsel_free_all_stamp_collections()
-    del step, watched, cleanup
+    step = watched = cleanup = None  # what the family made goes before the next one
     gc.collect()
     assert live_objects() == before, "%s: its objects outlived it" % name
 

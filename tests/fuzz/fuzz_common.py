@@ -96,7 +96,8 @@ def main(test_one_input, max_len, default_inputs=2000):
             elif not arg.startswith("--"):  # the target's own flags start with "--" too
                 paths.append(arg)
         ran = 0
-        for ran, data in enumerate(inputs(paths, options["--inputs"], options["--seed"], max_len), start=1):
+        for data in inputs(paths, options["--inputs"], options["--seed"], max_len):
+            ran += 1
             try:
                 test_one_input(data)
             except BaseException:

@@ -22,7 +22,7 @@ import renderlib
 from engine_probe import EngineProbe
 from renderlib import effects
 
-render = getattr(_renderlib, "render_tarsel_effect_to_native_image")
+render = _renderlib.render_tarsel_effect_to_native_image
 RENDER = "--render" in sys.argv  # left in place: libFuzzer ignores it, a replay skips it
 ALLOWED = (TypeError, ValueError, OverflowError, BufferError)
 FLT_MAX = 3.4028234663852886e38

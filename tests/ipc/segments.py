@@ -66,9 +66,9 @@ class Peer:
         seconds: its remaining output."""
         try:
             out, err = self.process.communicate(timeout=limit)
-        except subprocess.TimeoutExpired:
+        except subprocess.TimeoutExpired as timeout:
             self.process.kill()
-            raise AssertionError("the peer did not end within %d s: %s" % (limit, self.process.communicate()[1]))
+            raise AssertionError("the peer did not end within %d s: %s" % (limit, self.process.communicate()[1])) from timeout
         assert self.process.returncode == 0, err
         return out
 

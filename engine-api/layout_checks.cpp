@@ -46,8 +46,7 @@ constexpr std::array<unsigned char, sizeof(T)> image_after(Set set) {
 
 // Whether `image` holds exactly the expected bytes and zero everywhere else.
 template <std::size_t N>
-constexpr bool holds_exactly(const std::array<unsigned char, N> &image,
-                             std::initializer_list<ExpectedByte> expected) {
+constexpr bool holds_exactly(const std::array<unsigned char, N> &image, std::initializer_list<ExpectedByte> expected) {
   for (std::size_t i = 0; i < N; ++i) {
     unsigned char want = 0;
     for (const ExpectedByte &e : expected)
@@ -77,8 +76,7 @@ static_assert(holds_exactly(image_after<ParamFlags>([](ParamFlags &f) { f.autotr
 static_assert(holds_exactly(image_after<ParamFlags>([](ParamFlags &f) { f.hidden_p = 1; }), {{3, 0x10}}));
 static_assert(holds_exactly(image_after<ParamFlags>([](ParamFlags &f) { f.group_start_p = 7; }), {{5, 0x1C}}));
 static_assert(holds_exactly(image_after<ParamFlags>([](ParamFlags &f) { f.group_start_open_p = 1; }), {{5, 0x20}}));
-static_assert(holds_exactly(image_after<ParamFlags>([](ParamFlags &f) { f.group_end_p = 7; }),
-                            {{5, 0xC0}, {6, 0x01}}));
+static_assert(holds_exactly(image_after<ParamFlags>([](ParamFlags &f) { f.group_end_p = 7; }), {{5, 0xC0}, {6, 0x01}}));
 static_assert(holds_exactly(image_after<ParamFlags>([](ParamFlags &f) { f.group_end_p = 4; }), {{6, 0x01}}));
 static_assert(holds_exactly(image_after<ParamFlags>([](ParamFlags &f) { f.doc_group_p = 1; }), {{6, 0x02}}));
 static_assert(holds_exactly(image_after<ParamFlags>([](ParamFlags &f) { f.needs_input_n = -1; }),
@@ -91,20 +89,15 @@ static_assert(holds_exactly(image_after<ParamFlags>([](ParamFlags &f) { f.auto_a
                             {{16, 0xFF}, {17, 0xFF}}));
 static_assert(holds_exactly(image_after<ParamFlags>([](ParamFlags &f) { f.dont_publish_p = 1; }), {{20, 0x02}}));
 static_assert(holds_exactly(image_after<ParamFlags>([](ParamFlags &f) { f.builder_disable_p = 1; }), {{20, 0x04}}));
-static_assert(holds_exactly(image_after<ParamFlags>([](ParamFlags &f) { f.builder_disable_one_p = 1; }),
-                            {{20, 0x08}}));
+static_assert(holds_exactly(image_after<ParamFlags>([](ParamFlags &f) { f.builder_disable_one_p = 1; }), {{20, 0x08}}));
 
 // GenotypeFlags: the 8 bytes at offset 1240 of a Genotype; index 0 is byte 1240.
 static_assert(holds_exactly(image_after<GenotypeFlags>([](GenotypeFlags &f) { f.need_other_frames_p = 1; }),
                             {{0, 0x02}}));
-static_assert(holds_exactly(image_after<GenotypeFlags>([](GenotypeFlags &f) { f.use_prev_dest_p = 1; }),
-                            {{0, 0x04}}));
-static_assert(holds_exactly(image_after<GenotypeFlags>([](GenotypeFlags &f) { f.mask_color_p = 1; }),
-                            {{1, 0x40}}));
-static_assert(holds_exactly(image_after<GenotypeFlags>([](GenotypeFlags &f) { f.transition_p = 1; }),
-                            {{3, 0x04}}));
-static_assert(holds_exactly(image_after<GenotypeFlags>([](GenotypeFlags &f) { f.use_reduce_p = 1; }),
-                            {{4, 0x01}}));
+static_assert(holds_exactly(image_after<GenotypeFlags>([](GenotypeFlags &f) { f.use_prev_dest_p = 1; }), {{0, 0x04}}));
+static_assert(holds_exactly(image_after<GenotypeFlags>([](GenotypeFlags &f) { f.mask_color_p = 1; }), {{1, 0x40}}));
+static_assert(holds_exactly(image_after<GenotypeFlags>([](GenotypeFlags &f) { f.transition_p = 1; }), {{3, 0x04}}));
+static_assert(holds_exactly(image_after<GenotypeFlags>([](GenotypeFlags &f) { f.use_reduce_p = 1; }), {{4, 0x01}}));
 static_assert(offsetof(Genotype, flags) == 1240);
 
 }  // namespace

@@ -28,7 +28,10 @@ RenderContext *context_handle(int which) { return reinterpret_cast<RenderContext
 // uchar_t pointer proxy that base64decode takes.
 uchar_t *byte_address(PyObject *buffer, int offset) {
   Py_buffer view;
-  if (PyObject_GetBuffer(buffer, &view, PyBUF_WRITABLE) != 0) { PyErr_Clear(); return 0; }
+  if (PyObject_GetBuffer(buffer, &view, PyBUF_WRITABLE) != 0) {
+    PyErr_Clear();
+    return 0;
+  }
   uchar_t *address = static_cast<uchar_t *>(view.buf) + offset;
   PyBuffer_Release(&view);
   return address;

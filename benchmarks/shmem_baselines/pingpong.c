@@ -54,8 +54,8 @@ static int compare_i64(const void *a, const void *b) {
 struct Shared {
   pthread_mutex_t lock;
   pthread_cond_t changed;
-  uint32_t turn;      /* 1: the child's move, 0: the parent's */
-  uint32_t sleepers;  /* futex mode: processes asleep on turn */
+  uint32_t turn;     /* 1: the child's move, 0: the parent's */
+  uint32_t sleepers; /* futex mode: processes asleep on turn */
 };
 
 static struct Shared *shared_block(void) {
@@ -85,8 +85,7 @@ static void cv_await(struct Shared *s, uint32_t want) {
 /* Futex hand-over: spin first, then sleep on the word. */
 static void futex_pass(struct Shared *s, uint32_t to) {
   __atomic_store_n(&s->turn, to, __ATOMIC_SEQ_CST);
-  if (__atomic_load_n(&s->sleepers, __ATOMIC_SEQ_CST))
-    syscall(SYS_futex, &s->turn, FUTEX_WAKE, INT_MAX, NULL, NULL, 0);
+  if (__atomic_load_n(&s->sleepers, __ATOMIC_SEQ_CST)) syscall(SYS_futex, &s->turn, FUTEX_WAKE, INT_MAX, NULL, NULL, 0);
 }
 
 static void futex_await(struct Shared *s, uint32_t want) {

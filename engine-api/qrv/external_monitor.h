@@ -96,17 +96,17 @@ public:
   // Makes an image over caller pixels without copying them; the caller holds
   // one reference. The exact meaning of each argument is documented with the
   // library's display implementation.
-  virtual EM_XIImage *EM_XIImageWrapper(void *pixels,             // first pixel
-                                        EM_SInt32 width,          // width in pixels
-                                        EM_SInt32 height,         // height in pixels
-                                        EM_SInt32 row_bytes,      // length of one row in bytes
-                                        char *name,               // image name
-                                        bool flip_y,              // rows stored bottom-up
-                                        EM_ImageFormat format,    // pixel layout
-                                        double pixel_aspect,      // pixel aspect ratio
-                                        double gamma,             // gamma of the pixel values
-                                        bool premultiplied,       // colour premultiplied by alpha
-                                        bool full_range) = 0;     // full-range (not video-range) values
+  virtual EM_XIImage *EM_XIImageWrapper(void *pixels,           // first pixel
+                                        EM_SInt32 width,        // width in pixels
+                                        EM_SInt32 height,       // height in pixels
+                                        EM_SInt32 row_bytes,    // length of one row in bytes
+                                        char *name,             // image name
+                                        bool flip_y,            // rows stored bottom-up
+                                        EM_ImageFormat format,  // pixel layout
+                                        double pixel_aspect,    // pixel aspect ratio
+                                        double gamma,           // gamma of the pixel values
+                                        bool premultiplied,     // colour premultiplied by alpha
+                                        bool full_range) = 0;   // full-range (not video-range) values
 };
 
 // Makes a display object; null when none can be made. Release it with delete.

@@ -7,13 +7,13 @@
 
 // One catalogue entry, 120 bytes laid out by the engine, which owns it.
 struct plugin_info {
-  char *plugin_name;               // offset 0: the effect's name, the key to set up an instance
-  unsigned char reserved_8[24];    // engine bytes 8-31
-  char *_category;                 // offset 32: menu group the effect is listed under
-  unsigned char reserved_40[28];   // engine bytes 40-67
-  unsigned char use_prev_dest_p;   // offset 68: non-zero when the effect reads its previous output
-  unsigned char dynamic_genotype_p; // offset 69: non-zero when the descriptor is built at run time
-  unsigned char reserved_70[50];   // engine bytes 70-119
+  char *plugin_name;                 // offset 0: the effect's name, the key to set up an instance
+  unsigned char reserved_8[24];      // engine bytes 8-31
+  char *_category;                   // offset 32: menu group the effect is listed under
+  unsigned char reserved_40[28];     // engine bytes 40-67
+  unsigned char use_prev_dest_p;     // offset 68: non-zero when the effect reads its previous output
+  unsigned char dynamic_genotype_p;  // offset 69: non-zero when the descriptor is built at run time
+  unsigned char reserved_70[50];     // engine bytes 70-119
 };
 
 // Number of entries in the effect catalogue.

@@ -74,27 +74,27 @@ TARSEL_API int render_tarsel_effect_to_native_image(
 // (with an Err_Error message) on failure. Conventions as for
 // render_tarsel_effect_to_native_image.
 TARSEL_API bool render_tarsel_lensflare_to_native_image(
-    EffectGlobals_t *instance,        // the instance
-    const char *descriptor,           // name of the instance's descriptor to draw; null or "": effect_genotype
-    float center_x,                   // flare centre, in destination pixels from its left edge
-    float center_y,                   // flare centre, in destination pixels from its top line
-    RawImage dest,                    // destination pixels, described by rasters[0]
-    int frame,                        // frame number
-    int field,                        // 0 whole frame; 1 even lines, 2 odd lines
-    int downsample,                   // resolution factor of the render (1, 2, 4 ...)
-    int quality,                      // 0 draft, 1 normal, 2 best
-    T_RasterInfo **rasters,           // [0] describes the destination, [1] the background
-    RawImage *images,                 // [0] the previous output frame or null, [1] the background or null
-                                      // (transparent)
-    float brightness,                 // overall brightness factor
-    int n_rasters,                    // entries of rasters and of images (at least 1)
-    float pixel_aspect,               // pixel width over height; 0: square pixels
-    int n_threads,                    // worker threads to use; 0: all
-    int seed,                         // seed of effects with grain
-    const char *input_colorspace,     // "linear" or "srgb" (null or "": linear): the background's colour space
-    const char *output_colorspace,    // the same for the result
-    const char *working_colorspace,   // the same for the space the flare is drawn in
-    bool premultiplied);              // background and result carry colour premultiplied by alpha
+    EffectGlobals_t *instance,       // the instance
+    const char *descriptor,          // name of the instance's descriptor to draw; null or "": effect_genotype
+    float center_x,                  // flare centre, in destination pixels from its left edge
+    float center_y,                  // flare centre, in destination pixels from its top line
+    RawImage dest,                   // destination pixels, described by rasters[0]
+    int frame,                       // frame number
+    int field,                       // 0 whole frame; 1 even lines, 2 odd lines
+    int downsample,                  // resolution factor of the render (1, 2, 4 ...)
+    int quality,                     // 0 draft, 1 normal, 2 best
+    T_RasterInfo **rasters,          // [0] describes the destination, [1] the background
+    RawImage *images,                // [0] the previous output frame or null, [1] the background or null
+                                     // (transparent)
+    float brightness,                // overall brightness factor
+    int n_rasters,                   // entries of rasters and of images (at least 1)
+    float pixel_aspect,              // pixel width over height; 0: square pixels
+    int n_threads,                   // worker threads to use; 0: all
+    int seed,                        // seed of effects with grain
+    const char *input_colorspace,    // "linear" or "srgb" (null or "": linear): the background's colour space
+    const char *output_colorspace,   // the same for the result
+    const char *working_colorspace,  // the same for the space the flare is drawn in
+    bool premultiplied);             // background and result carry colour premultiplied by alpha
 
 // Loads a flare texture from a PNG file (8 or 16 bits, grey, grey and alpha,
 // RGB or RGBA); returns its index (0, 1, ... in the order textures are
@@ -114,8 +114,8 @@ TARSEL_API int tarsel_register_flare_texture(int xsize, int ysize, int n_channel
 
 // Describes texture `index` through the outputs (each may be null); n_bytes
 // is the size of its pixels. Returns 0, or -1 for an unknown index.
-TARSEL_API int tarsel_get_texture_info(int index, int *xsize, int *ysize, int *n_channels,
-                                       int *bytes_per_channel, size_t *n_bytes);
+TARSEL_API int tarsel_get_texture_info(int index, int *xsize, int *ysize, int *n_channels, int *bytes_per_channel,
+                                       size_t *n_bytes);
 
 // Copies min(dest_size, n_bytes) bytes of texture `index`'s pixels into dest;
 // returns the number copied, or -1 for an unknown index.

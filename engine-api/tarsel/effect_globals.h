@@ -12,23 +12,24 @@
 
 // An effect's definition as the engine parsed it; engine-owned.
 struct effect_def {
-  std::string name;                                              // the effect's name
-  std::vector<std::string> input_names;                          // input names, in input order
-  std::vector<bool> input_optional_p;                            // per input: may be left unconnected
-  std::vector<std::string> arg_names;                            // names of the definition's arguments
-  std::map<std::string, std::vector<float>> arg_hardcoded_values; // argument values fixed by the definition
+  std::string name;                                                // the effect's name
+  std::vector<std::string> input_names;                            // input names, in input order
+  std::vector<bool> input_optional_p;                              // per input: may be left unconnected
+  std::vector<std::string> arg_names;                              // names of the definition's arguments
+  std::map<std::string, std::vector<float>> arg_hardcoded_values;  // argument values fixed by the definition
 };
 
 // An effect instance: the state of one loaded plug-in, with its table of
 // effect descriptors and the descriptor in use. Laid out by the engine,
 // which creates, owns and frees it.
 struct EffectGlobals_t {
-  char *plugin_name;                                // offset 0: the plug-in's name
-  unsigned char reserved_8[408];                    // engine bytes 8-415
-  short n_effects;                                  // offset 416: entries of the descriptor table
-  unsigned char reserved_418[838];                  // engine bytes 418-1255
-  Genotype *effect_genotype;                        // offset 1256: descriptor of the effect this instance runs
-  Genotype *genotypes[MAX_EFFECTS_PER_PLUGIN];      // offset 1264: one descriptor per effect (the engine's maximum per plug-in)
+  char *plugin_name;                // offset 0: the plug-in's name
+  unsigned char reserved_8[408];    // engine bytes 8-415
+  short n_effects;                  // offset 416: entries of the descriptor table
+  unsigned char reserved_418[838];  // engine bytes 418-1255
+  Genotype *effect_genotype;        // offset 1256: descriptor of the effect this instance runs
+  Genotype
+      *genotypes[MAX_EFFECTS_PER_PLUGIN];  // offset 1264: one descriptor per effect (the engine's maximum per plug-in)
 };
 
 // Called once per generated parameter: the descriptor, the index into its

@@ -5,17 +5,17 @@
 
 // Severity of an engine message, rising from log-only to fatal.
 enum ErrLevel {
-  Err_LogOnly = 0,   // written to the log only
-  Err_NoHdrNoBeep,   // shown without a header line, silently
-  Err_InfoNoBeep,    // information, silently
-  Err_NoteNoBeep,    // note, silently
-  Err_Info,          // information
-  Err_Note,          // note
-  Err_NoHdr,         // shown without a header line
-  Err_Alert,         // alert
-  Err_Warning,       // warning
-  Err_Error,         // error
-  Err_Fatal          // fatal error
+  Err_LogOnly = 0,  // written to the log only
+  Err_NoHdrNoBeep,  // shown without a header line, silently
+  Err_InfoNoBeep,   // information, silently
+  Err_NoteNoBeep,   // note, silently
+  Err_Info,         // information
+  Err_Note,         // note
+  Err_NoHdr,        // shown without a header line
+  Err_Alert,        // alert
+  Err_Warning,      // warning
+  Err_Error,        // error
+  Err_Fatal         // fatal error
 };
 
 // Receives every engine message: its ErrLevel and its NUL-terminated text.

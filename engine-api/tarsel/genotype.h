@@ -13,15 +13,15 @@ struct effect_def;
 
 // One entry of an effect's parameter-group table, 32 bytes.
 struct ParamGroupInfo {
-  const char *name;               // the group's name, engine-owned
-  unsigned char reserved_8[24];   // engine bytes 8-31
+  const char *name;              // the group's name, engine-owned
+  unsigned char reserved_8[24];  // engine bytes 8-31
 };
 
 // One instance parameter slot of a plug-in's first effect descriptor, 144 bytes.
 struct InstanceParamSlot {
-  unsigned char reserved_0[120];  // engine bytes 0-119
-  Param *param;                   // offset 120: the slot's parameter, may be null
-  unsigned char reserved_128[16]; // engine bytes 128-143
+  unsigned char reserved_0[120];   // engine bytes 0-119
+  Param *param;                    // offset 120: the slot's parameter, may be null
+  unsigned char reserved_128[16];  // engine bytes 128-143
 };
 
 // Behaviour bits of an effect descriptor: the 8 bytes at offset 1240 of a
@@ -39,8 +39,8 @@ struct GenotypeFlags {
   unsigned int reserved0_b27 : 5;        // engine bits 27-31
 
   // Word at descriptor byte 1244.
-  unsigned int use_reduce_p : 1;         // bit 0 (byte 1244 bit 0): reduce step in use
-  unsigned int reserved4_b1 : 31;        // engine bits 1-31
+  unsigned int use_reduce_p : 1;   // bit 0 (byte 1244 bit 0): reduce step in use
+  unsigned int reserved4_b1 : 31;  // engine bits 1-31
 };
 
 // One effect: name, inputs, parameters, parameter groups, graphics-processor
@@ -48,44 +48,44 @@ struct GenotypeFlags {
 // 1336 bytes laid out by the engine, which owns the record and everything it
 // points to.
 struct Genotype {
-  char name[MAX_EFFECT_NAME_LEN];                             // offset 0: effect name, NUL-terminated when shorter
-  char input_names[MAX_INPUTS][MAX_INPUT_NAME_LEN];           // offset 32: display name of each input
-  char canonical_input_names[MAX_INPUTS][MAX_INPUT_NAME_LEN]; // offset 128: stable name of each input
-  ShortInputArray input_optional_p;                           // offset 224: non-zero where the input may be unconnected
-  ShortInputArray input_default_to;                           // offset 240: what an unconnected input falls back to
-  float input_default_value[MAX_INPUT_DEFAULT_VALUES];        // offset 256: constant values used by the fallbacks
-  int n_params;                                               // offset 336: entries of the parameter table
-  unsigned char reserved_340[4];                              // engine bytes 340-343
-  Param **params;                                             // offset 344: the parameters, in order
-  unsigned char reserved_352[8];                              // engine bytes 352-359
-  Param *flare_param;                                         // offset 360: parameter carrying a lens flare, may be null
-  unsigned char reserved_368[8];                              // engine bytes 368-375
-  void *host_data;                                            // offset 376: engine data taken from the host, may be null
-  unsigned char reserved_384[8];                              // engine bytes 384-391
-  int disable_gpu;                                            // offset 392: non-zero forbids graphics-processor work
-  int force_gpu_enable;                                       // offset 396: non-zero forces graphics-processor work on
-  int force_gpu_disable;                                      // offset 400: non-zero forces graphics-processor work off
-  int gpu_disable_reason;                                     // offset 404: why the graphics processor is not used
-  unsigned char reserved_408[16];                             // engine bytes 408-423
-  ParamGroupInfo param_groups[MAX_PARAM_GROUPS];              // offset 424: groups, indexed by Param::param_group
-  int rgba_mode;                                              // offset 1224: handling of colour and alpha
-  signed char rgba_ok_for_inputs;                             // offset 1228: non-zero when inputs may carry alpha
-  unsigned char reserved_1229[3];                             // engine bytes 1229-1231
-  int transform_with_warp;                                    // offset 1232: transforming together with a warp
-  signed char alpha_z_source_input;                           // offset 1236: input supplying alpha (and depth)
-  unsigned char reserved_1237[3];                             // engine bytes 1237-1239
-  GenotypeFlags flags;                                        // offset 1240: behaviour bits
-  signed char n_inputs;                                       // offset 1248: input slots in use
-  unsigned char reserved_1249[31];                            // engine bytes 1249-1279
-  int n_instance_param_slots;                                 // offset 1280: instance parameter slots (first descriptor of a plug-in)
-  unsigned char reserved_1284[4];                             // engine bytes 1284-1287
-  InstanceParamSlot *instance_param_slots;                    // offset 1288: n_instance_param_slots slot records
-  unsigned char reserved_1296[8];                             // engine bytes 1296-1303
-  char *effect_popup_name;                                    // offset 1304: name listed in menus
-  short old_default_effect;                                   // offset 1312: effect whose defaults older projects used
-  short old_default_version_limit;                            // offset 1314: version below which those defaults apply
-  unsigned char reserved_1316[12];                            // engine bytes 1316-1327
-  effect_def *effect_info;                                    // offset 1328: the effect's definition
+  char name[MAX_EFFECT_NAME_LEN];                              // offset 0: effect name, NUL-terminated when shorter
+  char input_names[MAX_INPUTS][MAX_INPUT_NAME_LEN];            // offset 32: display name of each input
+  char canonical_input_names[MAX_INPUTS][MAX_INPUT_NAME_LEN];  // offset 128: stable name of each input
+  ShortInputArray input_optional_p;                     // offset 224: non-zero where the input may be unconnected
+  ShortInputArray input_default_to;                     // offset 240: what an unconnected input falls back to
+  float input_default_value[MAX_INPUT_DEFAULT_VALUES];  // offset 256: constant values used by the fallbacks
+  int n_params;                                         // offset 336: entries of the parameter table
+  unsigned char reserved_340[4];                        // engine bytes 340-343
+  Param **params;                                       // offset 344: the parameters, in order
+  unsigned char reserved_352[8];                        // engine bytes 352-359
+  Param *flare_param;                                   // offset 360: parameter carrying a lens flare, may be null
+  unsigned char reserved_368[8];                        // engine bytes 368-375
+  void *host_data;                                      // offset 376: engine data taken from the host, may be null
+  unsigned char reserved_384[8];                        // engine bytes 384-391
+  int disable_gpu;                                      // offset 392: non-zero forbids graphics-processor work
+  int force_gpu_enable;                                 // offset 396: non-zero forces graphics-processor work on
+  int force_gpu_disable;                                // offset 400: non-zero forces graphics-processor work off
+  int gpu_disable_reason;                               // offset 404: why the graphics processor is not used
+  unsigned char reserved_408[16];                       // engine bytes 408-423
+  ParamGroupInfo param_groups[MAX_PARAM_GROUPS];        // offset 424: groups, indexed by Param::param_group
+  int rgba_mode;                                        // offset 1224: handling of colour and alpha
+  signed char rgba_ok_for_inputs;                       // offset 1228: non-zero when inputs may carry alpha
+  unsigned char reserved_1229[3];                       // engine bytes 1229-1231
+  int transform_with_warp;                              // offset 1232: transforming together with a warp
+  signed char alpha_z_source_input;                     // offset 1236: input supplying alpha (and depth)
+  unsigned char reserved_1237[3];                       // engine bytes 1237-1239
+  GenotypeFlags flags;                                  // offset 1240: behaviour bits
+  signed char n_inputs;                                 // offset 1248: input slots in use
+  unsigned char reserved_1249[31];                      // engine bytes 1249-1279
+  int n_instance_param_slots;               // offset 1280: instance parameter slots (first descriptor of a plug-in)
+  unsigned char reserved_1284[4];           // engine bytes 1284-1287
+  InstanceParamSlot *instance_param_slots;  // offset 1288: n_instance_param_slots slot records
+  unsigned char reserved_1296[8];           // engine bytes 1296-1303
+  char *effect_popup_name;                  // offset 1304: name listed in menus
+  short old_default_effect;                 // offset 1312: effect whose defaults older projects used
+  short old_default_version_limit;          // offset 1314: version below which those defaults apply
+  unsigned char reserved_1316[12];          // engine bytes 1316-1327
+  effect_def *effect_info;                  // offset 1328: the effect's definition
 };
 
 static_assert(sizeof(ParamGroupInfo) == 32, "ParamGroupInfo is 32 bytes");

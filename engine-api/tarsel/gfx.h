@@ -106,16 +106,14 @@ TARSEL_API void tarsel_set_gfx_impl(GfxInterface *gfx);
 // view_scale_y screen pixels per frame pixel. values: frame width, frame
 // height (full-resolution pixels) and frame number; missing entries are the
 // view size over the scale, and frame 0.
-TARSEL_API void tarsel_widget_draw(EffectGlobals_t *globals, const char *param_name,
-                                   int view_xsize, int view_ysize,
+TARSEL_API void tarsel_widget_draw(EffectGlobals_t *globals, const char *param_name, int view_xsize, int view_ysize,
                                    float view_x, float view_y, float view_scale_x, float view_scale_y,
                                    std::vector<float> values);
 
 // Passes a mouse event at (mouse_x, mouse_y), viewer pixels, to an instance's
 // widgets (the other arguments as for tarsel_widget_draw); returns what the
 // interaction set.
-TARSEL_API T_WidgetResult tarsel_widget_mouse_event(EffectGlobals_t *globals, const char *param_name,
-                                                    int view_xsize, int view_ysize,
-                                                    float view_x, float view_y, float view_scale_x, float view_scale_y,
-                                                    std::vector<float> values,
-                                                    int mouse_x, int mouse_y, MouseEventType event);
+TARSEL_API T_WidgetResult tarsel_widget_mouse_event(EffectGlobals_t *globals, const char *param_name, int view_xsize,
+                                                    int view_ysize, float view_x, float view_y, float view_scale_x,
+                                                    float view_scale_y, std::vector<float> values, int mouse_x,
+                                                    int mouse_y, MouseEventType event);

@@ -19,21 +19,18 @@ TARSEL_API void tarsel_resize_native_image(T_RasterInfo *src_info, RawImage src,
                                            int extra_line_elts,  // padding elements after each line of the result
                                            float scale,          // size factor for a width or height given as 0
                                            T_RasterInfo *dst_info, RawImage dst,
-                                           int filter,           // 0 box (area average), 1 bilinear, 2 bicubic
-                                           float x_offset,       // sub-pixel shift of the sampling, in source pixels
+                                           int filter,      // 0 box (area average), 1 bilinear, 2 bicubic
+                                           float x_offset,  // sub-pixel shift of the sampling, in source pixels
                                            float y_offset,
-                                           float sharpness,      // bicubic only: 0 smooth .. 1 sharp
+                                           float sharpness,  // bicubic only: 0 smooth .. 1 sharp
                                            int *out_xsize, int *out_ysize);
 
 // Byte size that tarsel_resize_native_image needs for its destination with
 // the same arguments; 0 when the resize cannot be done.
 TARSEL_API size_t tarsel_get_resized_image_size(T_RasterInfo *src_info,
-                                                int new_xsize,        // as for tarsel_resize_native_image
-                                                int new_ysize,
-                                                int pixel_type,
-                                                int extra_line_elts,
-                                                float scale,
-                                                int flags);           // reserved: 0
+                                                int new_xsize,  // as for tarsel_resize_native_image
+                                                int new_ysize, int pixel_type, int extra_line_elts, float scale,
+                                                int flags);  // reserved: 0
 
 // Converts a native image to 8-bit BGRA of the same size for display; dst
 // lines are xsize * 4 bytes, without padding. The colour is straight (not
@@ -46,8 +43,8 @@ TARSEL_API void tarsel_convert_to_bgra_8(EffectGlobals_t *instance,  // an insta
                                                           // alpha 255
                                          int dither,      // 1: ordered dithering of the 8-bit result
                                          int flip,        // 1: the result upside down
-                                         const char *src_colorspace,      // "linear" or "srgb" (null or "": linear)
-                                         const char *display_colorspace); // the same, for the result
+                                         const char *src_colorspace,       // "linear" or "srgb" (null or "": linear)
+                                         const char *display_colorspace);  // the same, for the result
 
 // Composites an 8-bit BGRA image (straight colour) in place over a
 // background; the result is opaque.

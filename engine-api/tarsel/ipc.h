@@ -10,7 +10,7 @@
 // Process identifier.
 typedef int pid_t;
 #else
-#include <sys/types.h>
+#  include <sys/types.h>
 #endif
 
 namespace Tarsel {
@@ -28,11 +28,11 @@ namespace IPC {
 // Header that precedes each message in the segment: 64 bytes, little-endian,
 // shared with the peer process.
 struct MessageHeader_t {
-  uint32_t id;          // offset 0: message identifier
-  uint32_t padding;     // offset 4: alignment of size, never read
-  size_t size;          // offset 8: size of the message body in bytes
-  char desc[24];        // offset 16: writer's description, NUL-terminated when shorter
-  char reserved[24];    // offset 40: reserved text, encoded as desc
+  uint32_t id;        // offset 0: message identifier
+  uint32_t padding;   // offset 4: alignment of size, never read
+  size_t size;        // offset 8: size of the message body in bytes
+  char desc[24];      // offset 16: writer's description, NUL-terminated when shorter
+  char reserved[24];  // offset 40: reserved text, encoded as desc
 };
 
 // Cause of a transport failure.

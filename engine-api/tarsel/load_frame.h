@@ -30,16 +30,16 @@ public:
 // The engine's per-render state as a frame request sees it: one descriptor
 // per input, starting 384 bytes into the state.
 struct T_RenderState {
-  unsigned char reserved_0[384];          // engine bytes 0-383
-  T_RasterInfo input_info[MAX_INPUTS];    // offset 384: descriptor of each input
+  unsigned char reserved_0[384];        // engine bytes 0-383
+  T_RasterInfo input_info[MAX_INPUTS];  // offset 384: descriptor of each input
 };
 
 // Frame request of the engine: the per-render state (a T_RenderState), the
 // input, the frame wanted, a request flag and two engine values; fills
 // *out_info and returns the first byte of the frame's pixels, or null when
 // there is no such frame.
-typedef void *(*T_LoadOtherFrameFun)(void *render_state, int input, int frame, unsigned char flag,
-                                     void *engine_data1, void *engine_data2, T_RasterInfo *out_info);
+typedef void *(*T_LoadOtherFrameFun)(void *render_state, int input, int frame, unsigned char flag, void *engine_data1,
+                                     void *engine_data2, T_RasterInfo *out_info);
 
 // Installs the process-wide frame-request callback (null removes it).
 TARSEL_API void set_load_other_frame_into_buffer_fun(T_LoadOtherFrameFun fun);

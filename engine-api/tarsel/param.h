@@ -14,18 +14,18 @@ struct cJSON;
 
 // What kind of value a parameter carries.
 enum param_type : int {
-  ptype_unknown = 0,      // not set
-  ptype_float = 1,        // floating-point value, one per channel
-  ptype_int = 2,          // integer value
-  ptype_color = 3,        // colour
-  ptype_popup = 4,        // choice among named states (see PopupParam)
-  ptype_boolean = 5,      // on or off
-  ptype_pushbutton = 6,   // button, carries no value
-  ptype_string = 7,       // text
-  ptype_label = 8,        // label, carries no value
-  ptype_flare = 9,        // lens-flare description
-  ptype_pellam_data = 10, // opaque effect data
-  ptype_none = 11         // no value
+  ptype_unknown = 0,       // not set
+  ptype_float = 1,         // floating-point value, one per channel
+  ptype_int = 2,           // integer value
+  ptype_color = 3,         // colour
+  ptype_popup = 4,         // choice among named states (see PopupParam)
+  ptype_boolean = 5,       // on or off
+  ptype_pushbutton = 6,    // button, carries no value
+  ptype_string = 7,        // text
+  ptype_label = 8,         // label, carries no value
+  ptype_flare = 9,         // lens-flare description
+  ptype_pellam_data = 10,  // opaque effect data
+  ptype_none = 11          // no value
 };
 
 // How the engine formats a parameter's value for display.
@@ -93,9 +93,7 @@ public:
   bool needs_old_default(float version);
 
   // The value as constant text: the text to_string gives for the same arguments.
-  const char *to_string_const(RenderContext *ctx, bool flag = false) {
-    return to_string(ctx, flag);
-  }
+  const char *to_string_const(RenderContext *ctx, bool flag = false) { return to_string(ctx, flag); }
 
   // Name of the parameter's type.
   const char *ptype_name() const;
@@ -114,43 +112,43 @@ protected:
   virtual bool get_value_from_buttons(RenderContext *ctx);
 
 public:
-  enum param_type ptype;               // offset 8: what kind of value the parameter carries
+  enum param_type ptype;  // offset 8: what kind of value the parameter carries
 protected:
-  unsigned char reserved_12[4];        // engine bytes 12-15
+  unsigned char reserved_12[4];  // engine bytes 12-15
 public:
-  char *name;                          // offset 16: display name, owned (C heap)
-  char *canonical_name;                // offset 24: stable, script-facing name
+  char *name;            // offset 16: display name, owned (C heap)
+  char *canonical_name;  // offset 24: stable, script-facing name
 protected:
-  unsigned char reserved_32[8];        // engine bytes 32-39
+  unsigned char reserved_32[8];  // engine bytes 32-39
 public:
-  unsigned char n_channels;            // offset 40: number of value channels
-  unsigned char n_channels_c1;         // offset 41: channels shown to the user
+  unsigned char n_channels;     // offset 40: number of value channels
+  unsigned char n_channels_c1;  // offset 41: channels shown to the user
 protected:
-  unsigned char reserved_42[2];        // engine bytes 42-43
+  unsigned char reserved_42[2];  // engine bytes 42-43
 public:
-  ValueArray default_value;            // offset 44: default, one float per channel
-  ValueArray old_default_value;        // offset 60: default that older projects used
-  short use_old_default_p;             // offset 76: non-zero when the old default applies
-  short old_default_version_limit;     // offset 78: version below which the old default applies
-  float min_bound;                     // offset 80: lowest value accepted
-  float max_bound;                     // offset 84: highest value accepted
-  float step;                          // offset 88: increment of one step
-  float normalize_scale;               // offset 92: factor between stored and displayed value
+  ValueArray default_value;         // offset 44: default, one float per channel
+  ValueArray old_default_value;     // offset 60: default that older projects used
+  short use_old_default_p;          // offset 76: non-zero when the old default applies
+  short old_default_version_limit;  // offset 78: version below which the old default applies
+  float min_bound;                  // offset 80: lowest value accepted
+  float max_bound;                  // offset 84: highest value accepted
+  float step;                       // offset 88: increment of one step
+  float normalize_scale;            // offset 92: factor between stored and displayed value
 protected:
-  unsigned char reserved_96[60];       // engine bytes 96-155
+  unsigned char reserved_96[60];  // engine bytes 96-155
 public:
-  ParamFlags flags;                    // offset 156: behaviour flags, in place
-  float slider_min;                    // offset 192: lower end of the ordinary slider
-  float slider_max;                    // offset 196: upper end of the ordinary slider
-  float big_slider_min;                // offset 200: lower end of the wide slider
-  float big_slider_max;                // offset 204: upper end of the wide slider
-  signed char param_group;             // offset 208: index into the effect's group table, -1 for none
+  ParamFlags flags;         // offset 156: behaviour flags, in place
+  float slider_min;         // offset 192: lower end of the ordinary slider
+  float slider_max;         // offset 196: upper end of the ordinary slider
+  float big_slider_min;     // offset 200: lower end of the wide slider
+  float big_slider_max;     // offset 204: upper end of the wide slider
+  signed char param_group;  // offset 208: index into the effect's group table, -1 for none
 protected:
-  unsigned char reserved_209[7];       // engine bytes 209-215
+  unsigned char reserved_209[7];  // engine bytes 209-215
 public:
-  char *flags_string;                  // offset 216: the flags as the effect definition writes them
+  char *flags_string;  // offset 216: the flags as the effect definition writes them
 protected:
-  unsigned char reserved_224[16];      // engine bytes 224-239
+  unsigned char reserved_224[16];  // engine bytes 224-239
 
 private:
   // Arrays of parameters are never deleted as arrays.
@@ -161,8 +159,8 @@ private:
 // The engine fills n_states entries of state_names.
 class PopupParam : public Param {
 public:
-  signed char n_states;                         // offset 240: number of states
-  char *state_names[MAX_POPUP_STATES];          // offset 248: state names, in order (at most MAX_POPUP_STATES)
+  signed char n_states;                 // offset 240: number of states
+  char *state_names[MAX_POPUP_STATES];  // offset 248: state names, in order (at most MAX_POPUP_STATES)
 };
 
 // A copy of `text` made on the C heap (release it with free()); null for null.
@@ -174,8 +172,8 @@ static_assert(sizeof(param_type) == 4, "param_type is 32-bit");
 static_assert(sizeof(const_format_tag) == 4, "const_format_tag is 32-bit");
 
 #if defined(__GNUC__)
-#pragma GCC diagnostic push
-#pragma GCC diagnostic ignored "-Winvalid-offsetof"
+#  pragma GCC diagnostic push
+#  pragma GCC diagnostic ignored "-Winvalid-offsetof"
 #endif
 static_assert(offsetof(Param, ptype) == 8, "Param::ptype at 8");
 static_assert(offsetof(Param, name) == 16, "Param::name at 16");
@@ -200,6 +198,6 @@ static_assert(offsetof(Param, flags_string) == 216, "Param::flags_string at 216"
 static_assert(offsetof(PopupParam, n_states) == 240, "PopupParam::n_states at 240");
 static_assert(offsetof(PopupParam, state_names) == 248, "PopupParam::state_names at 248");
 #if defined(__GNUC__)
-#pragma GCC diagnostic pop
+#  pragma GCC diagnostic pop
 #endif
 static_assert(sizeof(PopupParam) == 248 + 8 * MAX_POPUP_STATES, "PopupParam size");

@@ -13,9 +13,8 @@ TARSEL_API int tarsel_get_fromfile_popup_names(const Param *param, char ***names
 
 // Value bounds and slider range of a parameter, written through the four
 // outputs; -1000000 and 1000000 stand for "no lower" and "no upper" bound.
-TARSEL_API void tarsel_get_param_bounds2(const Param *param, float scale, int channel,
-                                         float *min_bound, float *max_bound,
-                                         float *slider_min, float *slider_max, int flags);
+TARSEL_API void tarsel_get_param_bounds2(const Param *param, float scale, int channel, float *min_bound,
+                                         float *max_bound, float *slider_min, float *slider_max, int flags);
 
 // Title of one channel, written into buffer (buffer_size bytes); returns the title.
 TARSEL_API char *tarsel_get_param_title(const Param *param, int channel, char *buffer, size_t buffer_size);

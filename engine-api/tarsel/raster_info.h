@@ -8,14 +8,14 @@
 
 // Channel set of an image.
 enum T_RasterType : int {
-  raster_unknown = 0, // not set
-  raster_rgb = 1,     // red, green, blue
-  raster_rgba = 2,    // red, green, blue, alpha
-  raster_a = 3,       // alpha only
-  raster_rgbaz = 4,   // red, green, blue, alpha, depth
-  raster_l = 5,       // luminance
-  raster_la = 6,      // luminance, alpha
-  raster_ntypes = 7   // number of channel sets
+  raster_unknown = 0,  // not set
+  raster_rgb = 1,      // red, green, blue
+  raster_rgba = 2,     // red, green, blue, alpha
+  raster_a = 3,        // alpha only
+  raster_rgbaz = 4,    // red, green, blue, alpha, depth
+  raster_l = 5,        // luminance
+  raster_la = 6,       // luminance, alpha
+  raster_ntypes = 7    // number of channel sets
 };
 
 // Memory layout of one pixel: channel order in memory and bits per channel
@@ -23,22 +23,22 @@ enum T_RasterType : int {
 // and 27 are engine-internal formats without a public name; they stay
 // reserved so that stored values keep their meaning.
 enum T_PixelType : int {
-  pixel_unknown = 0,   // not set
-  pixel_a8 = 1,        // alpha, 8 bits
-  pixel_rgb8 = 2,      // R G B, 8 bits
-  pixel_bgr8 = 3,      // B G R, 8 bits
-  pixel_rgba8 = 4,     // R G B A, 8 bits
-  pixel_bgra8 = 5,     // B G R A, 8 bits
-  pixel_argb8 = 6,     // A R G B, 8 bits
-  pixel_a16 = 7,       // alpha, 16 bits
-  pixel_rgb16 = 8,     // R G B, 16 bits
-  pixel_rgba16 = 9,    // R G B A, 16 bits
-  pixel_bgra16 = 10,   // B G R A, 16 bits
-  pixel_argb16 = 11,   // A R G B, 16 bits
-  pixel_af = 12,       // alpha, float
-  pixel_rgbf = 13,     // R G B, float
-  pixel_rgbaf = 14,    // R G B A, float
-  pixel_argbf = 15,    // A R G B, float
+  pixel_unknown = 0,  // not set
+  pixel_a8 = 1,       // alpha, 8 bits
+  pixel_rgb8 = 2,     // R G B, 8 bits
+  pixel_bgr8 = 3,     // B G R, 8 bits
+  pixel_rgba8 = 4,    // R G B A, 8 bits
+  pixel_bgra8 = 5,    // B G R A, 8 bits
+  pixel_argb8 = 6,    // A R G B, 8 bits
+  pixel_a16 = 7,      // alpha, 16 bits
+  pixel_rgb16 = 8,    // R G B, 16 bits
+  pixel_rgba16 = 9,   // R G B A, 16 bits
+  pixel_bgra16 = 10,  // B G R A, 16 bits
+  pixel_argb16 = 11,  // A R G B, 16 bits
+  pixel_af = 12,      // alpha, float
+  pixel_rgbf = 13,    // R G B, float
+  pixel_rgbaf = 14,   // R G B A, float
+  pixel_argbf = 15,   // A R G B, float
   // 16: engine-internal
   pixel_rgba16z = 17,  // R G B A, 16 bits, with depth
   pixel_l8 = 18,       // luminance, 8 bits
@@ -51,8 +51,8 @@ enum T_PixelType : int {
   pixel_rgb16f = 25,   // R G B, half float
   pixel_rgba16f = 26,  // R G B A, half float
   // 27: engine-internal
-  pixel_a16f = 28,     // alpha, half float
-  pixel_ntypes = 29    // one past the largest pixel layout
+  pixel_a16f = 28,   // alpha, half float
+  pixel_ntypes = 29  // one past the largest pixel layout
 };
 
 // Alpha handling of the native-image conversions, as option and as result.

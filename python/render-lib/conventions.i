@@ -47,7 +47,10 @@
 #include <string>
 
 // A text for "%s" that is never null: a null engine text prints as "(null)".
-static inline const char *printable(const char *text) { return text ? text : "(null)"; }
+static inline const char *printable(const char *text)
+{
+  return text ? text : "(null)";
+}
 
 // A refusal deep in the module's own code (an iterator, say): leaves the
 // wrapper with this Python exception, which the guard raises.
@@ -65,7 +68,12 @@ public:
   PyOwned(const PyOwned &) = delete;
   PyOwned &operator=(const PyOwned &) = delete;
   PyObject *get() const { return object_; }
-  PyObject *release() { PyObject *object = object_; object_ = NULL; return object; }
+  PyObject *release()
+  {
+    PyObject *object = object_;
+    object_ = NULL;
+    return object;
+  }
 private:
   PyObject *object_;
 };
@@ -78,7 +86,10 @@ static PyObject *engine_text(const char *text, size_t size)
     Py_RETURN_NONE;
   return PyUnicode_DecodeUTF8(text, (Py_ssize_t)size, "surrogateescape");
 }
-static PyObject *engine_text(const char *text) { return engine_text(text, text ? std::strlen(text) : 0); }
+static PyObject *engine_text(const char *text)
+{
+  return engine_text(text, text ? std::strlen(text) : 0);
+}
 
 // Packed records are read and written by byte and bit position, so the module
 // sees the engine's layout whatever this compiler does with bit-fields. A
@@ -90,7 +101,8 @@ static inline unsigned int packed_field(const void *record, size_t byte, unsigne
   return (word >> first_bit) & ((1u << width) - 1);
 }
 
-static inline void set_packed_field(void *record, size_t byte, unsigned int first_bit, unsigned int width, unsigned int value)
+static inline void set_packed_field(void *record, size_t byte, unsigned int first_bit, unsigned int width,
+                                    unsigned int value)
 {
   unsigned char *p = static_cast<unsigned char *>(record) + byte;
   uint32_t word = uint32_t(p[0]) | uint32_t(p[1]) << 8 | uint32_t(p[2]) << 16 | uint32_t(p[3]) << 24;

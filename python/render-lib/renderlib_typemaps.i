@@ -56,7 +56,8 @@
 // null) self is refused the way a null reference is.
 %typemap(check, noblock=1) SWIGTYPE *self, SWIGTYPE const *self {
   if (!$1)
-    SWIG_exception_fail(SWIG_ValueError, "invalid null reference in method '$symname', argument $argnum of type '$1_type'");
+    SWIG_exception_fail(SWIG_ValueError,
+                        "invalid null reference in method '$symname', argument $argnum of type '$1_type'");
 }
 
 // RawImage pixels
@@ -158,7 +159,9 @@ static PyObject *wrapped_this(PyObject *item)
         res = SWIG_ERROR;
       Py_XDECREF(wrapped);
       if (!SWIG_IsOK(res))
-        SWIG_exception_fail(SWIG_ArgError(res), "in method '$symname', argument $argnum of type 'T_RasterInfo **': cannot convert to T_RasterInfo");
+        SWIG_exception_fail(
+            SWIG_ArgError(res),
+            "in method '$symname', argument $argnum of type 'T_RasterInfo **': cannot convert to T_RasterInfo");
       rasters[i] = static_cast<T_RasterInfo *>(pointer);
     } else if (item == Py_None) {
       rasters[i] = NULL;
@@ -201,7 +204,8 @@ static PyObject *wrapped_this(PyObject *item)
       views.push_back(view);
       addresses[(size_t)i] = view.buf;
     } else if (item != Py_None) {
-      PyErr_SetString(PyExc_TypeError, "in $symname, arg $argnum, list must contain objects that support the buffer protocol");
+      PyErr_SetString(PyExc_TypeError,
+                      "in $symname, arg $argnum, list must contain objects that support the buffer protocol");
       SWIG_fail;
     }
   }
@@ -254,7 +258,8 @@ static PyObject *wrapped_this(PyObject *item)
 // its own: None is refused the way a null reference is, instead of crashing.
 %typemap(check, noblock=1) T_RasterInfo *RequiredRecord, char const *RequiredText {
   if (!$1)
-    SWIG_exception_fail(SWIG_ValueError, "invalid null reference in method '$symname', argument $argnum of type '$1_type'");
+    SWIG_exception_fail(SWIG_ValueError,
+                        "invalid null reference in method '$symname', argument $argnum of type '$1_type'");
 }
 
 // (char const *DecodeText, uchar_t *DecodeDest, int DecodeLength)
@@ -265,7 +270,8 @@ static PyObject *wrapped_this(PyObject *item)
   if ($3 < 0)
     SWIG_exception_fail(SWIG_ValueError, "in method '$symname', argument 3 of type 'int' must not be negative");
   if ($3 > 0 && !$1)
-    SWIG_exception_fail(SWIG_ValueError, "invalid null reference in method '$symname', argument 1 of type 'char const *'");
+    SWIG_exception_fail(SWIG_ValueError,
+                        "invalid null reference in method '$symname', argument 1 of type 'char const *'");
   if ($3 > 0 && !$2)
     SWIG_exception_fail(SWIG_ValueError, "invalid null reference in method '$symname', argument 2 of type 'uchar_t *'");
 }
@@ -349,7 +355,8 @@ static void give_process_ids_a_destroy_function(swig_type_info *type)
   if (!SWIG_IsOK(res))
     SWIG_exception_fail(SWIG_ArgError(res), "in method '$symname', argument $argnum of type 'char const *'");
   if (!buffer || size < RASTER_INFO_IMAGE_SIZE + 1)
-    SWIG_exception_fail(SWIG_ValueError, "in method '$symname', argument $argnum: a raster descriptor image is 104 bytes");
+    SWIG_exception_fail(SWIG_ValueError,
+                        "in method '$symname', argument $argnum: a raster descriptor image is 104 bytes");
   $1 = buffer;
 }
 %typemap(freearg) char const *RasterImageBytes "if (alloc$argnum == SWIG_NEWOBJ) delete[] buffer$argnum;"
@@ -427,7 +434,8 @@ static MonitorObjects &monitor_objects()
 // destroyed; None, or a released display, is refused with ValueError.
 %typemap(check, noblock=1) EM_Display *LiveDisplay {
   if (!$1 || !monitor_objects().displays.count($1))
-    SWIG_exception_fail(SWIG_ValueError, "in method '$symname', argument $argnum of type '$1_type': "
+    SWIG_exception_fail(SWIG_ValueError,
+                        "in method '$symname', argument $argnum of type '$1_type': "
                         "no display (None, or released by release_external_monitor)");
 }
 // EM_Display * (a result): recorded as alive.
@@ -441,14 +449,16 @@ static MonitorObjects &monitor_objects()
 // whose last reference was removed, is refused with ValueError.
 %typemap(check, noblock=1) EM_XIImage *LiveImage {
   if (!$1 || !monitor_objects().images.count($1))
-    SWIG_exception_fail(SWIG_ValueError, "in method '$symname', argument $argnum of type '$1_type': "
+    SWIG_exception_fail(SWIG_ValueError,
+                        "in method '$symname', argument $argnum of type '$1_type': "
                         "no image (None, or its last reference was removed)");
 }
 // EM_XIImage *LiveImageOrNone
 // As LiveImage, but None passes as null (the library answers it with a status).
 %typemap(check, noblock=1) EM_XIImage *LiveImageOrNone {
   if ($1 && !monitor_objects().images.count($1))
-    SWIG_exception_fail(SWIG_ValueError, "in method '$symname', argument $argnum of type '$1_type': "
+    SWIG_exception_fail(SWIG_ValueError,
+                        "in method '$symname', argument $argnum of type '$1_type': "
                         "its last reference was removed");
 }
 // EM_XIImage * (a result): recorded as alive.

@@ -37,8 +37,8 @@ QRV_API int qrv_probe_object_number(const void *object);
  * name (into `name`, `name_capacity` bytes, cut and NUL-terminated). Returns
  * the frame's byte count (0 when no frame was shown since connect), -1 for a
  * pointer that is not a live display. Null outputs are skipped. */
-QRV_API int qrv_probe_preview_frame(const void *display, void *bgra, int capacity, int *width,
-                                    int *height, long long *frames, char *name, int name_capacity);
+QRV_API int qrv_probe_preview_frame(const void *display, void *bgra, int capacity, int *width, int *height,
+                                    long long *frames, char *name, int name_capacity);
 
 /* Fault switches, kept until changed: EM_DisplayInit returns null while
  * `init_fails` is set; displays made while `no_devices` is set have no devices. */

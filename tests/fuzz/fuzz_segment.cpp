@@ -94,7 +94,8 @@ extern "C" int LLVMFuzzerTestOneInput(const uint8_t *data, std::size_t size) {
   // the mapping only reserves address space), the bytes given, or sizes
   // around the header's.
   const uint64_t recorded = header_size >= offsetof(SegmentHeader, segment_bytes) + 8
-                                ? word_at(exact.data(), offsetof(SegmentHeader, segment_bytes)) : 0;
+                                ? word_at(exact.data(), offsetof(SegmentHeader, segment_bytes))
+                                : 0;
   std::size_t mapped_size = choice % 4 == 2 ? header_size : sizeof(SegmentHeader) - 8 + choice / 4 % 16;
   if (choice % 4 < 2) mapped_size = recorded <= kHeaderBytes + 2 * kMaxCapacity ? recorded : header_size;
   if (mapped_size > 0) {

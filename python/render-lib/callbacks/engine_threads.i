@@ -212,9 +212,8 @@ static PyObject *shut_engine_threads_out(PyObject *, PyObject *)
 
 // Registered with atexit directly, so it is no function of the module.
 static PyMethodDef shut_engine_threads_out_method = {
-  "shut_engine_threads_out", shut_engine_threads_out, METH_NOARGS,
-  "Keeps threads in native code out of Python from here to the interpreter's end."
-};
+    "shut_engine_threads_out", shut_engine_threads_out, METH_NOARGS,
+    "Keeps threads in native code out of Python from here to the interpreter's end."};
 
 static void register_engine_thread_shutdown()
 {

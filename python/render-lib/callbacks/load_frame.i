@@ -102,8 +102,8 @@ static thread_local EngineThreadState engine_thread_state;
 // the render call, which the engine ends as an abort, and goes on into the
 // engine as the native exception it is. Once the interpreter is ending, the
 // request fails without taking the lock.
-static void *load_frame_for_engine(void *render_state, int input, int frame, unsigned char,
-                                   void *, void *, T_RasterInfo *out_info)
+static void *load_frame_for_engine(void *render_state, int input, int frame, unsigned char, void *, void *,
+                                   T_RasterInfo *out_info)
 {
   EngineCallbackEntry entry;
   if (!entry.open()) {

@@ -68,10 +68,12 @@ private:
 // as every instance argument is, with the call itself (see WidgetCall).
 %typemap(check, noblock=1) EffectGlobals_t *WidgetInstance (InstanceUse use, WidgetCall call) {
   if ($1 && !use.enter($1, proxy$argnum))
-    SWIG_exception_fail(SWIG_ValueError, "in method '$symname', argument $argnum of type '$1_type': "
+    SWIG_exception_fail(SWIG_ValueError,
+                        "in method '$symname', argument $argnum of type '$1_type': "
                         "no effect instance (freed by free_tarsel_effect)");
   if (!call.begin())
-    SWIG_exception_fail(SWIG_RuntimeError, "in method '$symname': the interpreter is ending; "
+    SWIG_exception_fail(SWIG_RuntimeError,
+                        "in method '$symname': the interpreter is ending; "
                         "widgets are drawn only on the thread that ends it");
 }
 

@@ -76,10 +76,13 @@ class ContainerPosition : public SwigPyIterator_T<OutIter> {
 public:
   ContainerPosition(Container *container, const OutIter &at, PyObject *seq)
       : SwigPyIterator_T<OutIter>(at, seq), seq_(seq), pointer_object_(pointer_object(container, seq)),
-        size_(container->size()) {}
+        size_(container->size())
+  {
+  }
 
   // The container, alive and unchanged in size; else it refuses.
-  Container *container() const {
+  Container *container() const
+  {
     Container *container = current();
     if (!container)
       throw PositionRefused{PyExc_ValueError, "the iterator's " + kind() + " no longer exists"};
@@ -92,14 +95,16 @@ public:
   bool belongs_to(const Container *container) const { return container && current() == container; }
   // Refuses a position given to another container than its own, or one a
   // change of its container made stale.
-  void check_given_to(const Container *container) const {
+  void check_given_to(const Container *container) const
+  {
     if (!belongs_to(container))
       throw PositionRefused{PyExc_ValueError, "an iterator of another container"};
     this->container();
   }
   // The same kind of position over the same container, or "bad iterator type".
   template <class Position>
-  static const Position &alike(const Position &self, const SwigPyIterator &other) {
+  static const Position &alike(const Position &self, const SwigPyIterator &other)
+  {
     const Position *position = dynamic_cast<const Position *>(&other);
     if (!position)
       throw std::invalid_argument("bad iterator type");
@@ -113,18 +118,20 @@ protected:
 
 private:
   // The pointer object of `seq` when it stands for `container`, else none.
-  static PyObject *pointer_object(Container *container, PyObject *seq) {
+  static PyObject *pointer_object(Container *container, PyObject *seq)
+  {
     void *pointer = 0;
     if (!seq || !SWIG_IsOK(SWIG_ConvertPtr(seq, &pointer, swig::type_info<Container>(), 0)) || pointer != container)
       return 0;
     return (PyObject *)SWIG_Python_GetSwigThis(seq);
   }
-  Container *current() const {
+  Container *current() const
+  {
     PyObject *object = pointer_object_;
     return object ? static_cast<Container *>(((SwigPyObject *)object)->ptr) : 0;
   }
 
-  PyObject *seq_;                   // held by SwigPyIterator
+  PyObject *seq_;                    // held by SwigPyIterator
   SwigPtr_PyObject pointer_object_;  // held here
   typename Container::size_type size_;
 };
@@ -137,29 +144,34 @@ class VectorPosition : public ContainerPosition<Vector, OutIter> {
   typedef VectorPosition<Vector, OutIter, Reversed> self_type;
 
 public:
-  VectorPosition(Vector *vector, size_t index, PyObject *seq)
-      : base(vector, start(vector) + index, seq), index_(index) {}
+  VectorPosition(Vector *vector, size_t index, PyObject *seq) : base(vector, start(vector) + index, seq), index_(index)
+  {
+  }
 
-  PyObject *value() const {
+  PyObject *value() const
+  {
     Vector *vector = base::container();
     if (index_ >= vector->size())
       throw stop_iteration();
     return swig::from(static_cast<const typename Vector::value_type &>(*(start(vector) + index_)));
   }
-  SwigPyIterator *incr(size_t n = 1) {
+  SwigPyIterator *incr(size_t n = 1)
+  {
     if (n > base::container()->size() - index_)
       throw stop_iteration();
     index_ += n;
     return this;
   }
-  SwigPyIterator *decr(size_t n = 1) {
+  SwigPyIterator *decr(size_t n = 1)
+  {
     base::container();
     if (n > index_)
       throw stop_iteration();
     index_ -= n;
     return this;
   }
-  ptrdiff_t distance(const SwigPyIterator &other) const {
+  ptrdiff_t distance(const SwigPyIterator &other) const
+  {
     return ptrdiff_t(base::alike(*this, other).index_) - ptrdiff_t(index_);
   }
   bool equal(const SwigPyIterator &other) const { return base::alike(*this, other).index_ == index_; }
@@ -167,7 +179,8 @@ public:
 
   // The C++ iterator in `vector`, checked for `use`: 0 any position from the
   // first to the end, 1 an element.
-  OutIter at(Vector *vector, int use) const {
+  OutIter at(Vector *vector, int use) const
+  {
     base::check_given_to(vector);
     if (index_ + use > vector->size())
       throw PositionRefused{PyExc_IndexError, "the iterator is past the last element"};
@@ -177,7 +190,8 @@ public:
 private:
   static OutIter start(Vector *vector) { return begin_of(vector, (OutIter *)0); }
   static typename Vector::iterator begin_of(Vector *vector, typename Vector::iterator *) { return vector->begin(); }
-  static typename Vector::reverse_iterator begin_of(Vector *vector, typename Vector::reverse_iterator *) {
+  static typename Vector::reverse_iterator begin_of(Vector *vector, typename Vector::reverse_iterator *)
+  {
     return vector->rbegin();
   }
   size_t index_;
@@ -193,20 +207,25 @@ class MapPosition : public ContainerPosition<Map, OutIter> {
   typedef typename Map::iterator iterator;
 
 public:
-  MapPosition(Map *map, const OutIter &at, PyObject *seq) : base(map, at, seq), at_end_(at == finish(map)) {
+  MapPosition(Map *map, const OutIter &at, PyObject *seq) : base(map, at, seq), at_end_(at == finish(map))
+  {
     if (!at_end_)
       key_.reset(new key_type(at->first));
   }
   MapPosition(const MapPosition &other)
-      : base(other), at_end_(other.at_end_), key_(other.key_ ? new key_type(*other.key_) : 0) {}
+      : base(other), at_end_(other.at_end_), key_(other.key_ ? new key_type(*other.key_) : 0)
+  {
+  }
 
-  PyObject *value() const {
+  PyObject *value() const
+  {
     Map *map = base::container();
     if (at_end_)
       throw stop_iteration();
     return from(static_cast<const typename Map::value_type &>(*element(map)));
   }
-  SwigPyIterator *incr(size_t n = 1) {
+  SwigPyIterator *incr(size_t n = 1)
+  {
     Map *map = base::container();
     while (n--) {
       if (at_end_)
@@ -219,7 +238,8 @@ public:
     }
     return this;
   }
-  SwigPyIterator *decr(size_t n = 1) {
+  SwigPyIterator *decr(size_t n = 1)
+  {
     Map *map = base::container();
     while (n--) {
       iterator to;
@@ -241,18 +261,21 @@ public:
     }
     return this;
   }
-  ptrdiff_t distance(const SwigPyIterator &other) const {
+  ptrdiff_t distance(const SwigPyIterator &other) const
+  {
     const self_type &to = base::alike(*this, other);
     Map *map = base::container();
     return to.order(map) - order(map);
   }
-  bool equal(const SwigPyIterator &other) const {
+  bool equal(const SwigPyIterator &other) const
+  {
     const self_type &to = base::alike(*this, other);
     return to.at_end_ == at_end_ && (at_end_ || !(*to.key_ < *key_ || *key_ < *to.key_));
   }
   SwigPyIterator *copy() const { return new self_type(*this); }
 
-  iterator at(Map *map, int use) const {
+  iterator at(Map *map, int use) const
+  {
     base::check_given_to(map);
     if (at_end_ && use)
       throw PositionRefused{PyExc_IndexError, "the iterator is past the last element"};
@@ -266,18 +289,21 @@ private:
 
   // The element at the key; its key may have gone (erased and another put in
   // its place, the size the same).
-  iterator element(Map *map) const {
+  iterator element(Map *map) const
+  {
     iterator found = map->find(*key_);
     if (found == map->end())
       throw PositionRefused{PyExc_RuntimeError, base::kind() + " changed since the iterator was made"};
     return found;
   }
-  void move(Map *map, iterator to) {
+  void move(Map *map, iterator to)
+  {
     at_end_ = to == map->end();
     key_.reset(at_end_ ? 0 : new key_type(to->first));
   }
   // Steps from the start of the walk.
-  ptrdiff_t order(Map *map) const {
+  ptrdiff_t order(Map *map) const
+  {
     const ptrdiff_t from_begin = at_end_ ? ptrdiff_t(map->size()) : std::distance(map->begin(), element(map));
     return Reversed ? (at_end_ ? ptrdiff_t(map->size()) : ptrdiff_t(map->size()) - 1 - from_begin) : from_begin;
   }
@@ -290,34 +316,38 @@ private:
 // A position for each kind of container and iterator the module has.
 template <class T, class A>
 SwigPyIterator *container_position(std::vector<T, A> *vector, const typename std::vector<T, A>::iterator &at,
-                                   PyObject *seq) {
+                                   PyObject *seq)
+{
   typedef std::vector<T, A> Vector;
   return new VectorPosition<Vector, typename Vector::iterator, false>(vector, size_t(at - vector->begin()), seq);
 }
 template <class T, class A>
-SwigPyIterator *container_position(std::vector<T, A> *vector,
-                                   const typename std::vector<T, A>::reverse_iterator &at, PyObject *seq) {
+SwigPyIterator *container_position(std::vector<T, A> *vector, const typename std::vector<T, A>::reverse_iterator &at,
+                                   PyObject *seq)
+{
   typedef std::vector<T, A> Vector;
   return new VectorPosition<Vector, typename Vector::reverse_iterator, true>(vector, size_t(at - vector->rbegin()),
-                                                                              seq);
+                                                                             seq);
 }
 template <class K, class T, class C, class A>
 SwigPyIterator *container_position(std::map<K, T, C, A> *map, const typename std::map<K, T, C, A>::iterator &at,
-                                   PyObject *seq) {
+                                   PyObject *seq)
+{
   typedef std::map<K, T, C, A> Map;
   return new MapPosition<Map, typename Map::iterator, from_oper<typename Map::value_type>, false>(map, at, seq);
 }
 template <class K, class T, class C, class A>
-SwigPyIterator *container_position(std::map<K, T, C, A> *map,
-                                   const typename std::map<K, T, C, A>::reverse_iterator &at, PyObject *seq) {
+SwigPyIterator *container_position(std::map<K, T, C, A> *map, const typename std::map<K, T, C, A>::reverse_iterator &at,
+                                   PyObject *seq)
+{
   typedef std::map<K, T, C, A> Map;
-  return new MapPosition<Map, typename Map::reverse_iterator, from_oper<typename Map::value_type>, true>(map, at,
-                                                                                                        seq);
+  return new MapPosition<Map, typename Map::reverse_iterator, from_oper<typename Map::value_type>, true>(map, at, seq);
 }
 
 // A position in the map `seq` stands for, reading each element with FromOper.
 template <class Map, template <class> class FromOper>
-SwigPyIterator *map_position(const typename Map::iterator &at, PyObject *seq) {
+SwigPyIterator *map_position(const typename Map::iterator &at, PyObject *seq)
+{
   void *map = 0;
   SWIG_ConvertPtr(seq, &map, swig::type_info<Map>(), 0);
   return new MapPosition<Map, typename Map::iterator, FromOper<typename Map::value_type>, false>(
@@ -329,7 +359,8 @@ SwigPyIterator *map_position(const typename Map::iterator &at, PyObject *seq) {
 // it is refused, or when it is no position of this module (`refused.type`
 // is then null).
 template <class Position, class Container, class OutIter>
-bool position_of(Container *container, SwigPyIterator *iterator, int use, OutIter *out, PositionRefused *refused) {
+bool position_of(Container *container, SwigPyIterator *iterator, int use, OutIter *out, PositionRefused *refused)
+{
   refused->type = 0;
   const Position *position = dynamic_cast<const Position *>(iterator);
   if (!position)
@@ -343,13 +374,14 @@ bool position_of(Container *container, SwigPyIterator *iterator, int use, OutIte
   }
 }
 template <class Container, class OutIter>
-bool position_argument(Container *container, SwigPyIterator *iterator, int use, OutIter *out,
-                       PositionRefused *refused) {
+bool position_argument(Container *container, SwigPyIterator *iterator, int use, OutIter *out, PositionRefused *refused)
+{
   return position_of<VectorPosition<Container, OutIter, false> >(container, iterator, use, out, refused);
 }
 template <class K, class T, class C, class A>
 bool position_argument(std::map<K, T, C, A> *map, SwigPyIterator *iterator, int use,
-                       typename std::map<K, T, C, A>::iterator *out, PositionRefused *refused) {
+                       typename std::map<K, T, C, A>::iterator *out, PositionRefused *refused)
+{
   typedef std::map<K, T, C, A> Map;
   return position_of<MapPosition<Map, typename Map::iterator, from_oper<typename Map::value_type>, false> >(
       map, iterator, use, out, refused);

@@ -22,7 +22,8 @@ class Param;
 namespace swig {
 template <class Seq, class T, bool ElementsCheckedAsTheyConvert>
 struct container_from_sequence {
-  static int asptr(PyObject *obj, Seq **seq) {
+  static int asptr(PyObject *obj, Seq **seq)
+  {
     if (obj == Py_None || SWIG_Python_GetSwigThis(obj)) {
       Seq *p;
       swig_type_info *descriptor = swig::type_info<Seq>();
@@ -75,12 +76,13 @@ struct traits_asptr_stdseq<std::map<K, T, C, A>, std::pair<K, T> >
 // (A more specialised overload of SWIG's delslice, which its slice methods
 // call.)
 template <class T, class A, class Difference>
-inline void delslice(std::vector<T, A> *self, Difference i, Difference j, Py_ssize_t step) {
+inline void delslice(std::vector<T, A> *self, Difference i, Difference j, Py_ssize_t step)
+{
   if (step > 0 && i >= (Difference)self->size())
     i = 0;
   swig::delslice<std::vector<T, A>, Difference>(self, i, j, step);
 }
-}
+}  // namespace swig
 %}
 %fragment("ContainerConversionFreesOnFailure");
 

@@ -12,8 +12,7 @@
 // The engine's node flag meaning "takes data from the host".
 static const int NODE_FLAG_HOST_DATA = 0x20000;
 
-static std::vector<std::string> input_name_slots(const Genotype *genotype,
-                                                 const char (*slots)[MAX_INPUT_NAME_LEN])
+static std::vector<std::string> input_name_slots(const Genotype *genotype, const char (*slots)[MAX_INPUT_NAME_LEN])
 {
   std::vector<std::string> names;
   for (int i = 0; i < genotype->n_inputs && i < MAX_INPUTS; ++i)

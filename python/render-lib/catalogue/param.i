@@ -57,14 +57,12 @@ static cJSON *keep_latest_json(Param *param, cJSON *tree)
 static bool param_is_point(const Param *param)
 {
   switch (packed_field(param, 158, 1, 4)) {
-  case screen_mode_screen:
-  case screen_mode_screen_center:
-  case screen_mode_normalize:
-  case screen_mode_screen_to_norm:
-  case screen_mode_screen_center_to_norm:
-    return param->n_channels_c1 == 2;
-  default:
-    return false;
+    case screen_mode_screen:
+    case screen_mode_screen_center:
+    case screen_mode_normalize:
+    case screen_mode_screen_to_norm:
+    case screen_mode_screen_center_to_norm: return param->n_channels_c1 == 2;
+    default: return false;
   }
 }
 

@@ -51,7 +51,11 @@ public:
     }
     held_ = true;
   }
-  ~MessageBytes() { if (held_) PyBuffer_Release(&view_); }
+  ~MessageBytes()
+  {
+    if (held_)
+      PyBuffer_Release(&view_);
+  }
   MessageBytes(const MessageBytes &) = delete;
   MessageBytes &operator=(const MessageBytes &) = delete;
   bool ok() const { return held_; }

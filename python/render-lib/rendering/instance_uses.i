@@ -152,19 +152,23 @@ private:
 }
 %typemap(check, noblock=1) EffectGlobals_t *self (InstanceUse use) {
   if (!$1)
-    SWIG_exception_fail(SWIG_ValueError, "invalid null reference in method '$symname', argument $argnum of type '$1_type'");
+    SWIG_exception_fail(SWIG_ValueError,
+                        "invalid null reference in method '$symname', argument $argnum of type '$1_type'");
   if (!use.enter($1, proxy$argnum))
-    SWIG_exception_fail(SWIG_ValueError, "in method '$symname', argument $argnum of type '$1_type': "
+    SWIG_exception_fail(SWIG_ValueError,
+                        "in method '$symname', argument $argnum of type '$1_type': "
                         "no effect instance (freed by free_tarsel_effect)");
 }
 %typemap(check, noblock=1) EffectGlobals_t const *self {
   (void)proxy$argnum;
   if (!$1)
-    SWIG_exception_fail(SWIG_ValueError, "invalid null reference in method '$symname', argument $argnum of type '$1_type'");
+    SWIG_exception_fail(SWIG_ValueError,
+                        "invalid null reference in method '$symname', argument $argnum of type '$1_type'");
 }
 %typemap(check, noblock=1) EffectGlobals_t * (InstanceUse use) {
   if ($1 && !use.enter($1, proxy$argnum))
-    SWIG_exception_fail(SWIG_ValueError, "in method '$symname', argument $argnum of type '$1_type': "
+    SWIG_exception_fail(SWIG_ValueError,
+                        "in method '$symname', argument $argnum of type '$1_type': "
                         "no effect instance (freed by free_tarsel_effect)");
 }
 

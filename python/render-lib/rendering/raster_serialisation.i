@@ -15,11 +15,16 @@ static const size_t RASTER_INFO_IMAGE_SIZE = 104;
 // function of the module.
 static uchar_t DEC(uchar_t c)
 {
-  if (c >= 'A' && c <= 'Z') return (uchar_t)(c - 65);
-  if (c >= 'a' && c <= 'z') return (uchar_t)(c - 71);
-  if (c >= '0' && c <= '9') return (uchar_t)(c + 4);
-  if (c == '+') return 62;
-  if (c == '/') return 63;
+  if (c >= 'A' && c <= 'Z')
+    return (uchar_t)(c - 65);
+  if (c >= 'a' && c <= 'z')
+    return (uchar_t)(c - 71);
+  if (c >= '0' && c <= '9')
+    return (uchar_t)(c + 4);
+  if (c == '+')
+    return 62;
+  if (c == '/')
+    return 63;
   return c;
 }
 
@@ -37,22 +42,18 @@ static void base64decode(const char *text, uchar_t *dest, int length)
   for (int i = 0; text[i] != '\0' && text[i] != '='; ++i) {
     const uchar_t v = DEC((uchar_t)text[i]);
     switch (i % 4) {
-    case 0:
-      dest[j] |= (uchar_t)(v << 2);
-      break;
-    case 1:
-      dest[j] |= (uchar_t)((v & 0x30) >> 4);
-      if (++j < length)
-        dest[j] |= (uchar_t)((v & 0x0F) << 4);
-      break;
-    case 2:
-      dest[j] |= (uchar_t)((v & 0x3C) >> 2);
-      if (++j < length)
-        dest[j] |= (uchar_t)((v & 0x03) << 6);
-      break;
-    default:
-      dest[j] |= (uchar_t)(v & 0x3F);
-      ++j;
+      case 0: dest[j] |= (uchar_t)(v << 2); break;
+      case 1:
+        dest[j] |= (uchar_t)((v & 0x30) >> 4);
+        if (++j < length)
+          dest[j] |= (uchar_t)((v & 0x0F) << 4);
+        break;
+      case 2:
+        dest[j] |= (uchar_t)((v & 0x3C) >> 2);
+        if (++j < length)
+          dest[j] |= (uchar_t)((v & 0x03) << 6);
+        break;
+      default: dest[j] |= (uchar_t)(v & 0x3F); ++j;
     }
   }
 }

@@ -8,11 +8,10 @@
 // while it looks, takes at most eight steps, and answers only with a pointer
 // object that something else keeps alive. An exception pending before the
 // lookup stays pending.
-SWIGRUNTIME SwigPyObject *
-SWIG_Python_GetSwigThis(PyObject *pyobj)
+SWIGRUNTIME SwigPyObject *SWIG_Python_GetSwigThis(PyObject *pyobj)
 {
   if (SwigPyObject_Check(pyobj))
-    return (SwigPyObject *) pyobj;
+    return (SwigPyObject *)pyobj;
   PyObject *pending_type, *pending_value, *pending_traceback;
   PyErr_Fetch(&pending_type, &pending_value, &pending_traceback);
   SwigPyObject *found = 0;
@@ -24,7 +23,7 @@ SWIG_Python_GetSwigThis(PyObject *pyobj)
     obj = next;
     if (obj && SwigPyObject_Check(obj)) {
       if (Py_REFCNT(obj) > 1)
-        found = (SwigPyObject *) obj;
+        found = (SwigPyObject *)obj;
       break;
     }
   }
@@ -33,4 +32,3 @@ SWIG_Python_GetSwigThis(PyObject *pyobj)
   PyErr_Restore(pending_type, pending_value, pending_traceback);
   return found;
 }
-

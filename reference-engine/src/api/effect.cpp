@@ -68,8 +68,8 @@ void set_tarsel_luts(const char *input_lut_path, const char *output_lut_path, fl
 
 // The answers hold for every frame.
 int tarsel_effect_is_time_varying(EffectGlobals_t *globals, const char *param_values, int frame) {
-  auto scope = tarsel_ref::enter("tarsel_effect_is_time_varying", static_cast<const void *>(globals), param_values,
-                                 frame);
+  auto scope =
+      tarsel_ref::enter("tarsel_effect_is_time_varying", static_cast<const void *>(globals), param_values, frame);
   return tarsel_ref::time_varying(globals, param_values);
 }
 
@@ -103,24 +103,24 @@ void tarsel_shutdown_apps() {
   tarsel_ref::release_caches();
 }
 
-int render_tarsel_effect_to_native_image(EffectGlobals_t *instance, const char *descriptor, RawImage dest,
-                                         int frame, int field, int downsample, int quality, T_RasterInfo **rasters,
-                                         RawImage *images, float mix, int n_rasters, float pixel_aspect,
-                                         int n_threads, int seed, int flags, int frame_rate, bool premultiplied,
+int render_tarsel_effect_to_native_image(EffectGlobals_t *instance, const char *descriptor, RawImage dest, int frame,
+                                         int field, int downsample, int quality, T_RasterInfo **rasters,
+                                         RawImage *images, float mix, int n_rasters, float pixel_aspect, int n_threads,
+                                         int seed, int flags, int frame_rate, bool premultiplied,
                                          const char *input_colorspace, const char *output_colorspace,
                                          const char *working_colorspace) {
-  auto scope = tarsel_ref::enter(
-      "render_tarsel_effect_to_native_image", static_cast<const void *>(instance), descriptor,
-      static_cast<const void *>(dest), frame, field, downsample, quality, static_cast<const void *>(rasters),
-      static_cast<const void *>(images), mix, n_rasters, pixel_aspect, n_threads, seed, flags, frame_rate,
-      premultiplied, input_colorspace, output_colorspace, working_colorspace);
+  auto scope = tarsel_ref::enter("render_tarsel_effect_to_native_image", static_cast<const void *>(instance),
+                                 descriptor, static_cast<const void *>(dest), frame, field, downsample, quality,
+                                 static_cast<const void *>(rasters), static_cast<const void *>(images), mix, n_rasters,
+                                 pixel_aspect, n_threads, seed, flags, frame_rate, premultiplied, input_colorspace,
+                                 output_colorspace, working_colorspace);
   tarsel_ref::RenderClock clock;
   if (tarsel_ref::render_immediate_return())
     return tarsel_ref::render_basics_present(instance, rasters, n_rasters) ? 1 : 0;
-  tarsel_ref::RenderCall call = tarsel_ref::make_render_call(
-      "render_tarsel_effect_to_native_image", instance, descriptor, dest, frame, field, downsample, quality, rasters,
-      images, n_rasters, pixel_aspect, n_threads, seed, premultiplied, input_colorspace, output_colorspace,
-      working_colorspace);
+  tarsel_ref::RenderCall call =
+      tarsel_ref::make_render_call("render_tarsel_effect_to_native_image", instance, descriptor, dest, frame, field,
+                                   downsample, quality, rasters, images, n_rasters, pixel_aspect, n_threads, seed,
+                                   premultiplied, input_colorspace, output_colorspace, working_colorspace);
   call.mix = mix;
   call.flags = flags;
   call.frame_rate = frame_rate;
@@ -134,24 +134,25 @@ bool render_tarsel_lensflare_to_native_image(EffectGlobals_t *instance, const ch
                                              int n_rasters, float pixel_aspect, int n_threads, int seed,
                                              const char *input_colorspace, const char *output_colorspace,
                                              const char *working_colorspace, bool premultiplied) {
-  auto scope = tarsel_ref::enter(
-      "render_tarsel_lensflare_to_native_image", static_cast<const void *>(instance), descriptor, center_x,
-      center_y, static_cast<const void *>(dest), frame, field, downsample, quality,
-      static_cast<const void *>(rasters), static_cast<const void *>(images), brightness, n_rasters, pixel_aspect,
-      n_threads, seed, input_colorspace, output_colorspace, working_colorspace, premultiplied);
+  auto scope = tarsel_ref::enter("render_tarsel_lensflare_to_native_image", static_cast<const void *>(instance),
+                                 descriptor, center_x, center_y, static_cast<const void *>(dest), frame, field,
+                                 downsample, quality, static_cast<const void *>(rasters),
+                                 static_cast<const void *>(images), brightness, n_rasters, pixel_aspect, n_threads,
+                                 seed, input_colorspace, output_colorspace, working_colorspace, premultiplied);
   tarsel_ref::RenderClock clock;
   if (tarsel_ref::render_immediate_return()) return tarsel_ref::render_basics_present(instance, rasters, n_rasters);
   if (!std::isfinite(center_x) || !std::isfinite(center_y) || !std::isfinite(brightness) || brightness < 0.0f) {
-    tarsel_ref::emit_message(Err_Error, "render_tarsel_lensflare_to_native_image: the centre must be a point and "
-                                        "the brightness a number of 0 or more");
+    tarsel_ref::emit_message(Err_Error,
+                             "render_tarsel_lensflare_to_native_image: the centre must be a point and "
+                             "the brightness a number of 0 or more");
     return false;
   }
   tarsel_ref::FlareCall flare;
   flare.brightness = brightness;
-  tarsel_ref::RenderCall call = tarsel_ref::make_render_call(
-      "render_tarsel_lensflare_to_native_image", instance, descriptor, dest, frame, field, downsample, quality,
-      rasters, images, n_rasters, pixel_aspect, n_threads, seed, premultiplied, input_colorspace, output_colorspace,
-      working_colorspace);
+  tarsel_ref::RenderCall call =
+      tarsel_ref::make_render_call("render_tarsel_lensflare_to_native_image", instance, descriptor, dest, frame, field,
+                                   downsample, quality, rasters, images, n_rasters, pixel_aspect, n_threads, seed,
+                                   premultiplied, input_colorspace, output_colorspace, working_colorspace);
   // The centre is given in destination pixels; the kernel works in the frame.
   if (rasters && n_rasters >= 1 && rasters[0]) {
     flare.center_x = static_cast<double>(center_x) + rasters[0]->x_origin;

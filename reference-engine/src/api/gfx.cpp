@@ -8,12 +8,11 @@ void tarsel_set_gfx_impl(GfxInterface *gfx) {
   tarsel_ref::install_gfx(gfx);
 }
 
-void tarsel_widget_draw(EffectGlobals_t *globals, const char *param_name, int view_xsize, int view_ysize,
-                        float view_x, float view_y, float view_scale_x, float view_scale_y,
-                        std::vector<float> values) {
-  auto scope = tarsel_ref::enter("tarsel_widget_draw", static_cast<const void *>(globals), param_name, view_xsize,
-                                 view_ysize, view_x, view_y, view_scale_x, view_scale_y,
-                                 tarsel_ref::values_text(values).c_str());
+void tarsel_widget_draw(EffectGlobals_t *globals, const char *param_name, int view_xsize, int view_ysize, float view_x,
+                        float view_y, float view_scale_x, float view_scale_y, std::vector<float> values) {
+  auto scope =
+      tarsel_ref::enter("tarsel_widget_draw", static_cast<const void *>(globals), param_name, view_xsize, view_ysize,
+                        view_x, view_y, view_scale_x, view_scale_y, tarsel_ref::values_text(values).c_str());
   tarsel_ref::draw_widgets(globals, param_name, view_xsize, view_ysize, view_x, view_y, view_scale_x, view_scale_y,
                            values);
 }

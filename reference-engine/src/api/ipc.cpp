@@ -70,7 +70,9 @@ void ShmemManager::reset_all(bool flag) {
   tarsel_ref::ipc::reset_all_segments(flag);
 }
 
-ShmemManager::ShmemManager() { auto scope = tarsel_ref::enter("ShmemManager::ShmemManager", static_cast<const void *>(this)); }
+ShmemManager::ShmemManager() {
+  auto scope = tarsel_ref::enter("ShmemManager::ShmemManager", static_cast<const void *>(this));
+}
 
 ShmemManager::ShmemManager(const ShmemManager &other) {
   auto scope = tarsel_ref::enter("ShmemManager::ShmemManager", static_cast<const void *>(this),
@@ -78,12 +80,14 @@ ShmemManager::ShmemManager(const ShmemManager &other) {
 }
 
 ShmemManager &ShmemManager::operator=(const ShmemManager &other) {
-  auto scope = tarsel_ref::enter("ShmemManager::operator=", static_cast<const void *>(this),
-                                 static_cast<const void *>(&other));
+  auto scope =
+      tarsel_ref::enter("ShmemManager::operator=", static_cast<const void *>(this), static_cast<const void *>(&other));
   return *this;
 }
 
-ShmemManager::~ShmemManager() { tarsel_ref::note_entry("ShmemManager::~ShmemManager", static_cast<const void *>(this)); }
+ShmemManager::~ShmemManager() {
+  tarsel_ref::note_entry("ShmemManager::~ShmemManager", static_cast<const void *>(this));
+}
 
 ShmemTransport::ShmemTransport(Impl *impl) : impl_(impl) {}
 
@@ -100,8 +104,7 @@ size_t ShmemTransport::try_read(void **data, MessageHeader_t **header) {
 }
 
 size_t ShmemTransport::timed_read(void **data, float timeout, MessageHeader_t **header) {
-  auto scope =
-      tarsel_ref::enter("ShmemTransport::timed_read", pointer(this), pointer(data), timeout, pointer(header));
+  auto scope = tarsel_ref::enter("ShmemTransport::timed_read", pointer(this), pointer(data), timeout, pointer(header));
   return impl_->receive(data, header, Deadline::after(timeout));
 }
 

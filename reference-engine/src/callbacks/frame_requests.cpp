@@ -94,9 +94,8 @@ std::shared_ptr<const WorkImage> FrameRequests::request(int input, int frame, un
   const std::function<void()> work = [&] {
     try {
       pixels = fun_(&state_, input, frame, flag, instance_, const_cast<Genotype *>(&genotype_), &info);
-    } TARSEL_LET_THREAD_END catch (...) {
-      threw = true;
     }
+    TARSEL_LET_THREAD_END catch (...) { threw = true; }
   };
   thread_->run(work);
   if (threw) {

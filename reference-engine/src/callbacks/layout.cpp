@@ -15,10 +15,10 @@ namespace {
 
 // How a point's two channels place it in the frame.
 enum class Placement {
-  pixels,          // frame pixels from the top-left corner
-  centre_pixels,   // frame pixels from the frame's centre
-  fractions,       // fractions of the frame's size from the top-left corner
-  centre_fractions // fractions of the frame's size from the frame's centre
+  pixels,           // frame pixels from the top-left corner
+  centre_pixels,    // frame pixels from the frame's centre
+  fractions,        // fractions of the frame's size from the top-left corner
+  centre_fractions  // fractions of the frame's size from the frame's centre
 };
 
 Placement placement(const Param &param) {
@@ -35,8 +35,8 @@ Placement placement(const Param &param) {
 // rate, so it is taken as it stands.)
 void shown_value(const Param &param, int frame, float out[MAX_CHANNELS]) {
   const ParamStore &store = store_of(param);
-  const bool counts = param.flags.auto_animation_type == auto_anim_floor0 ||
-                      param.flags.auto_animation_type == auto_anim_floor1;
+  const bool counts =
+      param.flags.auto_animation_type == auto_anim_floor0 || param.flags.auto_animation_type == auto_anim_floor1;
   const int channels = value_channels(param);
   for (int c = 0; c < MAX_CHANNELS; ++c)
     out[c] = c < channels ? store.value[c] + (counts ? static_cast<float>(frame) : 0.0f) : 0.0f;
@@ -111,8 +111,7 @@ bool make_view(int view_xsize, int view_ysize, float view_x, float view_y, float
   v.scale_y = scale_y;
   v.frame_width = values.size() > 0 ? static_cast<double>(values[0]) : view_xsize / v.scale_x;
   v.frame_height = values.size() > 1 ? static_cast<double>(values[1]) : view_ysize / v.scale_y;
-  if (!(std::isfinite(v.frame_width) && v.frame_width > 0.0 && std::isfinite(v.frame_height) &&
-        v.frame_height > 0.0)) {
+  if (!(std::isfinite(v.frame_width) && v.frame_width > 0.0 && std::isfinite(v.frame_height) && v.frame_height > 0.0)) {
     *error = "the frame size must be positive and finite";
     return false;
   }

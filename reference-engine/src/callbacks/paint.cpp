@@ -17,17 +17,39 @@ class Painter {
 public:
   explicit Painter(GfxInterface &gfx) : gfx_(gfx) {}
 
-  void set_graphics_context(void *context) { guard([&] { gfx_.set_graphics_context(context); }); }
-  void start_drawing(int n_widgets) { guard([&] { gfx_.start_drawing(n_widgets); }); }
-  void end_drawing() { guard([&] { gfx_.end_drawing(); }); }
-  void flush() { guard([&] { gfx_.flush(); }); }
-  void colour(const Rgb &c) { guard([&] { gfx_.color_3f(c.r, c.g, c.b); }); }
-  void line_width(float width) { guard([&] { gfx_.line_width(width); }); }
-  void line(float x1, float y1, float x2, float y2) { guard([&] { gfx_.line(x1, y1, x2, y2); }); }
-  void circle(float x, float y, float r) { guard([&] { gfx_.circle(x, y, r); }); }
-  void dot(float x, float y, float size) { guard([&] { gfx_.dot(x, y, size); }); }
-  void rect_filled(float x1, float y1, float x2, float y2) { guard([&] { gfx_.rect_filled(x1, y1, x2, y2); }); }
-  void text(const std::string &text, float x, float y) { guard([&] { gfx_.draw_text(text.c_str(), x, y); }); }
+  void set_graphics_context(void *context) {
+    guard([&] { gfx_.set_graphics_context(context); });
+  }
+  void start_drawing(int n_widgets) {
+    guard([&] { gfx_.start_drawing(n_widgets); });
+  }
+  void end_drawing() {
+    guard([&] { gfx_.end_drawing(); });
+  }
+  void flush() {
+    guard([&] { gfx_.flush(); });
+  }
+  void colour(const Rgb &c) {
+    guard([&] { gfx_.color_3f(c.r, c.g, c.b); });
+  }
+  void line_width(float width) {
+    guard([&] { gfx_.line_width(width); });
+  }
+  void line(float x1, float y1, float x2, float y2) {
+    guard([&] { gfx_.line(x1, y1, x2, y2); });
+  }
+  void circle(float x, float y, float r) {
+    guard([&] { gfx_.circle(x, y, r); });
+  }
+  void dot(float x, float y, float size) {
+    guard([&] { gfx_.dot(x, y, size); });
+  }
+  void rect_filled(float x1, float y1, float x2, float y2) {
+    guard([&] { gfx_.rect_filled(x1, y1, x2, y2); });
+  }
+  void text(const std::string &text, float x, float y) {
+    guard([&] { gfx_.draw_text(text.c_str(), x, y); });
+  }
   long text_width(const std::string &text) {
     long width = 0;
     guard([&] { width = gfx_.get_text_length_in_pixels(text.c_str()); });
@@ -51,9 +73,8 @@ private:
   static void guard(Call call) {
     try {
       call();
-    } TARSEL_LET_THREAD_END catch (...) {
-      throw TarselAbortException();
     }
+    TARSEL_LET_THREAD_END catch (...) { throw TarselAbortException(); }
   }
 
   GfxInterface &gfx_;

@@ -29,8 +29,7 @@ std::atomic<GfxInterface *> installed_gfx{nullptr};
 int held_index(EffectInstance &instance) {
   const WidgetHold &hold = instance.widget_hold;
   const Genotype *genotype = instance.effect_genotype;
-  if (hold.descriptor != genotype || !genotype || hold.param_index < 0 ||
-      hold.param_index >= genotype->n_params)
+  if (hold.descriptor != genotype || !genotype || hold.param_index < 0 || hold.param_index >= genotype->n_params)
     return -1;
   return hold.param_index;
 }
@@ -64,8 +63,7 @@ bool prepare(const char *entry, EffectGlobals_t *globals, const char *param_name
   if (param_name && *param_name) {
     call->only = find_param(*call->genotype, param_name);
     if (!call->only) {
-      emit_message(Err_Warning,
-                   (std::string(entry) + ": the effect has no parameter \"" + param_name + "\"").c_str());
+      emit_message(Err_Warning, (std::string(entry) + ": the effect has no parameter \"" + param_name + "\"").c_str());
       return false;
     }
   }
@@ -117,17 +115,17 @@ std::string values_text(const std::vector<float> &values) {
 // alive while it is installed.
 void install_gfx(GfxInterface *gfx) { installed_gfx.store(gfx); }
 
-void draw_widgets(EffectGlobals_t *globals, const char *param_name, int view_xsize, int view_ysize,
-                  float view_x, float view_y, float view_scale_x, float view_scale_y,
-                  std::vector<float> values) {
+void draw_widgets(EffectGlobals_t *globals, const char *param_name, int view_xsize, int view_ysize, float view_x,
+                  float view_y, float view_scale_x, float view_scale_y, std::vector<float> values) {
   tarsel_ref::Call call;
   if (!tarsel_ref::prepare("tarsel_widget_draw", globals, param_name, view_xsize, view_ysize, view_x, view_y,
                            view_scale_x, view_scale_y, values, &call))
     return;
   GfxInterface *gfx = tarsel_ref::installed_gfx.load();
   if (!gfx) {
-    tarsel_ref::emit_message(Err_Error, "tarsel_widget_draw: no drawing implementation is installed "
-                                        "(tarsel_set_gfx_impl)");
+    tarsel_ref::emit_message(Err_Error,
+                             "tarsel_widget_draw: no drawing implementation is installed "
+                             "(tarsel_set_gfx_impl)");
     return;
   }
   const std::vector<tarsel_ref::widgets::Widget> widgets =
@@ -137,10 +135,9 @@ void draw_widgets(EffectGlobals_t *globals, const char *param_name, int view_xsi
 
 // Status: 0 the event touched no widget, 1 over a widget or holding one, 2 a
 // release ended a drag. The list: the parameters the event changed.
-T_WidgetResult widget_mouse_event(EffectGlobals_t *globals, const char *param_name, int view_xsize,
-                                  int view_ysize, float view_x, float view_y, float view_scale_x,
-                                  float view_scale_y, std::vector<float> values, int mouse_x, int mouse_y,
-                                  MouseEventType event) {
+T_WidgetResult widget_mouse_event(EffectGlobals_t *globals, const char *param_name, int view_xsize, int view_ysize,
+                                  float view_x, float view_y, float view_scale_x, float view_scale_y,
+                                  std::vector<float> values, int mouse_x, int mouse_y, MouseEventType event) {
   namespace w = tarsel_ref::widgets;
   T_WidgetResult result{0, {}};
   tarsel_ref::Call call;
@@ -149,8 +146,9 @@ T_WidgetResult widget_mouse_event(EffectGlobals_t *globals, const char *param_na
     return result;
   if (event != MouseEventType::MOVE && event != MouseEventType::DRAG && event != MouseEventType::PRESS &&
       event != MouseEventType::RELEASE) {
-    tarsel_ref::emit_message(Err_Error, ("tarsel_widget_mouse_event: unknown mouse event " +
-                                         std::to_string(static_cast<int>(event))).c_str());
+    tarsel_ref::emit_message(
+        Err_Error,
+        ("tarsel_widget_mouse_event: unknown mouse event " + std::to_string(static_cast<int>(event))).c_str());
     return result;
   }
   tarsel_ref::EffectInstance &instance = *call.instance;
@@ -165,9 +163,7 @@ T_WidgetResult widget_mouse_event(EffectGlobals_t *globals, const char *param_na
     if (held >= 0 && widget.index == held && w::draggable(widget.kind)) holding = &widget;
 
   switch (event) {
-    case MouseEventType::MOVE:
-      result.first = holding || over >= 0 ? 1 : 0;
-      break;
+    case MouseEventType::MOVE: result.first = holding || over >= 0 ? 1 : 0; break;
     case MouseEventType::PRESS:
       if (over >= 0) {
         const w::Widget &taken = widgets[static_cast<std::size_t>(over)];

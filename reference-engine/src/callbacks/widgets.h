@@ -34,17 +34,17 @@ namespace tarsel_ref {
 namespace widgets {
 
 // Geometry, in screen pixels.
-constexpr float kHandleRadius = 10.0f;      // the handle's circle, and its hit radius
-constexpr float kHandleArm = 14.0f;         // the cross's lines reach this far from the centre
-constexpr float kHandleLabelDrop = 14.0f;   // the name's baseline lies this far below the circle
-constexpr float kSwatchLeft = 10.0f;        // left edge of every swatch
-constexpr float kSwatchTop = 10.0f;         // top edge of the first swatch
+constexpr float kHandleRadius = 10.0f;     // the handle's circle, and its hit radius
+constexpr float kHandleArm = 14.0f;        // the cross's lines reach this far from the centre
+constexpr float kHandleLabelDrop = 14.0f;  // the name's baseline lies this far below the circle
+constexpr float kSwatchLeft = 10.0f;       // left edge of every swatch
+constexpr float kSwatchTop = 10.0f;        // top edge of the first swatch
 constexpr float kSwatchWidth = 24.0f;
 constexpr float kSwatchHeight = 16.0f;
-constexpr float kSwatchPitch = 24.0f;       // top edge to top edge of consecutive slots
-constexpr float kSwatchLabelGap = 6.0f;     // from the swatch's right edge to its name
-constexpr float kSwatchLabelRaise = 2.0f;   // the name's baseline above the swatch's bottom edge
-constexpr float kLightDotSize = 6.0f;       // the flare's light
+constexpr float kSwatchPitch = 24.0f;      // top edge to top edge of consecutive slots
+constexpr float kSwatchLabelGap = 6.0f;    // from the swatch's right edge to its name
+constexpr float kSwatchLabelRaise = 2.0f;  // the name's baseline above the swatch's bottom edge
+constexpr float kLightDotSize = 6.0f;      // the flare's light
 
 // Line stipple of the flare's axis and the swatches' outline: 4 pixels on, 4 off.
 constexpr unsigned short kStippleMask = 0x0F0F;
@@ -88,14 +88,14 @@ struct Circle {
 // One widget as drawn, in screen pixels.
 struct Widget {
   Kind kind = Kind::point;
-  int index = -1;          // into the descriptor's parameter table
+  int index = -1;  // into the descriptor's parameter table
   Param *param = nullptr;
-  std::string label;       // the parameter's display name (canonical when it has none)
-  float x = 0.0f, y = 0.0f;                        // handle centre; flare light
+  std::string label;                                 // the parameter's display name (canonical when it has none)
+  float x = 0.0f, y = 0.0f;                          // handle centre; flare light
   float x1 = 0.0f, y1 = 0.0f, x2 = 0.0f, y2 = 0.0f;  // swatch rectangle
-  Rgb fill = {0.0f, 0.0f, 0.0f};                   // swatch colour
-  std::vector<float> axis_x, axis_y;               // flare axis: two points
-  std::vector<Circle> elements;                    // flare elements
+  Rgb fill = {0.0f, 0.0f, 0.0f};                     // swatch colour
+  std::vector<float> axis_x, axis_y;                 // flare axis: two points
+  std::vector<Circle> elements;                      // flare elements
 };
 
 bool is_point(const Param &param);

@@ -21,8 +21,8 @@ enum FromFileListId : unsigned char {
 // alone; blank lines and lines starting with '#' are skipped.
 struct FromFileList {
   std::vector<std::string> names;
-  std::vector<std::string> values;  // the text after " | ", "" when none
-  std::vector<char *> name_pointers; // names as the engine hands them out
+  std::vector<std::string> values;    // the text after " | ", "" when none
+  std::vector<char *> name_pointers;  // names as the engine hands them out
 };
 
 // The list, read on first use and kept for the life of the engine. A list

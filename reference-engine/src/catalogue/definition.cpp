@@ -120,7 +120,7 @@ ParamDefinition pair_param(const std::string &name, const std::string &canonical
 }
 
 ParamDefinition popup_param(const std::string &name, const std::string &canonical, std::vector<std::string> states,
-                      int def) {
+                            int def) {
   ParamDefinition source = float_param(name, canonical, static_cast<float>(def));
   source.type = ptype_popup;
   source.states = std::move(states);

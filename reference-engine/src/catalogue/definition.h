@@ -97,7 +97,7 @@ ParamDefinition color_param(const std::string &name, const std::string &canonica
 // Two channels placed in image space by `mode`.
 ParamDefinition pair_param(const std::string &name, const std::string &canonical, screen_mode mode, float x, float y);
 ParamDefinition popup_param(const std::string &name, const std::string &canonical, std::vector<std::string> states,
-                      int def = 0);
+                            int def = 0);
 ParamDefinition fromfile_popup(const std::string &name, const std::string &canonical, FromFileListId list);
 ParamDefinition bool_param(const std::string &name, const std::string &canonical, bool def);
 ParamDefinition button_param(const std::string &name, const std::string &canonical, std::vector<std::string> resets);
@@ -132,8 +132,8 @@ struct DescriptorDefinition {
   short old_default_effect = -1;  // -1: none
   short old_default_limit = 0;
   int node_flags = 0;
-  bool host_data = false;  // the effect takes engine data from the host (HostTextData)
-  std::string flare_param; // canonical name of the flare or glare parameter
+  bool host_data = false;           // the effect takes engine data from the host (HostTextData)
+  std::string flare_param;          // canonical name of the flare or glare parameter
   std::vector<std::string> stamps;  // flare element kinds the effect draws besides its flare's
 };
 

@@ -35,18 +35,30 @@ GroupMarks apply_flag_words(Param &param, const std::string &words, const std::s
     const std::string word = words.substr(start, comma - start);
     start = comma + 1;
     if (word.empty()) continue;
-    if (word == "hidden") param.flags.hidden_p = 1;
-    else if (word == "group_start") marks.opens = true;
-    else if (word == "open") param.flags.group_start_open_p = 1;
-    else if (word == "group_end") ++marks.closes;
-    else if (word == "doc_group") marks.documents = true;
-    else if (word == "no_publish") param.flags.dont_publish_p = 1;
-    else if (word == "builder_disable") param.flags.builder_disable_p = 1;
-    else if (word == "builder_disable_one") param.flags.builder_disable_one_p = 1;
-    else if (word == "fromfile") param.flags.fromfile_popup_p = 1;
-    else if (word == "glare") param.flags.glare_p = 1;
-    else if (word == "disabled") param.flags.wenable_p = 0;
-    else definition_error(effect, "unknown flag \"" + word + "\" on \"" + param_label(param) + "\"");
+    if (word == "hidden")
+      param.flags.hidden_p = 1;
+    else if (word == "group_start")
+      marks.opens = true;
+    else if (word == "open")
+      param.flags.group_start_open_p = 1;
+    else if (word == "group_end")
+      ++marks.closes;
+    else if (word == "doc_group")
+      marks.documents = true;
+    else if (word == "no_publish")
+      param.flags.dont_publish_p = 1;
+    else if (word == "builder_disable")
+      param.flags.builder_disable_p = 1;
+    else if (word == "builder_disable_one")
+      param.flags.builder_disable_one_p = 1;
+    else if (word == "fromfile")
+      param.flags.fromfile_popup_p = 1;
+    else if (word == "glare")
+      param.flags.glare_p = 1;
+    else if (word == "disabled")
+      param.flags.wenable_p = 0;
+    else
+      definition_error(effect, "unknown flag \"" + word + "\" on \"" + param_label(param) + "\"");
   }
   param.flags.group_start_p = marks.opens ? 1 : 0;
   param.flags.group_end_p = static_cast<unsigned>(marks.closes) & 7u;
@@ -70,9 +82,7 @@ std::unique_ptr<Param> make_kind(const ParamDefinition &source, const std::strin
       if (!parse_flare(source.text, &elements)) definition_error(effect, "malformed flare \"" + source.text + "\"");
       return std::make_unique<FlareParam>(format_flare(elements));
     }
-    default:
-      definition_error(effect, "parameter \"" + source.name + "\" has no kind");
-      return nullptr;
+    default: definition_error(effect, "parameter \"" + source.name + "\" has no kind"); return nullptr;
   }
 }
 

@@ -27,12 +27,12 @@ using tarsel_ref::store_of;
 // Bounds start at the no-limit values; the slider defaults suit a 0..1
 // quantity, the wide slider a 0..100 one.
 Param::Param()
-    : ptype(ptype_unknown), reserved_12{}, name(nullptr), canonical_name(nullptr), reserved_32{},
-      n_channels(1), n_channels_c1(1), reserved_42{}, default_value{}, old_default_value{},
-      use_old_default_p(0), old_default_version_limit(0), min_bound(tarsel_ref::kNoLowerBound),
-      max_bound(tarsel_ref::kNoUpperBound), step(0.01f), normalize_scale(1.0f), reserved_96{}, flags{},
-      slider_min(0.0f), slider_max(1.0f), big_slider_min(0.0f), big_slider_max(100.0f), param_group(-1),
-      reserved_209{}, flags_string(nullptr), reserved_224{} {
+    : ptype(ptype_unknown), reserved_12{}, name(nullptr), canonical_name(nullptr), reserved_32{}, n_channels(1),
+      n_channels_c1(1), reserved_42{}, default_value{}, old_default_value{}, use_old_default_p(0),
+      old_default_version_limit(0), min_bound(tarsel_ref::kNoLowerBound), max_bound(tarsel_ref::kNoUpperBound),
+      step(0.01f), normalize_scale(1.0f), reserved_96{}, flags{}, slider_min(0.0f), slider_max(1.0f),
+      big_slider_min(0.0f), big_slider_max(100.0f), param_group(-1), reserved_209{}, flags_string(nullptr),
+      reserved_224{} {
   auto scope = tarsel_ref::enter("Param::Param", static_cast<const void *>(this));
   tarsel_ref::ParamStore *store = new (reserved_96) tarsel_ref::ParamStore{};
   store->format = -1;
@@ -56,8 +56,8 @@ Param::~Param() {
 // The copy takes the description and the value; the text cache and the
 // derived name are the copy's own and start empty.
 Param &Param::operator=(const Param &other) {
-  auto scope = tarsel_ref::enter("Param::operator=", static_cast<const void *>(this),
-                                 static_cast<const void *>(&other));
+  auto scope =
+      tarsel_ref::enter("Param::operator=", static_cast<const void *>(this), static_cast<const void *>(&other));
   if (this == &other) return *this;
   tarsel_ref::replace_text(name, other.name);
   tarsel_ref::replace_text(canonical_name, other.canonical_name);
@@ -157,16 +157,15 @@ void *Param::get_value_object_nosync() {
 }
 
 int Param::set_value(RenderContext *ctx, int channel, float value, unsigned int flags) {
-  auto scope = tarsel_ref::enter("Param::set_value", static_cast<const void *>(this),
-                                 static_cast<const void *>(ctx), channel, value, flags);
+  auto scope = tarsel_ref::enter("Param::set_value", static_cast<const void *>(this), static_cast<const void *>(ctx),
+                                 channel, value, flags);
   return set_values(ctx, channel, 1, &value, flags);
 }
 
 // All or nothing: one channel that cannot be stored leaves the value as it was.
 int Param::set_values(RenderContext *ctx, int first_channel, int n, float *values, unsigned int flags) {
-  auto scope = tarsel_ref::enter("Param::set_values", static_cast<const void *>(this),
-                                 static_cast<const void *>(ctx), first_channel, n,
-                                 static_cast<const void *>(values), flags);
+  auto scope = tarsel_ref::enter("Param::set_values", static_cast<const void *>(this), static_cast<const void *>(ctx),
+                                 first_channel, n, static_cast<const void *>(values), flags);
   const int channels = tarsel_ref::value_channels(*this);
   if (n < 0 || first_channel < 0 || first_channel + n > channels || (n > 0 && !values)) return 0;
   float stored[MAX_CHANNELS];
@@ -216,8 +215,7 @@ bool Param::maybe_set_to_old_default(RenderContext *ctx, float version, unsigned
 // The controls are the value as the host's widgets show it; widget drags
 // change them, and get_value_from_buttons takes them back.
 void Param::update_ui(RenderContext *ctx) {
-  auto scope = tarsel_ref::enter("Param::update_ui", static_cast<const void *>(this),
-                                 static_cast<const void *>(ctx));
+  auto scope = tarsel_ref::enter("Param::update_ui", static_cast<const void *>(this), static_cast<const void *>(ctx));
   tarsel_ref::ParamStore &store = store_of(*this);
   std::memcpy(store.controls, store.value, sizeof store.controls);
 }

@@ -131,8 +131,7 @@ bool store_numbers(Param &param, const float *values, int count, unsigned int fl
 std::string value_text(const Param &param, bool display_units) {
   const ParamStore &store = store_of(param);
   switch (param.ptype) {
-    case ptype_boolean:
-      return store.value[0] != 0.0f ? "true" : "false";
+    case ptype_boolean: return store.value[0] != 0.0f ? "true" : "false";
     case ptype_popup: {
       const StateList states = popup_states(param);
       const int index = static_cast<int>(store.value[0]);
@@ -150,55 +149,42 @@ std::string value_text(const Param &param, bool display_units) {
       return text;
     }
     case ptype_string:
-    case ptype_flare:
-      return store.text ? store.text : "";
-    default:
-      return "";
+    case ptype_flare: return store.text ? store.text : "";
+    default: return "";
   }
 }
 
 bool read_value_text(Param &param, const char *text, unsigned int flags) {
   if (!text) return false;
   switch (param.ptype) {
-    case ptype_boolean:
-      return read_boolean(param, text);
-    case ptype_popup:
-      return read_popup(param, text);
+    case ptype_boolean: return read_boolean(param, text);
+    case ptype_popup: return read_popup(param, text);
     case ptype_float:
     case ptype_int:
-    case ptype_color:
-      return read_numbers(param, text, flags);
-    case ptype_string:
-      replace_text(store_of(param).text, *text ? text : nullptr);
-      return true;
-    case ptype_flare:
-      return read_flare(param, text);
-    default:
-      return trim(text).empty();
+    case ptype_color: return read_numbers(param, text, flags);
+    case ptype_string: replace_text(store_of(param).text, *text ? text : nullptr); return true;
+    case ptype_flare: return read_flare(param, text);
+    default: return trim(text).empty();
   }
 }
 
 cJSON *value_json(const Param &param) {
   const ParamStore &store = store_of(param);
   switch (param.ptype) {
-    case ptype_boolean:
-      return cJSON_CreateBool(store.value[0] != 0.0f);
+    case ptype_boolean: return cJSON_CreateBool(store.value[0] != 0.0f);
     case ptype_popup:
       if (popup_states(param).count > 0) return cJSON_CreateString(value_text(param, false).c_str());
       return cJSON_CreateNumber(store.value[0]);
     case ptype_float:
     case ptype_int:
-    case ptype_color:
-      return number_json(param);
-    case ptype_string:
-      return cJSON_CreateString(store.text ? store.text : "");
+    case ptype_color: return number_json(param);
+    case ptype_string: return cJSON_CreateString(store.text ? store.text : "");
     case ptype_flare: {
       std::vector<FlareElement> elements;
       parse_flare(store.text ? store.text : "", &elements);
       return flare_to_json(elements);
     }
-    default:
-      return cJSON_CreateNull();
+    default: return cJSON_CreateNull();
   }
 }
 
@@ -211,8 +197,7 @@ bool read_value_json(Param &param, const cJSON *json, unsigned int flags) {
     case ptype_popup:
     case ptype_float:
     case ptype_int:
-    case ptype_color:
-      return read_number_json(param, json, flags);
+    case ptype_color: return read_number_json(param, json, flags);
     case ptype_flare: {
       std::vector<FlareElement> elements;
       if (!flare_from_json(json, &elements)) return false;
@@ -220,8 +205,7 @@ bool read_value_json(Param &param, const cJSON *json, unsigned int flags) {
       replace_text(store_of(param).text, text.empty() ? nullptr : text.c_str());
       return true;
     }
-    default:
-      return cJSON_IsNull(json);
+    default: return cJSON_IsNull(json);
   }
 }
 

@@ -78,9 +78,7 @@ Param *ChoiceParam::clone_impl() {
   return copy_of<ChoiceParam>(*this, states);
 }
 
-PushButtonParam::PushButtonParam() {
-  ptype = ptype_pushbutton;
-}
+PushButtonParam::PushButtonParam() { ptype = ptype_pushbutton; }
 
 // A button keeps no value: a press is a set of its one channel to non-zero.
 int PushButtonParam::set_values(RenderContext *ctx, int first_channel, int n, float *values, unsigned int flags) {
@@ -103,9 +101,7 @@ static bool restore_default_text(Param &param, const std::string &default_text) 
   return current != default_text;
 }
 
-StringParam::StringParam(std::string text) : default_text(std::move(text)) {
-  ptype = ptype_string;
-}
+StringParam::StringParam(std::string text) : default_text(std::move(text)) { ptype = ptype_string; }
 
 bool StringParam::set_to_default(RenderContext *ctx, unsigned int flags) {
   auto scope = enter("Param::set_to_default", static_cast<const void *>(this), static_cast<const void *>(ctx), flags);
@@ -115,14 +111,10 @@ bool StringParam::set_to_default(RenderContext *ctx, unsigned int flags) {
 
 Param *StringParam::clone_impl() { return copy_of<StringParam>(*this, default_text); }
 
-LabelParam::LabelParam() {
-  ptype = ptype_label;
-}
+LabelParam::LabelParam() { ptype = ptype_label; }
 Param *LabelParam::clone_impl() { return copy_of<LabelParam>(*this); }
 
-FlareParam::FlareParam(std::string text) : default_text(std::move(text)) {
-  ptype = ptype_flare;
-}
+FlareParam::FlareParam(std::string text) : default_text(std::move(text)) { ptype = ptype_flare; }
 
 bool FlareParam::set_to_default(RenderContext *ctx, unsigned int flags) {
   auto scope = enter("Param::set_to_default", static_cast<const void *>(this), static_cast<const void *>(ctx), flags);

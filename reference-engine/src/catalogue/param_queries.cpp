@@ -22,10 +22,8 @@ bool is_point(const Param &param) {
     case screen_mode_screen_center:
     case screen_mode_normalize:
     case screen_mode_screen_to_norm:
-    case screen_mode_screen_center_to_norm:
-      return param.n_channels_c1 == 2;
-    default:
-      return false;
+    case screen_mode_screen_center_to_norm: return param.n_channels_c1 == 2;
+    default: return false;
   }
 }
 
@@ -69,12 +67,11 @@ int fromfile_popup_names(const Param *param, char ***names) {
 // scale multiplies every value but the no-limit bounds; channel is the
 // channel asked about (all of a parameter's channels share one range; one it
 // does not have gets no limits and an empty slider range); flags as above.
-void param_bounds(const Param *param, float scale, int channel, float *min_bound, float *max_bound,
-                  float *slider_min, float *slider_max, int flags) {
+void param_bounds(const Param *param, float scale, int channel, float *min_bound, float *max_bound, float *slider_min,
+                  float *slider_max, int flags) {
   float lo = tarsel_ref::kNoLowerBound, hi = tarsel_ref::kNoUpperBound, third = 0.0f, fourth = 0.0f;
   if (param && channel >= 0 && channel < std::max<int>(1, param->n_channels)) {
-    const float factor =
-        scale * ((flags & tarsel_ref::kBoundsDisplayUnits) ? param->normalize_scale : 1.0f);
+    const float factor = scale * ((flags & tarsel_ref::kBoundsDisplayUnits) ? param->normalize_scale : 1.0f);
     lo = tarsel_ref::scaled_bound(param->min_bound, tarsel_ref::kNoLowerBound, factor);
     hi = tarsel_ref::scaled_bound(param->max_bound, tarsel_ref::kNoUpperBound, factor);
     const bool big = flags & tarsel_ref::kBoundsBigSlider;
@@ -100,13 +97,9 @@ char *param_title(const Param *param, int channel, char *buffer, size_t buffer_s
   return buffer;
 }
 
-int any_node_flags(Genotype *genotype, int mask) {
-  return genotype ? tarsel_ref::node_flags(*genotype) & mask : 0;
-}
+int any_node_flags(Genotype *genotype, int mask) { return genotype ? tarsel_ref::node_flags(*genotype) & mask : 0; }
 
 // The text is the parameter's (see Param::to_string); the caller never frees it.
-char *param_text(Param *param) {
-  return param ? param->to_string(nullptr, false) : nullptr;
-}
+char *param_text(Param *param) { return param ? param->to_string(nullptr, false) : nullptr; }
 
 }  // namespace tarsel_ref

@@ -10,8 +10,8 @@
 
 // The text stays the Param's until its next to_string or its destruction.
 char *Param::to_string(RenderContext *ctx, bool flag) {
-  auto scope = tarsel_ref::enter("Param::to_string", static_cast<const void *>(this),
-                                 static_cast<const void *>(ctx), flag);
+  auto scope =
+      tarsel_ref::enter("Param::to_string", static_cast<const void *>(this), static_cast<const void *>(ctx), flag);
   const std::string text = tarsel_ref::value_text(*this, flag);
   tarsel_ref::ParamStore &store = tarsel_ref::store_of(*this);
   tarsel_ref::replace_text(store.shown, text.c_str());
@@ -29,8 +29,8 @@ int Param::set_value_from_string(RenderContext *ctx, const char *text, unsigned 
 
 // The caller owns the node and frees it with cJSON_Delete.
 cJSON *Param::to_json(RenderContext *ctx, bool flag) {
-  auto scope = tarsel_ref::enter("Param::to_json", static_cast<const void *>(this),
-                                 static_cast<const void *>(ctx), flag);
+  auto scope =
+      tarsel_ref::enter("Param::to_json", static_cast<const void *>(this), static_cast<const void *>(ctx), flag);
   cJSON *value = tarsel_ref::value_json(*this);
   if (!flag || !value) return value;
   cJSON *described = cJSON_CreateObject();

@@ -16,10 +16,8 @@ bool holds_numbers(param_type type) {
     case ptype_int:
     case ptype_color:
     case ptype_popup:
-    case ptype_boolean:
-      return true;
-    default:
-      return false;
+    case ptype_boolean: return true;
+    default: return false;
   }
 }
 

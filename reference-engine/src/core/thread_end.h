@@ -8,9 +8,11 @@
 #pragma once
 
 #if defined(__GLIBCXX__)
-#include <cxxabi.h>
-#define TARSEL_LET_THREAD_END \
-  catch (abi::__forced_unwind &) { throw; }
+#  include <cxxabi.h>
+#  define TARSEL_LET_THREAD_END      \
+    catch (abi::__forced_unwind &) { \
+      throw;                         \
+    }
 #else
-#define TARSEL_LET_THREAD_END
+#  define TARSEL_LET_THREAD_END
 #endif

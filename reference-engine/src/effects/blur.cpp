@@ -7,8 +7,11 @@ namespace {
 
 // Projects older than version 2 blurred with a radius of 10 by default.
 ParamDefinition radius() {
-  return float_param("Radius", "radius", 5.0f).bounds(0.0f, 500.0f).sliders(0.0f, 50.0f)
-      .shown_as(format_pixels).old_default({10.0f}, 2);
+  return float_param("Radius", "radius", 5.0f)
+      .bounds(0.0f, 500.0f)
+      .sliders(0.0f, 50.0f)
+      .shown_as(format_pixels)
+      .old_default({10.0f}, 2);
 }
 
 DescriptorDefinition blur() {

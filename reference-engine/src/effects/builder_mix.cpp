@@ -7,14 +7,17 @@ namespace {
 
 std::vector<DescriptorDefinition> assemble() {
   const std::vector<BuilderNode> nodes = {
-      {"Blend", "blend", kNodeMixesInputs,
+      {"Blend",
+       "blend",
+       kNodeMixesInputs,
        {popup_param("Mode", "mode", {"Normal", "Add", "Multiply", "Screen", "Overlay", "Difference"}),
         float_param("Opacity", "opacity", 1.0f).bounds(0.0f, 1.0f).shown_as(format_percent, 100.0f)}},
-      {"Levels", "levels", 0,
+      {"Levels",
+       "levels",
+       0,
        {float_param("Black Point", "black", 0.0f).bounds(0.0f, 1.0f),
         float_param("White Point", "white", 1.0f).bounds(0.0f, 1.0f),
-        float_param("Gamma", "gamma", 1.0f).bounds(0.1f, 10.0f).sliders(0.2f, 5.0f)
-            .with_flags("builder_disable_one")}},
+        float_param("Gamma", "gamma", 1.0f).bounds(0.1f, 10.0f).sliders(0.2f, 5.0f).with_flags("builder_disable_one")}},
   };
   DescriptorDefinition d = assemble_nodes("Builder Mix", {{"Front", "front"}, {"Back", "back", true}}, nodes);
   d.hardcoded = {{"background", {0.0f, 0.0f, 0.0f}}};

@@ -3,7 +3,7 @@
 namespace tarsel_ref {
 
 DescriptorDefinition assemble_nodes(const std::string &name, std::vector<InputDefinition> inputs,
-                              const std::vector<BuilderNode> &nodes) {
+                                    const std::vector<BuilderNode> &nodes) {
   DescriptorDefinition d;
   d.name = name;
   d.popup_name = name;

@@ -19,6 +19,6 @@ struct BuilderNode {
 };
 
 DescriptorDefinition assemble_nodes(const std::string &name, std::vector<InputDefinition> inputs,
-                              const std::vector<BuilderNode> &nodes);
+                                    const std::vector<BuilderNode> &nodes);
 
 }  // namespace tarsel_ref

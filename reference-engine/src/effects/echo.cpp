@@ -15,8 +15,11 @@ DescriptorDefinition echo() {
   d.params = {
       int_param("Echoes", "echoes", 4, 1, 32),
       float_param("Decay", "decay", 0.5f).bounds(0.0f, 1.0f).shown_as(format_percent, 100.0f),
-      float_param("Frame Step", "frame_step", -1.0f).bounds(-100.0f, 100.0f).sliders(-10.0f, 10.0f)
-          .shown_as(format_frames).stepping(1.0f),
+      float_param("Frame Step", "frame_step", -1.0f)
+          .bounds(-100.0f, 100.0f)
+          .sliders(-10.0f, 10.0f)
+          .shown_as(format_frames)
+          .stepping(1.0f),
       popup_param("Combine", "combine", {"Add", "Maximum", "Average", "Over"}, 2),
   };
   return d;

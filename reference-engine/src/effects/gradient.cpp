@@ -14,7 +14,10 @@ DescriptorDefinition gradient() {
   d.params = {
       color_param("Start Color", "start_color", {0.0f, 0.0f, 0.0f, 1.0f}).bounds(0.0f, kNoUpperBound),
       color_param("End Color", "end_color", {1.0f, 1.0f, 1.0f, 1.0f}).bounds(0.0f, kNoUpperBound),
-      float_param("Angle", "angle", 90.0f).shown_as(format_angle).sliders(0.0f, 360.0f).big_sliders(-720.0f, 720.0f)
+      float_param("Angle", "angle", 90.0f)
+          .shown_as(format_angle)
+          .sliders(0.0f, 360.0f)
+          .big_sliders(-720.0f, 720.0f)
           .stepping(1.0f),
       pair_param("Center", "center", screen_mode_normalize, 0.5f, 0.5f).sliders(0.0f, 1.0f).big_sliders(-1.0f, 2.0f),
       popup_param("Shape", "shape", {"Linear", "Radial", "Diamond", "Conical"}),

@@ -25,9 +25,12 @@ DescriptorDefinition lens_flare() {
   d.node_flags = kNodeDrawsFlare;
   d.flare_param = "flare";
   d.params = {
-      pair_param("Position", "position", screen_mode_normalize, 0.3f, 0.3f).sliders(0.0f, 1.0f)
+      pair_param("Position", "position", screen_mode_normalize, 0.3f, 0.3f)
+          .sliders(0.0f, 1.0f)
           .big_sliders(-1.0f, 2.0f),
-      float_param("Brightness", "brightness", 1.0f).bounds(0.0f, 10.0f).sliders(0.0f, 2.0f)
+      float_param("Brightness", "brightness", 1.0f)
+          .bounds(0.0f, 10.0f)
+          .sliders(0.0f, 2.0f)
           .shown_as(format_percent, 100.0f),
       float_param("Scale", "scale", 1.0f).bounds(0.01f, 10.0f).sliders(0.25f, 4.0f),
       fromfile_popup("Preset", "preset", kFlarePresets),

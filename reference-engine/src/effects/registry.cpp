@@ -6,9 +6,9 @@ namespace tarsel_ref {
 
 const std::vector<const PluginDefinition *> &effect_plugins() {
   static const std::vector<const PluginDefinition *> plugins = {
-      &gradient_plugin(), &blur_plugin(),       &glow_plugin(),  &dissolve_plugin(),
-      &echo_plugin(),     &trails_plugin(),     &lens_flare_plugin(), &glare_plugin(),
-      &caption_plugin(),  &transform_plugin(),  &time_blur_plugin(),
+      &gradient_plugin(), &blur_plugin(),      &glow_plugin(),       &dissolve_plugin(),
+      &echo_plugin(),     &trails_plugin(),    &lens_flare_plugin(), &glare_plugin(),
+      &caption_plugin(),  &transform_plugin(), &time_blur_plugin(),
   };
   return plugins;
 }

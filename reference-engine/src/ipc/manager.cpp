@@ -226,13 +226,9 @@ ShmemTransport *serve_segment(const char *name, size_t size1, size_t size2, Cons
     if (errno != EEXIST) return nullptr;
     switch (examine_existing(object, attempt >= kServeAttempts / 2)) {
       case Existing::kGone:
-      case Existing::kReclaimed:
-        break;
-      case Existing::kBeingRemoved:
-        pause_briefly();
-        break;
-      case Existing::kRefused:
-        return nullptr;
+      case Existing::kReclaimed: break;
+      case Existing::kBeingRemoved: pause_briefly(); break;
+      case Existing::kRefused: return nullptr;
     }
   }
   return nullptr;
@@ -295,18 +291,13 @@ void reset_all_segments(bool flag) {
 
 const char *error_text(ShmemError error) {
   switch (error) {
-    case ShmemError::SHMEM_NO_ERROR:
-      return "no error";
-    case ShmemError::INVALID_SEGMENT:
-      return "invalid segment: removed, reset or not a transport segment";
-    case ShmemError::TIMEOUT:
-      return "timed out";
-    case ShmemError::LOCK_ERROR:
-      return "the segment's lock cannot be taken";
+    case ShmemError::SHMEM_NO_ERROR: return "no error";
+    case ShmemError::INVALID_SEGMENT: return "invalid segment: removed, reset or not a transport segment";
+    case ShmemError::TIMEOUT: return "timed out";
+    case ShmemError::LOCK_ERROR: return "the segment's lock cannot be taken";
     case ShmemError::RETRY:
       return "try again: the operation would have to wait, the peer process is gone, or a signal came";
-    case ShmemError::MSG_TOO_LARGE:
-      return "message too large for the queue";
+    case ShmemError::MSG_TOO_LARGE: return "message too large for the queue";
   }
   return nullptr;
 }

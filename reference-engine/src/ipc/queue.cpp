@@ -62,11 +62,8 @@ int64_t Deadline::slice_end(int64_t now) const {
 }
 
 Queue::Queue(SegmentHeader *header, int index, unsigned char *segment, const std::atomic<bool> *truncated)
-    : header_(header),
-      truncated_(truncated),
-      control_(&header->queue[index]),
-      ring_(segment + header->ring_offset[index]),
-      capacity_(header->capacity[index]) {}
+    : header_(header), truncated_(truncated), control_(&header->queue[index]),
+      ring_(segment + header->ring_offset[index]), capacity_(header->capacity[index]) {}
 
 ShmemError Queue::lock(const Deadline &deadline) {
   int result = pthread_mutex_trylock(&control_->lock);

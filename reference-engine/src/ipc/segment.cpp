@@ -44,10 +44,8 @@ bool check_segment(const void *bytes, std::size_t size, std::string *why) {
     return fail(why, "records " + std::to_string(segment_bytes) + " bytes but has " + std::to_string(size));
   uint64_t expected_offset = kHeaderBytes;
   for (int queue = 0; queue < 2; ++queue) {
-    const uint64_t capacity =
-        field_at<uint64_t>(bytes, offsetof(SegmentHeader, capacity) + queue * sizeof(uint64_t));
-    const uint64_t offset =
-        field_at<uint64_t>(bytes, offsetof(SegmentHeader, ring_offset) + queue * sizeof(uint64_t));
+    const uint64_t capacity = field_at<uint64_t>(bytes, offsetof(SegmentHeader, capacity) + queue * sizeof(uint64_t));
+    const uint64_t offset = field_at<uint64_t>(bytes, offsetof(SegmentHeader, ring_offset) + queue * sizeof(uint64_t));
     if (!valid_capacity(capacity))
       return fail(why, "queue " + std::to_string(queue) + " has an invalid capacity " + std::to_string(capacity));
     if (offset != expected_offset) return fail(why, "queue " + std::to_string(queue) + " ring is misplaced");
@@ -56,13 +54,11 @@ bool check_segment(const void *bytes, std::size_t size, std::string *why) {
   if (expected_offset != size) return fail(why, "the rings do not end at the end of the segment");
   if (field_at<int32_t>(bytes, offsetof(SegmentHeader, server_pid)) <= 0)
     return fail(why, "no server process recorded");
-  if (field_at<int32_t>(bytes, offsetof(SegmentHeader, client_pid)) < 0)
-    return fail(why, "negative client process id");
+  if (field_at<int32_t>(bytes, offsetof(SegmentHeader, client_pid)) < 0) return fail(why, "negative client process id");
   return true;
 }
 
-bool check_positions(uint64_t base, uint64_t release_pos, uint64_t read_pos, uint64_t write_pos,
-                     uint64_t capacity) {
+bool check_positions(uint64_t base, uint64_t release_pos, uint64_t read_pos, uint64_t write_pos, uint64_t capacity) {
   return base <= release_pos && release_pos <= read_pos && read_pos <= write_pos &&
          write_pos - release_pos <= capacity && (release_pos - base) % kMessageAlignment == 0 &&
          (read_pos - base) % kMessageAlignment == 0 && (write_pos - base) % kMessageAlignment == 0;

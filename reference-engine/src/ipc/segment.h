@@ -60,40 +60,40 @@ struct QueueControl {
   uint64_t base;                     // position of ring offset 0 (moved only while empty)
   uint64_t lock_recoveries;          // locks taken over from a dead owner
   // Written only when a thread goes to sleep or is woken.
-  alignas(64) uint32_t data_seq;     // futex word: bumped when a message is published
-  uint32_t space_seq;                // futex word: bumped when space is released
-  uint32_t readers_waiting;          // threads asleep on data_seq
-  uint32_t writers_waiting;          // threads asleep on space_seq
+  alignas(64) uint32_t data_seq;  // futex word: bumped when a message is published
+  uint32_t space_seq;             // futex word: bumped when space is released
+  uint32_t readers_waiting;       // threads asleep on data_seq
+  uint32_t writers_waiting;       // threads asleep on space_seq
   // Written by the writer. Statistics are relaxed atomic additions.
-  alignas(64) uint64_t write_pos;    // end of the published messages
-  uint64_t next_id;                  // id of the next message written (from 1)
+  alignas(64) uint64_t write_pos;  // end of the published messages
+  uint64_t next_id;                // id of the next message written (from 1)
   uint64_t messages_written;
-  uint64_t bytes_written;            // body bytes
-  uint64_t write_waits;              // writes and reservations that had to sleep
-  uint64_t write_errors;             // writes, reservations and commits that failed
+  uint64_t bytes_written;  // body bytes
+  uint64_t write_waits;    // writes and reservations that had to sleep
+  uint64_t write_errors;   // writes, reservations and commits that failed
   // Written by the reader.
   alignas(64) uint64_t release_pos;  // first byte still in use
   uint64_t read_pos;                 // next message to read
   uint64_t messages_read;
-  uint64_t bytes_read;               // body bytes
-  uint64_t read_waits;               // reads that had to sleep
-  uint64_t read_errors;              // reads that failed
+  uint64_t bytes_read;   // body bytes
+  uint64_t read_waits;   // reads that had to sleep
+  uint64_t read_errors;  // reads that failed
 };
 
 struct SegmentHeader {
-  uint64_t magic;            // kSegmentMagic, stored last when the segment is made
-  uint32_t layout_version;   // kLayoutVersion
-  uint32_t header_bytes;     // kHeaderBytes
-  uint64_t segment_bytes;    // size of the whole object
-  uint64_t capacity[2];      // ring sizes, multiples of 64
-  uint64_t ring_offset[2];   // where the rings start
-  uint32_t mutex_bytes;      // sizeof(pthread_mutex_t) of the maker
-  uint32_t queue_bytes;      // sizeof(QueueControl) of the maker
-  int32_t server_pid;        // the serving process
-  int32_t client_pid;        // the connected client's process; 0 when none
-  uint32_t removed;          // 1 once removed or reset: every operation fails
+  uint64_t magic;           // kSegmentMagic, stored last when the segment is made
+  uint32_t layout_version;  // kLayoutVersion
+  uint32_t header_bytes;    // kHeaderBytes
+  uint64_t segment_bytes;   // size of the whole object
+  uint64_t capacity[2];     // ring sizes, multiples of 64
+  uint64_t ring_offset[2];  // where the rings start
+  uint32_t mutex_bytes;     // sizeof(pthread_mutex_t) of the maker
+  uint32_t queue_bytes;     // sizeof(QueueControl) of the maker
+  int32_t server_pid;       // the serving process
+  int32_t client_pid;       // the connected client's process; 0 when none
+  uint32_t removed;         // 1 once removed or reset: every operation fails
   uint32_t unused;
-  QueueControl queue[2];     // kServerToClient, kClientToServer
+  QueueControl queue[2];  // kServerToClient, kClientToServer
 };
 
 static_assert(sizeof(SegmentHeader) <= kHeaderBytes, "the header fits its page");
@@ -109,8 +109,7 @@ bool check_segment(const void *bytes, std::size_t size, std::string *why);
 
 // Whether a queue's positions are consistent with its capacity (see
 // QueueControl) and fall on message boundaries (multiples of 64 from base). Callers hold the queue's lock or own the bytes.
-bool check_positions(uint64_t base, uint64_t release_pos, uint64_t read_pos, uint64_t write_pos,
-                     uint64_t capacity);
+bool check_positions(uint64_t base, uint64_t release_pos, uint64_t read_pos, uint64_t write_pos, uint64_t capacity);
 
 // The shared-memory object name for a transport name: kObjectPrefix followed
 // by the name without its optional leading "/". False for a name that is

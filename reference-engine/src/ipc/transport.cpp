@@ -76,10 +76,7 @@ bool unlink_if_same(const std::string &object, dev_t device, ino_t inode) {
 }
 
 Endpoint::Endpoint(const Mapping &mapping, bool server, std::string object)
-    : mapping_(mapping),
-      server_(server),
-      object_(std::move(object)),
-      serial_(++endpoint_serials),
+    : mapping_(mapping), server_(server), object_(std::move(object)), serial_(++endpoint_serials),
       out_(mapping.header(), server ? kServerToClient : kClientToServer, mapping.bytes, mapping.truncated),
       in_(mapping.header(), server ? kClientToServer : kServerToClient, mapping.bytes, mapping.truncated) {}
 
@@ -94,8 +91,7 @@ Endpoint::~Endpoint() {
   }
   if (!server_) {
     int32_t own = getpid();  // a forked child freeing an inherited end leaves its parent attached
-    __atomic_compare_exchange_n(&mapping_.header()->client_pid, &own, 0, false, __ATOMIC_SEQ_CST,
-                                __ATOMIC_SEQ_CST);
+    __atomic_compare_exchange_n(&mapping_.header()->client_pid, &own, 0, false, __ATOMIC_SEQ_CST, __ATOMIC_SEQ_CST);
   }
   unguard_mapping(mapping_.bytes);
   munmap(mapping_.bytes, mapping_.size);
@@ -373,8 +369,7 @@ void Endpoint::print_stats() const {
     const QueueControl &c = header->queue[index];
     std::printf("  %s: capacity %" PRIu64 " bytes, %" PRIu64 " in use\n", names[index], capacity_of(index),
                 load(c.write_pos) - load(c.release_pos));
-    std::printf("    written %" PRIu64 " messages, %" PRIu64 " bytes; read %" PRIu64 " messages, %" PRIu64
-                " bytes\n",
+    std::printf("    written %" PRIu64 " messages, %" PRIu64 " bytes; read %" PRIu64 " messages, %" PRIu64 " bytes\n",
                 load(c.messages_written), load(c.bytes_written), load(c.messages_read), load(c.bytes_read));
     std::printf("    waits: %" PRIu64 " writing, %" PRIu64 " reading; errors: %" PRIu64 " writing, %" PRIu64
                 " reading; locks recovered: %" PRIu64 "\n",

@@ -24,7 +24,7 @@ struct Mapping {
   dev_t device = 0;  // identity of the object, to tell it from a later one of the same name
   ino_t inode = 0;
   const std::atomic<bool> *truncated = nullptr;  // see truncation.h
-  int fd = -1;  // the object, kept open to see its size
+  int fd = -1;                                   // the object, kept open to see its size
 
   SegmentHeader *header() const { return reinterpret_cast<SegmentHeader *>(bytes); }
 };
@@ -90,8 +90,8 @@ private:
   bool server_;
   std::string object_;
   const uint64_t serial_;  // tells this endpoint from earlier ones at the same address
-  Queue out_;  // the queue this end writes
-  Queue in_;   // the queue this end reads
+  Queue out_;              // the queue this end writes
+  Queue in_;               // the queue this end reads
   std::atomic<int> last_error_{0};
 
   // The open reservation, guarded by out_'s lock.

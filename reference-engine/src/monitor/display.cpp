@@ -17,31 +17,26 @@ std::string status_text(EM_SInt32 status) { return " -> " + std::to_string(statu
 ReferenceDisplay::ReferenceDisplay() : devices_(make_devices()) {
   preview_ = static_cast<PreviewDevice *>(devices_.front().get());
   if (!no_devices())
-    for (const auto &device : devices_)
-      device_names_.push_back(device->name().c_str());
+    for (const auto &device : devices_) device_names_.push_back(device->name().c_str());
   register_display(this);
 }
 
 ReferenceDisplay::~ReferenceDisplay() {
   log_call(this, "~EM_Display()");
-  for (const auto &device : devices_)
-    device->disconnect();
+  for (const auto &device : devices_) device->disconnect();
   unregister_display(this);
 }
 
 Device *ReferenceDisplay::find(const char *device) const {
-  if (!device)
-    return nullptr;
+  if (!device) return nullptr;
   for (size_t i = 0; i < device_names_.size(); ++i)
-    if (devices_[i]->name() == device)
-      return devices_[i].get();
+    if (devices_[i]->name() == device) return devices_[i].get();
   return nullptr;
 }
 
 EM_SInt32 ReferenceDisplay::devices(const char ***names) {
   std::lock_guard<std::mutex> hold(mutex_);
-  if (names)
-    *names = device_names_.data();
+  if (names) *names = device_names_.data();
   EM_SInt32 count = EM_SInt32(device_names_.size());
   log_call(this, "devices()" + status_text(count));
   return count;
@@ -50,8 +45,7 @@ EM_SInt32 ReferenceDisplay::devices(const char ***names) {
 EM_SInt32 ReferenceDisplay::device_modes(const char *device, const char ***names) {
   std::lock_guard<std::mutex> hold(mutex_);
   Device *found = find(device);
-  if (names)
-    *names = found ? found->mode_names() : nullptr;
+  if (names) *names = found ? found->mode_names() : nullptr;
   EM_SInt32 count = found ? found->mode_count() : 0;
   log_call(this, "device_modes(" + text_arg(device) + ")" + status_text(count));
   return count;
@@ -138,21 +132,20 @@ EM_SInt32 ReferenceDisplay::get_refresh_rate(const char *device) {
   return rate;
 }
 
-EM_XIImage *ReferenceDisplay::EM_XIImageWrapper(void *pixels, EM_SInt32 width, EM_SInt32 height,
-                                                EM_SInt32 row_bytes, char *name, bool flip_y,
-                                                EM_ImageFormat format, double pixel_aspect, double gamma,
-                                                bool premultiplied, bool full_range) {
+EM_XIImage *ReferenceDisplay::EM_XIImageWrapper(void *pixels, EM_SInt32 width, EM_SInt32 height, EM_SInt32 row_bytes,
+                                                char *name, bool flip_y, EM_ImageFormat format, double pixel_aspect,
+                                                double gamma, bool premultiplied, bool full_range) {
   WrappedImage *image = nullptr;
   try {
-    image = WrappedImage::make({pixels, width, height, row_bytes, name ? name : "", flip_y, format, pixel_aspect,
-                                gamma, premultiplied, full_range});
+    image = WrappedImage::make({pixels, width, height, row_bytes, name ? name : "", flip_y, format, pixel_aspect, gamma,
+                                premultiplied, full_range});
   } catch (const std::bad_alloc &) {
     // no image: the contract's null
   }
   char text[512];
   std::snprintf(text, sizeof text, "EM_XIImageWrapper(%p, %d, %d, %d, %s, %d, %d, %g, %g, %d, %d) -> ", pixels,
-                int(width), int(height), int(row_bytes), text_arg(name).c_str(), int(flip_y), int(format),
-                pixel_aspect, gamma, int(premultiplied), int(full_range));
+                int(width), int(height), int(row_bytes), text_arg(name).c_str(), int(flip_y), int(format), pixel_aspect,
+                gamma, int(premultiplied), int(full_range));
   std::string result = image ? "image" + std::to_string(object_number(image)) : "null";
   log_call(this, text + result);
   return image;

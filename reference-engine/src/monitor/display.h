@@ -28,12 +28,13 @@ public:
   EM_SInt32 get_width(const char *device) override;
   EM_SInt32 get_height(const char *device) override;
   EM_SInt32 get_refresh_rate(const char *device) override;
-  EM_XIImage *EM_XIImageWrapper(void *pixels, EM_SInt32 width, EM_SInt32 height, EM_SInt32 row_bytes,
-                                char *name, bool flip_y, EM_ImageFormat format, double pixel_aspect,
-                                double gamma, bool premultiplied, bool full_range) override;
+  EM_XIImage *EM_XIImageWrapper(void *pixels, EM_SInt32 width, EM_SInt32 height, EM_SInt32 row_bytes, char *name,
+                                bool flip_y, EM_ImageFormat format, double pixel_aspect, double gamma,
+                                bool premultiplied, bool full_range) override;
 
   // For the probe: runs `read` on the preview device under the display's lock.
-  template <class Read> void read_preview(Read read) {
+  template <class Read>
+  void read_preview(Read read) {
     std::lock_guard<std::mutex> hold(mutex_);
     read(*preview_);
   }

@@ -5,8 +5,7 @@
 #include "monitor/live_objects.h"
 
 EM_Display *EM_DisplayInit() {
-  if (qrv_ref::init_fails())
-    return nullptr;
+  if (qrv_ref::init_fails()) return nullptr;
   try {
     return new qrv_ref::ReferenceDisplay;
   } catch (const std::bad_alloc &) {

@@ -12,8 +12,7 @@ namespace {
 
 // The library's setting (reference_monitor.h), read at each connect.
 std::string configured_folder() {
-  if (const char *folder = std::getenv("QRV_MONITOR_FOLDER"); folder && *folder)
-    return folder;
+  if (const char *folder = std::getenv("QRV_MONITOR_FOLDER"); folder && *folder) return folder;
   const char *tmp = std::getenv("TMPDIR");
   return std::string(tmp && *tmp ? tmp : "/tmp") + "/qrv-monitor";
 }
@@ -21,11 +20,9 @@ std::string configured_folder() {
 // mkdir -p: true when the folder exists afterwards.
 bool make_folders(const std::string &path) {
   for (size_t at = 1; at <= path.size(); ++at) {
-    if (at != path.size() && path[at] != '/')
-      continue;
+    if (at != path.size() && path[at] != '/') continue;
     std::string part = path.substr(0, at);
-    if (mkdir(part.c_str(), 0777) != 0 && errno != EEXIST)
-      return false;
+    if (mkdir(part.c_str(), 0777) != 0 && errno != EEXIST) return false;
   }
   struct stat info;
   return stat(path.c_str(), &info) == 0 && S_ISDIR(info.st_mode);
@@ -34,8 +31,7 @@ bool make_folders(const std::string &path) {
 }  // namespace
 
 EM_SInt32 FolderDevice::set_option(const char *option, const char *value) {
-  if (!option || !value || std::string(option) != "folder")
-    return EM_errorParam;
+  if (!option || !value || std::string(option) != "folder") return EM_errorParam;
   chosen_folder_ = value;
   return EM_errorNone;
 }

@@ -12,8 +12,7 @@ uint8_t expand_range(uint8_t v) {
 }
 
 uint8_t unpremultiply(uint8_t c, uint8_t a) {
-  if (a == 0)
-    return 0;
+  if (a == 0) return 0;
   return uint8_t(std::min(255, (int(c) * 255 + a / 2) / a));
 }
 
@@ -35,11 +34,9 @@ void frame_from_image(const ImageValues &image, std::vector<uint8_t> &bgra) {
     for (size_t x = 0; x < width; ++x, in += 4, out += 4) {
       uint8_t px[4] = {in[b], in[g], in[r], in[a]};
       if (!image.full_range)
-        for (int c = 0; c < 3; ++c)
-          px[c] = expand_range(px[c]);
+        for (int c = 0; c < 3; ++c) px[c] = expand_range(px[c]);
       if (image.premultiplied && px[3] != 255)
-        for (int c = 0; c < 3; ++c)
-          px[c] = unpremultiply(px[c], px[3]);
+        for (int c = 0; c < 3; ++c) px[c] = unpremultiply(px[c], px[3]);
       std::copy(px, px + 4, out);
     }
   }

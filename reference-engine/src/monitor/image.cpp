@@ -8,12 +8,10 @@
 namespace qrv_ref {
 
 WrappedImage *WrappedImage::make(const ImageValues &v) {
-  bool valid = v.pixels && v.width >= 1 && v.height >= 1 && v.width <= (1 << 28) / 4 &&
-               v.row_bytes >= v.width * 4 &&
+  bool valid = v.pixels && v.width >= 1 && v.height >= 1 && v.width <= (1 << 28) / 4 && v.row_bytes >= v.width * 4 &&
                (v.format == EM_ImageFormat_32BitIntBGRA || v.format == EM_ImageFormat_32BitIntARGB) &&
                std::isfinite(v.pixel_aspect) && v.pixel_aspect > 0 && std::isfinite(v.gamma) && v.gamma >= 0;
-  if (!valid)
-    return nullptr;
+  if (!valid) return nullptr;
   auto *image = new WrappedImage(v);
   register_image(image);
   return image;
@@ -30,22 +28,19 @@ EM_SInt32 WrappedImage::addRef() {
 EM_SInt32 WrappedImage::removeRef() {
   int count = refs_.fetch_sub(1) - 1;
   log_call(this, "removeRef() -> " + std::to_string(count));
-  if (count == 0)
-    delete this;
+  if (count == 0) delete this;
   return count;
 }
 
 bool WrappedImage::try_hold() {
   int count = refs_.load();
   while (count > 0)
-    if (refs_.compare_exchange_weak(count, count + 1))
-      return true;
+    if (refs_.compare_exchange_weak(count, count + 1)) return true;
   return false;
 }
 
 void WrappedImage::drop() {
-  if (refs_.fetch_sub(1) == 1)
-    delete this;
+  if (refs_.fetch_sub(1) == 1) delete this;
 }
 
 void *WrappedImage::getPixels() const {

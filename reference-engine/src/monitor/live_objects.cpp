@@ -12,7 +12,7 @@ namespace {
 
 struct LiveObjects {
   std::mutex mutex;
-  int made = 0;  // objects numbered so far
+  int made = 0;                                  // objects numbered so far
   std::map<const void *, int> displays, images;  // live objects and their numbers
   void (*observer)(const std::string &entry) = nullptr;
 };
@@ -34,8 +34,7 @@ void set_call_observer(void (*observer)(const std::string &entry)) {
 void log_call(const void *object, const std::string &text) {
   LiveObjects &objects = live();
   std::lock_guard<std::mutex> hold(objects.mutex);  // numbers and log in one order
-  if (!objects.observer)
-    return;
+  if (!objects.observer) return;
   std::string entry = "object?";
   if (auto display = objects.displays.find(object); display != objects.displays.end())
     entry = "display" + std::to_string(display->second);
@@ -68,10 +67,8 @@ void unregister_image(WrappedImage *image) { forget(&LiveObjects::images, image)
 int object_number(const void *object) {
   LiveObjects &objects = live();
   std::lock_guard<std::mutex> hold(objects.mutex);
-  if (auto found = objects.displays.find(object); found != objects.displays.end())
-    return found->second;
-  if (auto found = objects.images.find(object); found != objects.images.end())
-    return found->second;
+  if (auto found = objects.displays.find(object); found != objects.displays.end()) return found->second;
+  if (auto found = objects.images.find(object); found != objects.images.end()) return found->second;
   return -1;
 }
 
@@ -87,15 +84,13 @@ int live_image_count() {
 
 ReferenceDisplay *live_display(const void *display) {
   std::lock_guard<std::mutex> hold(live().mutex);
-  if (!live().displays.count(display))
-    return nullptr;
+  if (!live().displays.count(display)) return nullptr;
   return static_cast<ReferenceDisplay *>(static_cast<EM_Display *>(const_cast<void *>(display)));
 }
 
 int live_image_refs(const void *image) {
   std::lock_guard<std::mutex> hold(live().mutex);
-  if (!live().images.count(image))
-    return -1;
+  if (!live().images.count(image)) return -1;
   return static_cast<const WrappedImage *>(static_cast<const EM_XIImage *>(image))->refs();
 }
 
@@ -104,14 +99,12 @@ ImageUse::ImageUse(const EM_XIImage *image) : image_(nullptr) {
   std::lock_guard<std::mutex> hold(objects.mutex);
   if (objects.images.count(image)) {
     auto *image_here = static_cast<WrappedImage *>(const_cast<EM_XIImage *>(image));
-    if (image_here->try_hold())
-      image_ = image_here;
+    if (image_here->try_hold()) image_ = image_here;
   }
 }
 
 ImageUse::~ImageUse() {
-  if (image_)
-    image_->drop();
+  if (image_) image_->drop();
 }
 
 bool init_fails() { return init_fails_switch.load(); }

@@ -22,14 +22,12 @@ struct FileCloser {
 // it, so no destructor is skipped by the jump.
 bool write_with(png_structp png, png_infop info, std::FILE *file, int width, int height,
                 const std::vector<uint8_t> &rgba, const ImageValues &image) {
-  if (setjmp(png_jmpbuf(png)))
-    return false;
+  if (setjmp(png_jmpbuf(png))) return false;
   png_init_io(png, file);
-  png_set_IHDR(png, info, png_uint_32(width), png_uint_32(height), 8, PNG_COLOR_TYPE_RGB_ALPHA,
-               PNG_INTERLACE_NONE, PNG_COMPRESSION_TYPE_DEFAULT, PNG_FILTER_TYPE_DEFAULT);
+  png_set_IHDR(png, info, png_uint_32(width), png_uint_32(height), 8, PNG_COLOR_TYPE_RGB_ALPHA, PNG_INTERLACE_NONE,
+               PNG_COMPRESSION_TYPE_DEFAULT, PNG_FILTER_TYPE_DEFAULT);
   png_set_compression_level(png, 1);  // a monitor keeps up with frames; size matters less
-  if (image.gamma > 0)
-    png_set_gAMA(png, info, 1.0 / image.gamma);
+  if (image.gamma > 0) png_set_gAMA(png, info, 1.0 / image.gamma);
   if (image.pixel_aspect != 1.0) {
     // Pixels per metre in x and y, in the ratio height : width of one pixel.
     double x = 10000, y = 10000 * image.pixel_aspect;
@@ -54,8 +52,7 @@ bool write_with(png_structp png, png_infop info, std::FILE *file, int width, int
 bool write_png_file(const std::string &path, int width, int height, const std::vector<uint8_t> &rgba,
                     const ImageValues &image) {
   std::unique_ptr<std::FILE, FileCloser> file(std::fopen(path.c_str(), "wb"));
-  if (!file)
-    return false;
+  if (!file) return false;
   png_structp png = png_create_write_struct(PNG_LIBPNG_VER_STRING, nullptr, on_error, on_warning);
   png_infop info = png ? png_create_info_struct(png) : nullptr;
   bool written = info && write_with(png, info, file.get(), width, height, rgba, image);

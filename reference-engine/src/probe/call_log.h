@@ -12,7 +12,7 @@
 namespace tarsel_ref {
 
 class CallLog {
- public:
+public:
   explicit CallLog(std::size_t capacity) : capacity_(capacity) {}
 
   // Appends `entry`, dropping the oldest once the log holds `capacity`.
@@ -40,7 +40,7 @@ class CallLog {
     entries_.clear();
   }
 
- private:
+private:
   const std::size_t capacity_;
   std::mutex mutex_;
   std::deque<std::string> entries_;

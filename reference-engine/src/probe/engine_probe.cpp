@@ -76,8 +76,7 @@ int tarsel_probe_emit_from_worker(int count, int level, const char *text) {
   const std::string prefix = text ? text : "";
   int sent = 0;
   std::thread worker([&] {
-    for (int i = 0; i < count; ++i, ++sent)
-      tarsel_ref::emit_message(level, (prefix + " " + std::to_string(i)).c_str());
+    for (int i = 0; i < count; ++i, ++sent) tarsel_ref::emit_message(level, (prefix + " " + std::to_string(i)).c_str());
   });
   worker.join();
   return sent;
@@ -98,9 +97,8 @@ double tarsel_probe_time_frame_requests(int count, int width, int height) {
       const auto start = std::chrono::steady_clock::now();
       for (int i = 0; i < count; ++i) fun(&state, 0, i, 0, nullptr, nullptr, &answer);
       seconds = std::chrono::duration<double>(std::chrono::steady_clock::now() - start).count();
-    } TARSEL_LET_THREAD_END catch (...) {
-      seconds = -1.0;
     }
+    TARSEL_LET_THREAD_END catch (...) { seconds = -1.0; }
   });
   worker.join();
   return seconds;

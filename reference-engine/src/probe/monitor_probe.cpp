@@ -45,27 +45,21 @@ int qrv_probe_image_refs(const void *image) { return live_image_refs(image); }
 
 int qrv_probe_object_number(const void *object) { return object_number(object); }
 
-int qrv_probe_preview_frame(const void *display, void *bgra, int capacity, int *width, int *height,
-                            long long *frames, char *name, int name_capacity) {
+int qrv_probe_preview_frame(const void *display, void *bgra, int capacity, int *width, int *height, long long *frames,
+                            char *name, int name_capacity) {
   // A display is deleted only by its host; a probe call racing that is a test fault.
   ReferenceDisplay *live = live_display(display);
-  if (!live)
-    return -1;
+  if (!live) return -1;
   int bytes = 0;
   live->read_preview([&](const PreviewDevice &preview) {
     const std::vector<uint8_t> &frame = preview.last_frame();
     bytes = int(frame.size());
-    if (bgra && bytes > 0 && capacity >= bytes)
-      std::memcpy(bgra, frame.data(), frame.size());
+    if (bgra && bytes > 0 && capacity >= bytes) std::memcpy(bgra, frame.data(), frame.size());
     const Mode *mode = preview.mode();
-    if (width)
-      *width = mode ? mode->width : 0;
-    if (height)
-      *height = mode ? mode->height : 0;
-    if (frames)
-      *frames = preview.frames_shown();
-    if (name && name_capacity > 0)
-      std::snprintf(name, size_t(name_capacity), "%s", preview.last_name().c_str());
+    if (width) *width = mode ? mode->width : 0;
+    if (height) *height = mode ? mode->height : 0;
+    if (frames) *frames = preview.frames_shown();
+    if (name && name_capacity > 0) std::snprintf(name, size_t(name_capacity), "%s", preview.last_name().c_str());
   });
   return bytes;
 }

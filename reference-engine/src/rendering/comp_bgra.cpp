@@ -25,8 +25,9 @@ void composite_bgra(RawImage image, int xsize, int ysize, int line_bytes, int ba
   }
   const long long stride = line_bytes == 0 ? static_cast<long long>(xsize) * 4 : line_bytes;
   if (stride < static_cast<long long>(xsize) * 4) {
-    emit_message(Err_Error, ("tarsel_comp_bgra_8: lines of " + std::to_string(line_bytes) +
-                             " bytes cannot hold " + std::to_string(xsize) + " pixels").c_str());
+    emit_message(Err_Error, ("tarsel_comp_bgra_8: lines of " + std::to_string(line_bytes) + " bytes cannot hold " +
+                             std::to_string(xsize) + " pixels")
+                                .c_str());
     return;
   }
   const unsigned bg = static_cast<unsigned>(background_argb);

@@ -35,7 +35,8 @@ public:
 
 private:
   WorkImage(int width, int height, bool constant)
-      : width_(width), height_(height), constant_(constant), pixels_(acquire_floats(count(width, constant ? 1 : height))) {}
+      : width_(width), height_(height), constant_(constant),
+        pixels_(acquire_floats(count(width, constant ? 1 : height))) {}
 
   static std::size_t count(int width, int height) {
     return static_cast<std::size_t>(width) * static_cast<std::size_t>(height) * 4 + 4;

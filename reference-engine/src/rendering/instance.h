@@ -15,9 +15,9 @@ namespace tarsel_ref {
 
 // The widget a mouse drag holds, kept with the instance so that it ends with it.
 struct WidgetHold {
-  int param_index = -1;                // into the held descriptor's parameter table; -1: none held
+  int param_index = -1;                  // into the held descriptor's parameter table; -1: none held
   const Genotype *descriptor = nullptr;  // the descriptor in use at the press
-  int press_x = 0, press_y = 0;        // the mouse at the press, in viewer pixels
+  int press_x = 0, press_y = 0;          // the mouse at the press, in viewer pixels
   float press_value[MAX_CHANNELS] = {};  // the value the parameter held at the press
 };
 

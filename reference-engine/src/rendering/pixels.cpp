@@ -92,9 +92,11 @@ std::uint16_t float_to_half(float f) {
   return static_cast<std::uint16_t>(sign | half);
 }
 
-template <Element E> struct Codec;
+template <Element E>
+struct Codec;
 
-template <> struct Codec<Element::u8> {
+template <>
+struct Codec<Element::u8> {
   static float get(const unsigned char *p) { return static_cast<float>(*p) * (1.0f / 255.0f); }
   static void put(unsigned char *p, float v) {
     v = std::isnan(v) ? 0.0f : std::clamp(v, 0.0f, 1.0f);
@@ -102,7 +104,8 @@ template <> struct Codec<Element::u8> {
   }
 };
 
-template <> struct Codec<Element::u16> {
+template <>
+struct Codec<Element::u16> {
   static float get(const unsigned char *p) {
     std::uint16_t v;
     std::memcpy(&v, p, sizeof v);
@@ -115,7 +118,8 @@ template <> struct Codec<Element::u16> {
   }
 };
 
-template <> struct Codec<Element::f16> {
+template <>
+struct Codec<Element::f16> {
   static float get(const unsigned char *p) {
     std::uint16_t v;
     std::memcpy(&v, p, sizeof v);
@@ -127,7 +131,8 @@ template <> struct Codec<Element::f16> {
   }
 };
 
-template <> struct Codec<Element::f32> {
+template <>
+struct Codec<Element::f32> {
   static float get(const unsigned char *p) {
     float v;
     std::memcpy(&v, p, sizeof v);
@@ -222,8 +227,8 @@ bool describe_raster(const T_RasterInfo &info, void *pixels, RasterView *view, s
     *error = "res_factor " + std::to_string(info.res_factor) + " is not possible";
     return false;
   }
-  if (image_bytes(*layout, info.ds_xsize, info.ds_ysize, info.extra_line_stride_elts) == 0 &&
-      info.ds_xsize > 0 && info.ds_ysize > 0) {
+  if (image_bytes(*layout, info.ds_xsize, info.ds_ysize, info.extra_line_stride_elts) == 0 && info.ds_xsize > 0 &&
+      info.ds_ysize > 0) {
     *error = "the image is too large";
     return false;
   }

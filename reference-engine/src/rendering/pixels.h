@@ -17,7 +17,7 @@ enum class Element { u8, u16, f16, f32 };
 struct PixelLayout {
   T_PixelType type;
   const char *name;
-  int channels;          // elements per pixel
+  int channels;  // elements per pixel
   Element element;
   int element_size;      // bytes per element; line padding is counted in these
   int red, green, blue;  // memory position of each colour channel, -1 when absent

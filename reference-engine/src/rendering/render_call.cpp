@@ -107,8 +107,7 @@ std::shared_ptr<const WorkImage> fallback(const Genotype &g, int input, const Ke
   const short rule = g.input_default_to.data[input];
   if (rule == 2 && input > 0 && loaded[0]) return loaded[0];
   float value[4] = {0.0f, 0.0f, 0.0f, 0.0f};
-  if (rule == 1 && input < MAX_INPUT_DEFAULT_VALUES)
-    std::fill(value, value + 4, g.input_default_value[input]);
+  if (rule == 1 && input < MAX_INPUT_DEFAULT_VALUES) std::fill(value, value + 4, g.input_default_value[input]);
   return WorkImage::constant(ctx.width, ctx.height, value);
 }
 
@@ -342,7 +341,8 @@ void load_inputs(const RenderCall &call, const Checked &checked, const Inputs &i
 std::unique_ptr<OtherFrames> frames_from_host(const RenderCall &call, const Checked &checked, const Inputs &inputs,
                                               KernelContext *ctx) {
   const Genotype &g = *checked.g;
-  if (!call.other_frames || call.flare_call || !(g.flags.need_other_frames_p || g.flags.use_prev_dest_p)) return nullptr;
+  if (!call.other_frames || call.flare_call || !(g.flags.need_other_frames_p || g.flags.use_prev_dest_p))
+    return nullptr;
   T_RenderState state;
   std::memset(&state, 0, sizeof state);
   for (int i = 0; i < inputs.count() && i < MAX_INPUTS; ++i)
@@ -427,8 +427,7 @@ bool render(const RenderCall &call, std::string *error) {
   if (g.flags.use_prev_dest_p && !ctx.previous && ctx.requests)
     if (const History history = find_history(g.name)) {
       const int frames = history(ctx);
-      if (frames > 0)
-        ctx.previous = rebuild_previous(call, ctx, checked.dest, checked.spaces, g, kernel, mix, frames);
+      if (frames > 0) ctx.previous = rebuild_previous(call, ctx, checked.dest, checked.spaces, g, kernel, mix, frames);
     }
   write_result(call, ctx, checked, inputs, kernel, mix);
   return true;

@@ -52,7 +52,7 @@ struct RenderCall {
   const char *input_colorspace = nullptr;
   const char *output_colorspace = nullptr;
   const char *working_colorspace = nullptr;
-  const FlareCall *flare_call = nullptr;  // set by the lens-flare render call
+  const FlareCall *flare_call = nullptr;    // set by the lens-flare render call
   OtherFramesMaker other_frames = nullptr;  // how to ask the host for other frames; null: never asked
 };
 
@@ -62,9 +62,9 @@ bool render(const RenderCall &call, std::string *error);
 
 // The call record with the arguments both render entry points take; each adds its own.
 RenderCall make_render_call(const char *entry, EffectGlobals_t *instance, const char *descriptor, RawImage dest,
-                            int frame, int field, int downsample, int quality, T_RasterInfo **rasters,
-                            RawImage *images, int n_rasters, float pixel_aspect, int n_threads, int seed,
-                            bool premultiplied, const char *input_colorspace, const char *output_colorspace,
+                            int frame, int field, int downsample, int quality, T_RasterInfo **rasters, RawImage *images,
+                            int n_rasters, float pixel_aspect, int n_threads, int seed, bool premultiplied,
+                            const char *input_colorspace, const char *output_colorspace,
                             const char *working_colorspace);
 
 // Whether the arguments every render needs are there (an instance, at least

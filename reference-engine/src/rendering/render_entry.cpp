@@ -43,9 +43,9 @@ bool render_basics_present(EffectGlobals_t *instance, T_RasterInfo **rasters, in
 }
 
 RenderCall make_render_call(const char *entry, EffectGlobals_t *instance, const char *descriptor, RawImage dest,
-                            int frame, int field, int downsample, int quality, T_RasterInfo **rasters,
-                            RawImage *images, int n_rasters, float pixel_aspect, int n_threads, int seed,
-                            bool premultiplied, const char *input_colorspace, const char *output_colorspace,
+                            int frame, int field, int downsample, int quality, T_RasterInfo **rasters, RawImage *images,
+                            int n_rasters, float pixel_aspect, int n_threads, int seed, bool premultiplied,
+                            const char *input_colorspace, const char *output_colorspace,
                             const char *working_colorspace) {
   RenderCall call;
   call.entry = entry;
@@ -70,4 +70,3 @@ RenderCall make_render_call(const char *entry, EffectGlobals_t *instance, const 
 }
 
 }  // namespace tarsel_ref
-

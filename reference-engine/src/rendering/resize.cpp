@@ -129,8 +129,8 @@ Taps make_taps(int n, int m, double offset, int filter, double sharpness) {
 
 }  // namespace
 
-size_t resized_image_size(T_RasterInfo *src_info, int new_xsize, int new_ysize, int pixel_type,
-                          int extra_line_elts, float scale) {
+size_t resized_image_size(T_RasterInfo *src_info, int new_xsize, int new_ysize, int pixel_type, int extra_line_elts,
+                          float scale) {
   tarsel_ref::Plan plan;
   std::string error;
   if (!tarsel_ref::plan_resize(src_info, new_xsize, new_ysize, pixel_type, extra_line_elts, scale, &plan, &error))
@@ -139,13 +139,11 @@ size_t resized_image_size(T_RasterInfo *src_info, int new_xsize, int new_ysize, 
 }
 
 void resize_image(T_RasterInfo *src_info, RawImage src, int new_xsize, int new_ysize, int pixel_type,
-                  int extra_line_elts, float scale, T_RasterInfo *dst_info, RawImage dst, int filter,
-                  float x_offset, float y_offset, float sharpness, int *out_xsize, int *out_ysize) {
+                  int extra_line_elts, float scale, T_RasterInfo *dst_info, RawImage dst, int filter, float x_offset,
+                  float y_offset, float sharpness, int *out_xsize, int *out_ysize) {
   if (out_xsize) *out_xsize = 0;
   if (out_ysize) *out_ysize = 0;
-  auto fail = [](const std::string &why) {
-    emit_message(Err_Error, ("tarsel_resize_native_image: " + why).c_str());
-  };
+  auto fail = [](const std::string &why) { emit_message(Err_Error, ("tarsel_resize_native_image: " + why).c_str()); };
   Plan plan;
   std::string error;
   RasterView source, result;

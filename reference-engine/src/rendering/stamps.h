@@ -12,8 +12,8 @@
 namespace tarsel_ref {
 
 struct Stamp {
-  int size = 0;                // width and height in pixels
-  std::vector<float> coverage; // size * size values from 0 to 1, rows top to bottom
+  int size = 0;                 // width and height in pixels
+  std::vector<float> coverage;  // size * size values from 0 to 1, rows top to bottom
 };
 
 // The stamp cached under `key`, made with `make` when there is none.

@@ -9,7 +9,6 @@
 #include <mutex>
 #include <new>
 
-
 namespace tarsel_ref {
 namespace {
 
@@ -151,8 +150,8 @@ int texture_info(int index, int *xsize, int *ysize, int *n_channels, int *bytes_
 int texture_pixels(int index, void *dest, size_t dest_size) {
   const auto texture = tarsel_ref::find_texture(index);
   if (!texture) return failed("no texture " + std::to_string(index));
-  const std::size_t n = std::min({dest ? dest_size : 0, texture->bytes.size(),
-                                  static_cast<std::size_t>(std::numeric_limits<int>::max())});
+  const std::size_t n = std::min(
+      {dest ? dest_size : 0, texture->bytes.size(), static_cast<std::size_t>(std::numeric_limits<int>::max())});
   if (n) std::memcpy(dest, texture->bytes.data(), n);
   tarsel_ref::succeeded();
   return static_cast<int>(n);

@@ -14,8 +14,8 @@ namespace tarsel_ref {
 
 struct Texture {
   int xsize = 0, ysize = 0;
-  int n_channels = 0;         // 1 grey, 2 grey and alpha, 3 RGB, 4 RGBA
-  int bytes_per_channel = 0;  // 1, 2 (native byte order) or 4 (float)
+  int n_channels = 0;                // 1 grey, 2 grey and alpha, 3 RGB, 4 RGBA
+  int bytes_per_channel = 0;         // 1, 2 (native byte order) or 4 (float)
   std::vector<unsigned char> bytes;  // lines top to bottom, no padding
   std::vector<float> light;          // per pixel R G B times alpha: what a flare adds
 };

@@ -35,7 +35,8 @@ struct Job {
       if (failed.load(std::memory_order_relaxed)) continue;
       try {
         (*task)(i);
-      } TARSEL_LET_THREAD_END catch (...) {
+      }
+      TARSEL_LET_THREAD_END catch (...) {
         std::lock_guard<std::mutex> lock(error_mutex);
         if (!error) error = std::current_exception();
         failed.store(true);

@@ -31,9 +31,9 @@ int edge_index(int k, int n, Edge edge) {
 }
 
 struct Window {
-  int left, right;          // whole samples on each side of the centre
+  int left, right;               // whole samples on each side of the centre
   double left_frac, right_frac;  // weight of the partial sample beyond them
-  double scale;             // one over the box's total weight
+  double scale;                  // one over the box's total weight
 };
 
 Window window_for(double radius, double bias, bool whole) {

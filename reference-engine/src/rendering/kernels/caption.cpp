@@ -46,8 +46,8 @@ bool dot_at(const std::string &line, double gx, double gy) {
   const long long index = column / kGlyphAdvance;
   const int dot = static_cast<int>(column % kGlyphAdvance);
   if (index >= static_cast<long long>(line.size()) || dot >= kGlyphWidth) return false;
-  const std::uint8_t bits = glyph_row(static_cast<unsigned char>(line[static_cast<std::size_t>(index)]),
-                                      static_cast<int>(gy));
+  const std::uint8_t bits =
+      glyph_row(static_cast<unsigned char>(line[static_cast<std::size_t>(index)]), static_cast<int>(gy));
   return (bits >> (kGlyphWidth - 1 - dot)) & 1u;
 }
 

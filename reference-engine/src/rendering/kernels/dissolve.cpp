@@ -17,8 +17,8 @@ int render_dissolve(const KernelContext &ctx, WorkImage &out) {
   const float softness = std::clamp(p.number("softness"), 0.0f, 1.0f);
   const double grain = std::max(1e-3, ctx.length(std::max(0.5f, p.number("grain_size"))));
   // The seed parameter counts frames by itself, so the grain changes every frame.
-  const std::uint32_t seed = mix_bits(static_cast<std::uint32_t>(p.whole("seed"))) ^
-                             static_cast<std::uint32_t>(ctx.seed) * 0x27d4eb2fu;
+  const std::uint32_t seed =
+      mix_bits(static_cast<std::uint32_t>(p.whole("seed"))) ^ static_cast<std::uint32_t>(ctx.seed) * 0x27d4eb2fu;
   if (amount <= 0.0f) return 0;
   if (amount >= 1.0f) return 1;
   const WorkImage &from = ctx.input(0);

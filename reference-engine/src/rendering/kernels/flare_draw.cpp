@@ -52,8 +52,9 @@ void texture_at(const Texture &t, double u, double v, float rgb[3]) {
   rgb[0] = rgb[1] = rgb[2] = 0.0f;
   for (int k = 0; k < 4; ++k) {
     if (xs[k] < 0 || ys[k] < 0 || xs[k] >= t.xsize || ys[k] >= t.ysize) continue;
-    const float *p = t.light.data() + (static_cast<std::size_t>(ys[k]) * static_cast<std::size_t>(t.xsize) +
-                                       static_cast<std::size_t>(xs[k])) * 3;
+    const float *p =
+        t.light.data() +
+        (static_cast<std::size_t>(ys[k]) * static_cast<std::size_t>(t.xsize) + static_cast<std::size_t>(xs[k])) * 3;
     for (int c = 0; c < 3; ++c) rgb[c] += p[c] * weights[k];
   }
 }
@@ -72,8 +73,9 @@ std::vector<Item> prepare(const KernelContext &ctx, const std::vector<FlareLight
       texture = find_texture(index);
       if (!texture) {
         if (missing.insert(index).second)
-          emit_message(Err_Warning, ("lens flare: there is no flare texture " + std::to_string(index) +
-                                     "; its element is not drawn").c_str());
+          emit_message(Err_Warning,
+                       ("lens flare: there is no flare texture " + std::to_string(index) + "; its element is not drawn")
+                           .c_str());
         continue;
       }
     }

@@ -14,7 +14,7 @@
 namespace tarsel_ref {
 
 struct FlareLight {
-  double x = 0.0, y = 0.0;              // frame position
+  double x = 0.0, y = 0.0;               // frame position
   float colour[3] = {1.0f, 1.0f, 1.0f};  // the source's colour and strength
 };
 

@@ -48,8 +48,8 @@ public:
 // frame + offset, kept within the frames an int can name: a run of frames
 // around the first or last one stops there instead of wrapping.
 inline int offset_frame(int frame, long long offset) {
-  return static_cast<int>(std::clamp<long long>(frame + offset, std::numeric_limits<int>::min(),
-                                                std::numeric_limits<int>::max()));
+  return static_cast<int>(
+      std::clamp<long long>(frame + offset, std::numeric_limits<int>::min(), std::numeric_limits<int>::max()));
 }
 
 struct KernelContext {
@@ -59,8 +59,8 @@ struct KernelContext {
   int x0 = 0, y0 = 0;
   double frame_width = 0.0, frame_height = 0.0;
   int downsample = 1;
-  int quality = 1;           // 0 draft, 1 normal, 2 best
-  float pixel_aspect = 1.0f; // pixel width over height
+  int quality = 1;            // 0 draft, 1 normal, 2 best
+  float pixel_aspect = 1.0f;  // pixel width over height
   int frame = 0;
   int frame_rate = 25;
   int seed = 0;

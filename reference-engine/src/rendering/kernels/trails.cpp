@@ -27,10 +27,10 @@ int render_trails(const KernelContext &ctx, WorkImage &out) {
       float *d = r + x * 4;
       for (int c = 0; c < 4; ++c) {
         switch (blend) {
-          case 0: d[c] = a[c] + trail[c] * (1.0f - a[3]); break;           // over
-          case 1: d[c] = a[c] + trail[c]; break;                           // add
-          case 2: d[c] = std::max(a[c], trail[c]); break;                  // lighten
-          default: d[c] = a[c] + trail[c] - a[c] * trail[c]; break;        // screen
+          case 0: d[c] = a[c] + trail[c] * (1.0f - a[3]); break;     // over
+          case 1: d[c] = a[c] + trail[c]; break;                     // add
+          case 2: d[c] = std::max(a[c], trail[c]); break;            // lighten
+          default: d[c] = a[c] + trail[c] - a[c] * trail[c]; break;  // screen
         }
       }
       if (blend == 1) d[3] = std::min(d[3], 1.0f);

@@ -101,10 +101,10 @@ int render_transform(const KernelContext &ctx, WorkImage &out) {
   // Points in square units: x times the pixel aspect.
   const double ax = (p.number("pivot", 0) * fw + len("anchor", 0)) * pa;
   const double ay = p.number("pivot", 1) * fh + len("anchor", 1);
-  const double dx = (len("position", 0) + len("offset", 0) + (p.number("target", 0) - 0.5) * fw +
-                     p.number("origin", 0) * fw) * pa;
-  const double dy = len("position", 1) + len("offset", 1) + (p.number("target", 1) - 0.5) * fh +
-                    p.number("origin", 1) * fh;
+  const double dx =
+      (len("position", 0) + len("offset", 0) + (p.number("target", 0) - 0.5) * fw + p.number("origin", 0) * fw) * pa;
+  const double dy =
+      len("position", 1) + len("offset", 1) + (p.number("target", 1) - 0.5) * fh + p.number("origin", 1) * fh;
   const double sx = static_cast<double>(p.number("scale", 0)) * p.number("stretch", 0);
   const double sy = static_cast<double>(p.number("scale", 1)) * p.number("stretch", 1);
   const double theta = (static_cast<double>(p.number("rotation")) + p.number("spin")) * kPi / 180.0;

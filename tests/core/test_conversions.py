@@ -87,6 +87,10 @@ def test_proxy_objects():
     assert proxy.next() is None
     with pytest.raises(TypeError, match="^Attempt to append a non SwigPyObject$"):
         proxy.append(5)
+    # Equal when they hold the same address; anything else is not one (and is
+    # not read as one: the sanitizer run watches that).
+    assert proxy == info.this and proxy != renderlib.T_RasterInfo().this
+    assert proxy.__eq__(5) is NotImplemented and proxy != object() and not proxy == "x"
 
 
 def test_a_deleting_function_disowns_its_argument():

@@ -7,6 +7,7 @@ import numpy
 import pytest
 
 import _renderlib
+import renderlib
 from renderlib import effects
 
 
@@ -112,3 +113,24 @@ def test_numpy_arrays_and_bytearrays_render_alike(instance):
     assert effects.render(blur, (info, out_a), [(info, as_array)])
     assert effects.render(blur, out_b, [(info, buffer)])
     assert out_a.tobytes() == bytes(out_b[1])
+
+
+def test_a_resize_runs_without_the_lock():
+    source = effects.raster(_renderlib.pixel_rgbaf, 3840, 2160)
+    info = renderlib.T_RasterInfo()
+    dest = bytearray(_renderlib.tarsel_get_resized_image_size(source[0], 1900, 1000, 0, 0, 1.0, 0))
+    span = {}
+
+    def resize():
+        start = time.perf_counter()
+        _renderlib.tarsel_resize_native_image(source[0], source[1], 1900, 1000, 0, 0, 1.0, info, dest, 2, 0, 0, 0)
+        span["resize"] = time.perf_counter() - start
+
+    worker = threading.Thread(target=resize)
+    last, longest = time.perf_counter(), 0.0
+    worker.start()
+    while worker.is_alive():  # Python keeps running meanwhile: no long stall between two turns
+        now = time.perf_counter()
+        longest, last = max(longest, now - last), now
+    worker.join()
+    assert span["resize"] > 0.05 and longest < span["resize"] / 2, (longest, span)

@@ -39,6 +39,8 @@ def test_render_reads_inputs_and_writes_every_tiff_depth(capsys, tmp_path):
         assert stored.dtype == dtype and stored.shape == (32, 48, 4)
     # A transform that centres the frame gives the input back (to the 16-bit input's precision).
     np.testing.assert_allclose(read_image(tmp_path / "out-float.tif"), source, atol=1 / 30000)
+    # A 16-bit file reads back as its stored values over 65535, exactly.
+    assert np.array_equal(read_image(tmp_path / "in.tif"), tifffile.imread(tmp_path / "in.tif") / np.float32(65535))
 
 
 def test_a_sequence_input_is_read_frame_by_frame(capsys, tmp_path):

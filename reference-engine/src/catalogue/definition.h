@@ -13,6 +13,16 @@
 
 namespace tarsel_ref {
 
+// How an effect is computed (rendering/kernels/kernel.h). A kernel fills the
+// working image it is given and returns kWrote, or returns the number of the
+// input that is the result unchanged.
+struct KernelContext;
+class WorkImage;
+using Kernel = int (*)(const KernelContext &ctx, WorkImage &out);
+// For an effect that reads its previous output: how many earlier frames that
+// output is rebuilt from when a render is given none (0: it is not rebuilt).
+using History = int (*)(const KernelContext &ctx);
+
 // Genotype::input_default_to: what an unconnected input falls back to.
 enum InputFallback : short {
   kFallbackTransparent = 0,  // transparent black
@@ -135,6 +145,8 @@ struct DescriptorDefinition {
   bool host_data = false;           // the effect takes engine data from the host (HostTextData)
   std::string flare_param;          // canonical name of the flare or glare parameter
   std::vector<std::string> stamps;  // flare element kinds the effect draws besides its flare's
+  Kernel kernel = nullptr;          // null: the engine cannot render it
+  History history = nullptr;        // null: the previous output is not rebuilt
 };
 
 // One catalogue entry. Builder entries with a run-time descriptor assemble it

@@ -236,6 +236,8 @@ std::unique_ptr<Descriptor> build_descriptor(const DescriptorDefinition &source)
   g.old_default_version_limit = source.old_default_limit;
   g.effect_info = &d->definition;
   set_node_flags(g, source.node_flags);
+  d->kernel = source.kernel;
+  d->history = source.history;
   return d;
 }
 

@@ -23,6 +23,8 @@ struct Descriptor {
   std::unique_ptr<HostTextData> host_data;
   std::vector<InstanceParamSlot> slots;
   std::vector<std::unique_ptr<Param>> slot_params;
+  Kernel kernel = nullptr;  // the definition's
+  History history = nullptr;
 };
 
 // Builds a descriptor from its definition; throws std::logic_error when the

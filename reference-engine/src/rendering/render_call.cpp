@@ -27,6 +27,14 @@ Genotype *select_descriptor(EffectInstance &instance, const char *name) {
   return nullptr;
 }
 
+// The engine's descriptor behind one of the instance's genotypes: it carries
+// the kernel. Null for a genotype the instance did not build.
+const Descriptor *descriptor_behind(const EffectInstance &instance, const Genotype *g) {
+  for (const std::unique_ptr<Descriptor> &d : instance.descriptors)
+    if (&d->genotype == g) return d.get();
+  return nullptr;
+}
+
 // The "Effect Mix" slot of the plug-in's first descriptor, which scales the
 // call's mix; 1 when the plug-in has none.
 float slot_mix(const EffectInstance &instance) {
@@ -416,7 +424,8 @@ bool render(const RenderCall &call, std::string *error) {
   const ParamReader params(g, inputs.connected, ctx.frame, ctx.seconds());
   ctx.params = &params;
   load_inputs(call, checked, inputs, &ctx);
-  const Kernel kernel = call.flare_call ? render_flare_call : find_kernel(g.name);
+  const Descriptor *descriptor = descriptor_behind(*instance, &g);
+  const Kernel kernel = call.flare_call ? render_flare_call : descriptor ? descriptor->kernel : nullptr;
   if (!kernel) {
     *error = std::string("the engine cannot render \"") + g.name + "\"";
     return false;
@@ -425,7 +434,7 @@ bool render(const RenderCall &call, std::string *error) {
   const std::unique_ptr<OtherFrames> requests = frames_from_host(call, checked, inputs, &ctx);
   ctx.requests = requests.get();
   if (g.flags.use_prev_dest_p && !ctx.previous && ctx.requests)
-    if (const History history = find_history(g.name)) {
+    if (const History history = descriptor ? descriptor->history : nullptr) {
       const int frames = history(ctx);
       if (frames > 0) ctx.previous = rebuild_previous(call, ctx, checked.dest, checked.spaces, g, kernel, mix, frames);
     }

@@ -6,6 +6,7 @@
 #include <set>
 #include <string>
 
+#include "catalogue/param_store.h"
 #include "core/messages.h"
 #include "rendering/stamps.h"
 #include "rendering/textures.h"
@@ -159,6 +160,25 @@ void draw_flares(const KernelContext &ctx, const std::vector<FlareLight> &lights
       dp[3] = bp[3] + std::min(std::max({l[0], l[1], l[2]}), 1.0f) * (1.0f - bp[3]);
     }
   });
+}
+
+// The flare or glare parameter of whichever descriptor is drawn; its scale
+// and rotation parameters apply when it has them.
+int render_flare_call(const KernelContext &ctx, WorkImage &out) {
+  const ParamReader &p = ctx.p();
+  FlareLight light;
+  light.x = ctx.flare_call->center_x;
+  light.y = ctx.flare_call->center_y;
+  FlareLook look;
+  if (const Param *flare = ctx.genotype->flare_param) {
+    const char *text = store_of(*flare).text;
+    look.elements = flare_elements(text ? text : "");
+  }
+  if (p.has("scale")) look.scale = std::max(0.0f, p.number("scale"));
+  if (p.has("rotation")) look.rotation = p.number("rotation");
+  look.brightness = ctx.flare_call->brightness;
+  draw_flares(ctx, {light}, look, ctx.input(0), out);
+  return kWrote;
 }
 
 }  // namespace tarsel_ref

@@ -1,4 +1,5 @@
-// What a kernel gets to work with, and the table of kernels by descriptor.
+// What a kernel gets to work with. Each effect's kernel is in its file in
+// src/effects/, named by its definition.
 //
 // A kernel computes the effect for every pixel of the destination into a
 // working image of the destination's size; the render around it reads the
@@ -14,6 +15,7 @@
 #include <memory>
 #include <vector>
 
+#include "catalogue/definition.h"
 #include "rendering/colour.h"
 #include "rendering/image.h"
 #include "rendering/kernels/params.h"
@@ -88,41 +90,14 @@ struct KernelContext {
   void rows(const std::function<void(int)> &row) const { run_rows(height, n_threads, row); }
 };
 
-// What a kernel made: its result in `out` (kWrote), or the number of an input
-// that is the result unchanged (the render then copies that input's pixels as
-// they are, so an effect that does nothing gives back exactly what it got).
+// What a kernel made (Kernel, catalogue/definition.h): its result in `out`
+// (kWrote), or the number of an input that is the result unchanged (the
+// render then copies that input's pixels as they are, so an effect that does
+// nothing gives back exactly what it got).
 constexpr int kWrote = -1;
-using Kernel = int (*)(const KernelContext &ctx, WorkImage &out);
-
-// For an effect that reads its previous output: how many earlier frames that
-// output is rebuilt from when a render is given none (0: it is not rebuilt).
-using History = int (*)(const KernelContext &ctx);
-
-// The kernel of the descriptor of that name; null when there is none.
-Kernel find_kernel(const char *descriptor_name);
-
-// The history of the descriptor of that name; null when it has none.
-History find_history(const char *descriptor_name);
 
 // The lens-flare render call's kernel: the descriptor's flare parameter,
 // lit at ctx.flare_call's position, over input 1.
 int render_flare_call(const KernelContext &ctx, WorkImage &out);
-
-// Kernels, one file each.
-int render_gradient(const KernelContext &ctx, WorkImage &out);
-int render_blur(const KernelContext &ctx, WorkImage &out);
-int render_blur_fast(const KernelContext &ctx, WorkImage &out);
-int render_glow(const KernelContext &ctx, WorkImage &out);
-int render_dissolve(const KernelContext &ctx, WorkImage &out);
-int render_echo(const KernelContext &ctx, WorkImage &out);
-int render_trails(const KernelContext &ctx, WorkImage &out);
-int trails_history(const KernelContext &ctx);
-int render_time_blur(const KernelContext &ctx, WorkImage &out);
-int render_lens_flare(const KernelContext &ctx, WorkImage &out);
-int render_glare(const KernelContext &ctx, WorkImage &out);
-int render_caption(const KernelContext &ctx, WorkImage &out);
-int render_transform(const KernelContext &ctx, WorkImage &out);
-int render_builder_mix(const KernelContext &ctx, WorkImage &out);
-int render_builder_matte(const KernelContext &ctx, WorkImage &out);
 
 }  // namespace tarsel_ref

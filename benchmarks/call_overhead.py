@@ -1,6 +1,7 @@
 """Cost of crossing the boundary: a wrapper with no argument, one with an int,
 a record field read and write, and engine messages delivered to a Python
 handler from an engine worker thread. Prints a table; asserts nothing."""
+
 import sys
 import time
 

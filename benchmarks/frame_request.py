@@ -5,6 +5,7 @@ the same engine thread. Prints a table; asserts nothing.
 
     .venv/bin/python benchmarks/frame_request.py
 """
+
 import ctypes
 import pathlib
 import platform
@@ -42,8 +43,9 @@ class KeptFrame(renderlib.LoadFrameInterface):
 def install_ctypes_callback(engine_library, source):
     """A CFUNCTYPE callback installed directly in the engine, doing the
     adapter's work: both Python calls, the descriptor copied, the address back."""
-    symbols = subprocess.run(["nm", "-D", "--defined-only", engine_library], capture_output=True, text=True,
-                             check=True).stdout
+    symbols = subprocess.run(
+        ["nm", "-D", "--defined-only", engine_library], capture_output=True, text=True, check=True
+    ).stdout
     name = next(line.split()[-1] for line in symbols.splitlines() if INSTALL_SYMBOL_PREFIX in line)
     install = getattr(ctypes.CDLL(engine_library), name)
     p = ctypes.c_void_p
@@ -78,8 +80,10 @@ def main():
     _renderlib.set_load_frame_impl(None)
     del callback
 
-    print("%s, Python %s, %d requests from one engine thread (best of 5)"
-          % (platform.processor() or platform.machine(), platform.python_version(), REQUESTS))
+    print(
+        "%s, Python %s, %d requests from one engine thread (best of 5)"
+        % (platform.processor() or platform.machine(), platform.python_version(), REQUESTS)
+    )
     print()
     print("| frame request round trip | ns per request |")
     print("|---|---|")

@@ -13,6 +13,7 @@ while they wait. The reference engine's call log is paused in every process
 (one latency row keeps it, to show its share). Segments are named after this
 process and reset on the way out, also after a failure.
 """
+
 import ctypes
 import multiprocessing
 import os
@@ -40,20 +41,21 @@ MiB = 1024 * KiB
 SIZES = [64, 4 * KiB, 64 * KiB, 1 * MiB, 8 * MiB]
 ROUND_TRIPS = 20_000
 WARMUP_ROUND_TRIPS = 2_000
-STREAM_SECONDS = 0.25           # one timed stream
-STREAM_REPEATS = 3              # timed streams per message size and transport; the median is shown
-STREAM_WARMUP_SECONDS = 0.05    # untimed stream before each timed one
-SMALL_QUEUE = 64 * KiB          # each way, for the latency measurements
-LARGE_QUEUE = 64 * MiB          # each way, for throughput: seven 8 MiB messages
-MIDDLE_QUEUE = 16 * MiB         # each way: a ring that may fit the processor's last-level cache
-QUEUE_STREAM_BOUND = 1024      # multiprocessing.Queue: messages in flight while streaming
-SLOTS = 8                       # shared_memory baseline: 8 slots of 8 MiB
+STREAM_SECONDS = 0.25  # one timed stream
+STREAM_REPEATS = 3  # timed streams per message size and transport; the median is shown
+STREAM_WARMUP_SECONDS = 0.05  # untimed stream before each timed one
+SMALL_QUEUE = 64 * KiB  # each way, for the latency measurements
+LARGE_QUEUE = 64 * MiB  # each way, for throughput: seven 8 MiB messages
+MIDDLE_QUEUE = 16 * MiB  # each way: a ring that may fit the processor's last-level cache
+QUEUE_STREAM_BOUND = 1024  # multiprocessing.Queue: messages in flight while streaming
+SLOTS = 8  # shared_memory baseline: 8 slots of 8 MiB
 SLOT_BYTES = 8 * MiB
-STOP = b"\x00"                  # one byte: ends an echo or a stream (data is 64 B or more)
+STOP = b"\x00"  # one byte: ends an echo or a stream (data is 64 B or more)
 NAME_PREFIX = "bench-shmem-%d-" % os.getpid()
 
 
 # --- shared helpers ---------------------------------------------------------
+
 
 def set_call_log(on):
     """Keeps (True) or pauses the reference engine's call log in this process."""
@@ -114,8 +116,12 @@ def machine_line():
                     break
     except OSError:
         pass
-    return "machine: %s, %d cores, Python %s (%s)" % (model, os.cpu_count() or 0, platform.python_version(),
-                                                      sys.executable)
+    return "machine: %s, %d cores, Python %s (%s)" % (
+        model,
+        os.cpu_count() or 0,
+        platform.python_version(),
+        sys.executable,
+    )
 
 
 def warm_pair(server, client, capacity):
@@ -131,6 +137,7 @@ def warm_pair(server, client, capacity):
 
 
 # --- peers (each in its own process, one thread) ------------------------------
+
 
 def pin(command):
     """b"pin:0" keeps this process on processor 0; b"pin:" lets it run anywhere."""
@@ -254,7 +261,7 @@ def shared_memory_peer(connection, block_name):
                     size = int.from_bytes(note, "little")
                     if size == 0:
                         break
-                    memory[reply:reply + size] = memory[0:size]
+                    memory[reply : reply + size] = memory[0:size]
                     connection.send_bytes(note)
             elif command == b"sink":
                 received = 0
@@ -262,7 +269,7 @@ def shared_memory_peer(connection, block_name):
                     slot, size = struct.unpack("<iQ", connection.recv_bytes())
                     if slot < 0:
                         break
-                    view = memory[slot * SLOT_BYTES:slot * SLOT_BYTES + size]
+                    view = memory[slot * SLOT_BYTES : slot * SLOT_BYTES + size]
                     received += len(view)
                     view.release()
                     connection.send_bytes(b"a")
@@ -276,8 +283,10 @@ def shared_memory_peer(connection, block_name):
 
 # --- the channels, server side --------------------------------------------------
 
+
 class Channel:
     """The measuring end of one way of talking to a peer process."""
+
     label = ""
 
     def round_trips(self, payload):
@@ -372,6 +381,7 @@ class TransportChannel(Channel):
         def send(payload):
             reserve(len(payload))[:] = payload
             return commit()
+
         return send
 
     def round_trips(self, payload):
@@ -440,13 +450,13 @@ class PipeChannel(Channel):
 class QueueChannel(Channel):
     """Round trips through two plain queues; streams through a bounded one,
     since puts return before the feeder thread has sent anything."""
+
     label = "multiprocessing.Queue"
 
     def __init__(self, context):
         self.inbox, self.outbox = context.Queue(), context.Queue()  # the peer's inbox and outbox
         self.stream_box = context.Queue(maxsize=QUEUE_STREAM_BOUND)
-        self.process = context.Process(target=queue_peer, args=(self.inbox, self.outbox, self.stream_box),
-                                       daemon=True)
+        self.process = context.Process(target=queue_peer, args=(self.inbox, self.outbox, self.stream_box), daemon=True)
         self.process.start()
 
     def round_trips(self, payload):
@@ -494,6 +504,7 @@ class SharedMemoryChannel(Channel):
         def send(payload):
             memory[0:size] = payload
             send_note(note)
+
         times = timed_round_trips(send, connection.recv_bytes, payload)
         send_note(bytes(8))
         return times
@@ -509,7 +520,7 @@ class SharedMemoryChannel(Channel):
                 receive()  # the oldest slot was read
                 state["credits"] = 1
             slot = state["slot"]
-            memory[slot * SLOT_BYTES:slot * SLOT_BYTES + size] = payload
+            memory[slot * SLOT_BYTES : slot * SLOT_BYTES + size] = payload
             send(pack("<iQ", slot, size))
             state["credits"] -= 1
             state["slot"] = (slot + 1) % SLOTS
@@ -538,29 +549,39 @@ class SharedMemoryChannel(Channel):
 
 # --- native floors ----------------------------------------------------------------
 
+
 def build_native(folder):
     program = folder / "pingpong"
-    subprocess.run(["gcc", "-O2", "-o", str(program), str(HERE / "shmem_baselines" / "pingpong.c"), "-lpthread"],
-                   check=True)
+    subprocess.run(
+        ["gcc", "-O2", "-o", str(program), str(HERE / "shmem_baselines" / "pingpong.c"), "-lpthread"], check=True
+    )
     return program
 
 
 def run_native(program, *arguments, one_core=False):
-    output = subprocess.run([str(program)] + [str(a) for a in arguments], capture_output=True, text=True,
-                            check=True, timeout=120,
-                            preexec_fn=(lambda: os.sched_setaffinity(0, {0})) if one_core else None).stdout
+    output = subprocess.run(
+        [str(program)] + [str(a) for a in arguments],
+        capture_output=True,
+        text=True,
+        check=True,
+        timeout=120,
+        preexec_fn=(lambda: os.sched_setaffinity(0, {0})) if one_core else None,
+    ).stdout
     return {key: float(value) for key, value in (line.split() for line in output.splitlines())}
 
 
 # --- measures -----------------------------------------------------------------------
+
 
 def latency_table(program, channels):
     payload = bytes(range(64))
     rows, medians = [], {}
     condvar = run_native(program, "condvar", ROUND_TRIPS, WARMUP_ROUND_TRIPS)
     futex = run_native(program, "futex", ROUND_TRIPS, WARMUP_ROUND_TRIPS)
-    results = [("C, two processes: process-shared condition variable", condvar["median_ns"], condvar["p99_ns"]),
-               ("C, two processes: futex word, 20 us spin before sleeping", futex["median_ns"], futex["p99_ns"])]
+    results = [
+        ("C, two processes: process-shared condition variable", condvar["median_ns"], condvar["p99_ns"]),
+        ("C, two processes: futex word, 20 us spin before sleeping", futex["median_ns"], futex["p99_ns"]),
+    ]
     for key, channel in channels:
         median, p99 = summary_ns(channel.round_trips(payload))
         results.append((channel.label, median, p99))
@@ -568,11 +589,22 @@ def latency_table(program, channels):
     medians["condvar"], medians["futex"] = condvar["median_ns"], futex["median_ns"]
     pipe = medians["pipe"]
     for label, median, p99 in results:
-        rows.append((label, "%.2f" % (median / 1e3), "%.2f" % (p99 / 1e3), "%.2fx" % (median / condvar["median_ns"]),
-                     "%.0fx" % (median / futex["median_ns"]), "%.1fx" % (pipe / median)))
-    markdown("Round trip of a 64-byte message between two processes (%d round trips after %d of warm-up)"
-             % (ROUND_TRIPS, WARMUP_ROUND_TRIPS),
-             ["", "median us", "p99 us", "/ C condvar", "/ C futex+spin", "Pipe / this"], rows)
+        rows.append(
+            (
+                label,
+                "%.2f" % (median / 1e3),
+                "%.2f" % (p99 / 1e3),
+                "%.2fx" % (median / condvar["median_ns"]),
+                "%.0fx" % (median / futex["median_ns"]),
+                "%.1fx" % (pipe / median),
+            )
+        )
+    markdown(
+        "Round trip of a 64-byte message between two processes (%d round trips after %d of warm-up)"
+        % (ROUND_TRIPS, WARMUP_ROUND_TRIPS),
+        ["", "median us", "p99 us", "/ C condvar", "/ C futex+spin", "Pipe / this"],
+        rows,
+    )
     return medians
 
 
@@ -582,12 +614,24 @@ def latency_targets(medians):
         median = medians[key]
         within = median / medians["condvar"]
         faster = medians["pipe"] / median
-        rows.append((label, "%.2fx (%s)" % (within, "met" if within <= 1.5 else "missed"),
-                     "%.1fx (%s)" % (faster, "met" if faster >= 5 else "missed"),
-                     "%.0fx" % (median / medians["futex"])))
-    markdown("Round-trip targets",
-             ["transport path", "/ C condvar ping-pong (target <= 1.5x)", "faster than Pipe (target >= 5x)",
-              "/ C futex+spin ping-pong (no target)"], rows)
+        rows.append(
+            (
+                label,
+                "%.2fx (%s)" % (within, "met" if within <= 1.5 else "missed"),
+                "%.1fx (%s)" % (faster, "met" if faster >= 5 else "missed"),
+                "%.0fx" % (median / medians["futex"]),
+            )
+        )
+    markdown(
+        "Round-trip targets",
+        [
+            "transport path",
+            "/ C condvar ping-pong (target <= 1.5x)",
+            "faster than Pipe (target >= 5x)",
+            "/ C futex+spin ping-pong (no target)",
+        ],
+        rows,
+    )
 
 
 def one_core_table(program, transport, pipe):
@@ -595,8 +639,10 @@ def one_core_table(program, transport, pipe):
     wait costs when the peer cannot run at the same time."""
     payload = bytes(range(64))
     rows = []
-    for mode, label in (("condvar", "C, two processes: process-shared condition variable"),
-                        ("futex", "C, two processes: futex word, 20 us spin before sleeping")):
+    for mode, label in (
+        ("condvar", "C, two processes: process-shared condition variable"),
+        ("futex", "C, two processes: futex word, 20 us spin before sleeping"),
+    ):
         result = run_native(program, mode, ROUND_TRIPS, WARMUP_ROUND_TRIPS, one_core=True)
         rows.append((label, result["median_ns"], result["p99_ns"]))
     everywhere = os.sched_getaffinity(0)
@@ -609,21 +655,26 @@ def one_core_table(program, transport, pipe):
             os.sched_setaffinity(0, everywhere)
             command(b"pin:")
         rows.append((channel.label, median, p99))
-    markdown("Round trip of a 64-byte message, both processes held on one processor",
-             ["", "median us", "p99 us", "/ C condvar"],
-             [(label, "%.2f" % (median / 1e3), "%.2f" % (p99 / 1e3), "%.2fx" % (median / rows[0][1]))
-              for label, median, p99 in rows])
+    markdown(
+        "Round trip of a 64-byte message, both processes held on one processor",
+        ["", "median us", "p99 us", "/ C condvar"],
+        [
+            (label, "%.2f" % (median / 1e3), "%.2f" % (p99 / 1e3), "%.2fx" % (median / rows[0][1]))
+            for label, median, p99 in rows
+        ],
+    )
 
 
 def throughput_table(program, channels):
     walking = run_native(program, "memcpy", 0.3, LARGE_QUEUE, *SIZES)
     fixed = run_native(program, "memcpy", 0.3, 0, *SIZES)
     numpy_copy = numpy_bandwidth()
-    rows = [["memcpy, C, one core: destination walking through 64 MiB"]
-            + ["%.0f" % walking["memcpy_%d" % s] for s in SIZES],
-            ["memcpy, C, one core: always the same destination"] + ["%.0f" % fixed["memcpy_%d" % s] for s in SIZES],
-            ["numpy slice copy from Python, one core, walking through 64 MiB"]
-            + ["%.0f" % numpy_copy[s] for s in SIZES]]
+    rows = [
+        ["memcpy, C, one core: destination walking through 64 MiB"]
+        + ["%.0f" % walking["memcpy_%d" % s] for s in SIZES],
+        ["memcpy, C, one core: always the same destination"] + ["%.0f" % fixed["memcpy_%d" % s] for s in SIZES],
+        ["numpy slice copy from Python, one core, walking through 64 MiB"] + ["%.0f" % numpy_copy[s] for s in SIZES],
+    ]
     rates = {}
     for key, channel in channels:
         row = [channel.label]
@@ -638,33 +689,48 @@ def throughput_table(program, channels):
             rates[key, size] = runs[len(runs) // 2]
             row.append("%.0f [%.0f-%.0f]" % (rates[key, size], runs[0], runs[-1]))
         rows.append(row)
-    markdown("One-way throughput, MB/s (10^6 bytes/s): median [lowest-highest] of %d streams of %.2f s after "
-             "%.2f s of warm-up" % (STREAM_REPEATS, STREAM_SECONDS, STREAM_WARMUP_SECONDS),
-             ["message size"] + [size_text(s) for s in SIZES], rows,
-             ["The reader takes each message and does not copy it out: the transport and the shared_memory "
-              "baseline hand it a view, Pipe and Queue a new bytes object. The Queue row streams through a "
-              "Queue(maxsize=%d). Transport queues hold 64 MiB each way (16 MiB in the row that says so; this "
-              "processor's last-level cache: %s), every page mapped in both processes before timing; a "
-              "message written to an empty queue goes to the start of the ring, so while the reader keeps up "
-              "the writer copies to the same, cached, place, and once it falls behind the writer goes round the "
-              "whole ring. The shared_memory baseline has 8 slots of 8 MiB with one acknowledgement per "
-              "message. The memcpy floors copy a fixed source to 64-byte aligned places walking through 64 "
-              "MiB (as a writer going round a ring), or always to the same place." % (QUEUE_STREAM_BOUND, last_level_cache())])
+    markdown(
+        "One-way throughput, MB/s (10^6 bytes/s): median [lowest-highest] of %d streams of %.2f s after "
+        "%.2f s of warm-up" % (STREAM_REPEATS, STREAM_SECONDS, STREAM_WARMUP_SECONDS),
+        ["message size"] + [size_text(s) for s in SIZES],
+        rows,
+        [
+            "The reader takes each message and does not copy it out: the transport and the shared_memory "
+            "baseline hand it a view, Pipe and Queue a new bytes object. The Queue row streams through a "
+            "Queue(maxsize=%d). Transport queues hold 64 MiB each way (16 MiB in the row that says so; this "
+            "processor's last-level cache: %s), every page mapped in both processes before timing; a "
+            "message written to an empty queue goes to the start of the ring, so while the reader keeps up "
+            "the writer copies to the same, cached, place, and once it falls behind the writer goes round the "
+            "whole ring. The shared_memory baseline has 8 slots of 8 MiB with one acknowledgement per "
+            "message. The memcpy floors copy a fixed source to 64-byte aligned places walking through 64 "
+            "MiB (as a writer going round a ring), or always to the same place."
+            % (QUEUE_STREAM_BOUND, last_level_cache())
+        ],
+    )
     target_rows = []
     for key, label in (("write", "write_pybuf"), ("reserve", "reserve_pybuf + fill + commit")):
         for floor, floor_label in ((walking, "walking"), (fixed, "same place")):
             row = ["%s / memcpy %s" % (label, floor_label)]
             for size in SIZES:
                 share = rates[key, size] / floor["memcpy_%d" % size]
-                row.append("%.0f%%%s" % (100 * share, "" if size < 64 * KiB or key != "write"
-                                         else (" met" if share >= 0.7 else " missed")))
+                row.append(
+                    "%.0f%%%s"
+                    % (
+                        100 * share,
+                        "" if size < 64 * KiB or key != "write" else (" met" if share >= 0.7 else " missed"),
+                    )
+                )
             target_rows.append(row)
-    markdown("Throughput against C memcpy (target: write path >= 70% from 64 KiB up)",
-             ["transport path / floor"] + [size_text(s) for s in SIZES], target_rows)
+    markdown(
+        "Throughput against C memcpy (target: write path >= 70% from 64 KiB up)",
+        ["transport path / floor"] + [size_text(s) for s in SIZES],
+        target_rows,
+    )
 
 
 def numpy_bandwidth(seconds=0.2):
     import numpy
+
     region = numpy.ones(LARGE_QUEUE, dtype=numpy.uint8)
     result = {}
     for size in SIZES:
@@ -678,7 +744,7 @@ def numpy_bandwidth(seconds=0.2):
             for _ in range(64):
                 if offset + step > LARGE_QUEUE:
                     offset = 0
-                region[offset:offset + size] = source
+                region[offset : offset + size] = source
                 offset += step
             copies += 64
             stop = clock()
@@ -725,17 +791,21 @@ def reserve_commit_table(name):
                     times.append(stop - start)
             write_median = summary_ns(times)[0]
             medians.append(reserve_median)
-            rows.append((size_text(size), "%.0f" % reserve_median, "%.0f" % reserve_p99,
-                         "%.0f" % write_median))
+            rows.append((size_text(size), "%.0f" % reserve_median, "%.0f" % reserve_p99, "%.0f" % write_median))
     finally:
         client = None  # unmaps the client's end
         server.remove()
     spread = max(medians) / min(medians)
-    markdown("reserve_pybuf + commit by message size, without filling (one process; ns per message)",
-             ["message size", "reserve+commit median", "reserve+commit p99", "write_pybuf median (copies)"], rows,
-             ["8 MiB / 64 B reserve+commit: %.2fx; largest / smallest median: %.2fx (%s: flat taken as <= 1.5x). "
-              "Times include one perf_counter_ns pair, %.0f ns." % (medians[-1] / medians[0], spread,
-                                                                    "flat" if spread <= 1.5 else "not flat", timer)])
+    markdown(
+        "reserve_pybuf + commit by message size, without filling (one process; ns per message)",
+        ["message size", "reserve+commit median", "reserve+commit p99", "write_pybuf median (copies)"],
+        rows,
+        [
+            "8 MiB / 64 B reserve+commit: %.2fx; largest / smallest median: %.2fx (%s: flat taken as <= 1.5x). "
+            "Times include one perf_counter_ns pair, %.0f ns."
+            % (medians[-1] / medians[0], spread, "flat" if spread <= 1.5 else "not flat", timer)
+        ],
+    )
 
 
 def per_call_table(name):
@@ -764,13 +834,13 @@ def per_call_table(name):
         return clock() - start
 
     def measure():
-        totals = dict.fromkeys(["loop", "get_last_error", "write", "read", "empty read", "reserve", "memoryview"],
-                               0.0)
+        totals = dict.fromkeys(["loop", "get_last_error", "write", "read", "empty read", "reserve", "memoryview"], 0.0)
         reserve, commit = server.reserve_pybuf, server.commit
 
         def reserve_fill_commit():
             reserve(64)[:] = payload
             commit()
+
         for _ in range(runs):
             totals["loop"] += empty_loop()
             totals["get_last_error"] += timed(server.get_last_error)
@@ -794,31 +864,53 @@ def per_call_table(name):
     finally:
         client = None  # unmaps the client's end
         server.remove()
-    labels = [("get_last_error()  (through the binding into the engine, no work)", "get_last_error"),
-              ("write_pybuf(64 B)", "write"),
-              ("try_read_pybuf(), a message waiting", "read"),
-              ("try_read_pybuf(), queue empty", "empty read"),
-              ("reserve_pybuf(64) + fill + commit()", "reserve"),
-              ("memoryview(bytes)  (a view alone, no engine)", "memoryview")]
+    labels = [
+        ("get_last_error()  (through the binding into the engine, no work)", "get_last_error"),
+        ("write_pybuf(64 B)", "write"),
+        ("try_read_pybuf(), a message waiting", "read"),
+        ("try_read_pybuf(), queue empty", "empty read"),
+        ("reserve_pybuf(64) + fill + commit()", "reserve"),
+        ("memoryview(bytes)  (a view alone, no engine)", "memoryview"),
+    ]
     rows = [(label, "%.0f" % quiet[key], "%.0f" % logged[key]) for label, key in labels]
-    markdown("Per-call cost in one process (ns per call, %d calls each, loop overhead subtracted)"
-             % (run * runs), ["call", "call log paused", "call log kept"], rows)
+    markdown(
+        "Per-call cost in one process (ns per call, %d calls each, loop overhead subtracted)" % (run * runs),
+        ["call", "call log paused", "call log kept"],
+        rows,
+    )
     return quiet
 
 
 def where_the_time_goes(medians, quiet):
     calls = 2 * quiet["write"] + 2 * quiet["read"]
     calls_reserve = 2 * quiet["reserve"] + 2 * quiet["read"]
-    rows = [("write path", "%.2f" % (medians["write"] / 1e3), "%.2f" % (calls / 1e3),
-             "%.2f" % ((medians["write"] - calls) / 1e3), "%.2f" % (medians["futex"] / 1e3)),
-            ("reserve/commit path", "%.2f" % (medians["reserve"] / 1e3), "%.2f" % (calls_reserve / 1e3),
-             "%.2f" % ((medians["reserve"] - calls_reserve) / 1e3), "%.2f" % (medians["futex"] / 1e3))]
-    markdown("Where a transport round trip goes (us)",
-             ["", "measured median", "2 sends + 2 reads (one-process cost)", "rest", "C futex+spin round trip"],
-             rows, ["A round trip is two sends and two reads (per-call costs above, call log paused) and two "
-                    "hand-overs between cores. The rest is the hand-overs, the loop and the timer, less what the "
-                    "peer's read overlaps while it waits; near zero or below means the calls themselves are the "
-                    "round trip."])
+    rows = [
+        (
+            "write path",
+            "%.2f" % (medians["write"] / 1e3),
+            "%.2f" % (calls / 1e3),
+            "%.2f" % ((medians["write"] - calls) / 1e3),
+            "%.2f" % (medians["futex"] / 1e3),
+        ),
+        (
+            "reserve/commit path",
+            "%.2f" % (medians["reserve"] / 1e3),
+            "%.2f" % (calls_reserve / 1e3),
+            "%.2f" % ((medians["reserve"] - calls_reserve) / 1e3),
+            "%.2f" % (medians["futex"] / 1e3),
+        ),
+    ]
+    markdown(
+        "Where a transport round trip goes (us)",
+        ["", "measured median", "2 sends + 2 reads (one-process cost)", "rest", "C futex+spin round trip"],
+        rows,
+        [
+            "A round trip is two sends and two reads (per-call costs above, call log paused) and two "
+            "hand-overs between cores. The rest is the hand-overs, the loop and the timer, less what the "
+            "peer's read overlaps while it waits; near zero or below means the calls themselves are the "
+            "round trip."
+        ],
+    )
 
 
 class LoggedRounds(Channel):
@@ -840,6 +932,7 @@ class LoggedRounds(Channel):
 
 # --- main ---------------------------------------------------------------------------
 
+
 def main():
     signal.signal(signal.SIGTERM, lambda number, frame: sys.exit(1))
     set_call_log(False)
@@ -853,11 +946,13 @@ def main():
     started = time.perf_counter()
     try:
         program = build_native(folder)
-        small = TransportChannel(context, names[0], SMALL_QUEUE,
-                                 label="transport: write_pybuf + read_pybuf, 64 KiB queues")
+        small = TransportChannel(
+            context, names[0], SMALL_QUEUE, label="transport: write_pybuf + read_pybuf, 64 KiB queues"
+        )
         channels.append(small)
-        large = TransportChannel(context, names[1], LARGE_QUEUE,
-                                 label="transport: write_pybuf + read_pybuf, 64 MiB queues")
+        large = TransportChannel(
+            context, names[1], LARGE_QUEUE, label="transport: write_pybuf + read_pybuf, 64 MiB queues"
+        )
         channels.append(large)
         middle = TransportChannel(context, names[4], MIDDLE_QUEUE, label="transport: write_pybuf, 16 MiB queues")
         channels.append(middle)
@@ -867,23 +962,33 @@ def main():
         middle.warm_ring()
 
         logged = small.with_path(False, "transport: write_pybuf + read_pybuf, engine call log kept")
-        latency_channels = [("write", small),
-                            ("reserve", small.with_path(True, "transport: reserve_pybuf/commit + read_pybuf, "
-                                                              "64 KiB queues")),
-                            ("write-large", large)]
+        latency_channels = [
+            ("write", small),
+            ("reserve", small.with_path(True, "transport: reserve_pybuf/commit + read_pybuf, 64 KiB queues")),
+            ("write-large", large),
+        ]
         # Queue last among the round trips: its feeder thread has then sent
         # everything before this process next waits in a transport call,
         # which keeps the interpreter lock.
-        medians = latency_table(program, latency_channels + [("logged", LoggedRounds(logged)), ("pipe", pipe),
-                                                             ("shm", block), ("queue", queue)])
+        medians = latency_table(
+            program,
+            latency_channels + [("logged", LoggedRounds(logged)), ("pipe", pipe), ("shm", block), ("queue", queue)],
+        )
         latency_targets(medians)
         quiet = per_call_table(names[2])
         where_the_time_goes(medians, quiet)
         one_core_table(program, small, pipe)
-        throughput_table(program, [("write", large.with_path(False, "transport: write_pybuf")),
-                                   ("reserve", large.with_path(True, "transport: reserve_pybuf + fill + commit")),
-                                   ("middle", middle),
-                                   ("pipe", pipe), ("queue", queue), ("shm", block)])
+        throughput_table(
+            program,
+            [
+                ("write", large.with_path(False, "transport: write_pybuf")),
+                ("reserve", large.with_path(True, "transport: reserve_pybuf + fill + commit")),
+                ("middle", middle),
+                ("pipe", pipe),
+                ("queue", queue),
+                ("shm", block),
+            ],
+        )
         reserve_commit_table(names[3])
     finally:
         for channel in channels:
@@ -897,8 +1002,10 @@ def main():
         for name in names:
             _renderlib.ShmemManager_reset(name, True)
         shutil.rmtree(folder, ignore_errors=True)
-    print("whole run: %.0f s; load average at the end: %.2f %.2f %.2f"
-          % ((time.perf_counter() - started,) + os.getloadavg()))
+    print(
+        "whole run: %.0f s; load average at the end: %.2f %.2f %.2f"
+        % ((time.perf_counter() - started,) + os.getloadavg())
+    )
 
 
 if __name__ == "__main__":

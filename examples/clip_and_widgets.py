@@ -4,6 +4,7 @@ an SVG picture; a mouse drag moves the flare, and the result is rendered.
 
     .venv/bin/python examples/clip_and_widgets.py [output folder, build/example-output by default]
 """
+
 import pathlib
 import sys
 
@@ -22,7 +23,7 @@ def clip_frame(frame):
     left = (frame * 12) % (WIDTH - 24)
     for y in range(78, 102):
         start = (y * WIDTH + left) * 4
-        pixels[start:start + 24 * 4] = bytes([255, 255, 255, 255]) * 24
+        pixels[start : start + 24 * 4] = bytes([255, 255, 255, 255]) * 24
     return info, pixels
 
 
@@ -46,8 +47,9 @@ def main(folder):
     clip = Clip()
     _renderlib.set_load_frame_impl(clip)
     try:
-        echo = effects.recreate(_renderlib.init_tarsel_effect("T_Echo", False),
-                                {"echoes": "6", "decay": "0.7", "combine": "Maximum"})
+        echo = effects.recreate(
+            _renderlib.init_tarsel_effect("T_Echo", False), {"echoes": "6", "decay": "0.7", "combine": "Maximum"}
+        )
         dest = effects.raster(_renderlib.pixel_rgba8, WIDTH, HEIGHT)
         for frame in (10, 20):
             clip.kept.clear()
@@ -67,8 +69,11 @@ def main(folder):
         # Drag the flare's position handle 80 pixels to the right.
         handle = next(args for name, args in drawing.calls if name == "circle")
         x, y = int(handle[0]), int(handle[1])
-        for kind, at in ((_renderlib.MouseEventType_PRESS, x), (_renderlib.MouseEventType_DRAG, x + 40),
-                         (_renderlib.MouseEventType_RELEASE, x + 80)):
+        for kind, at in (
+            (_renderlib.MouseEventType_PRESS, x),
+            (_renderlib.MouseEventType_DRAG, x + 40),
+            (_renderlib.MouseEventType_RELEASE, x + 80),
+        ):
             status, changed = _renderlib.tarsel_widget_mouse_event(flare, "", *view, [WIDTH, HEIGHT], at, y, kind)
             for name, value in changed:
                 print("%s -> %.3f %.3f" % (name, value[0], value[1]))

@@ -7,6 +7,7 @@ as a PNG file; "preview" keeps the frames in memory.
 
 Defaults: folder 320x180p25 build/example-output/monitor.
 """
+
 import os
 import pathlib
 import sys
@@ -26,7 +27,7 @@ def square_clip(width, height, frame):
     left = frame * (width - side) // (FRAMES - 1)
     for y in range((height - side) // 2, (height + side) // 2):
         start = (y * width + left) * 4
-        pixels[start:start + side * 4] = bytes([255, 255, 255, 255]) * side
+        pixels[start : start + side * 4] = bytes([255, 255, 255, 255]) * side
     return info, pixels
 
 

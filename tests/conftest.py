@@ -36,6 +36,7 @@ def module_on_separate_engine(tmp_path_factory):
     """A module built with the build's option for another engine, against a
     reference engine configured and built on its own: the folder holding it."""
     from native_build import build_module_against, build_reference_engine
+
     engine = build_reference_engine(tmp_path_factory.mktemp("separate-engine"))
     return build_module_against(engine, tmp_path_factory.mktemp("module-on-separate-engine"))
 
@@ -61,8 +62,12 @@ def instance():
 def shared_registry(tmp_path_factory):
     """A second SWIG module sharing _renderlib's type registry."""
     from native_build import REPO, build_swig_module
-    folder = build_swig_module(pathlib.Path(__file__).with_name("shared_registry.i"),
-                               tmp_path_factory.mktemp("shared-registry"), [REPO / "engine-api"])
+
+    folder = build_swig_module(
+        pathlib.Path(__file__).with_name("shared_registry.i"),
+        tmp_path_factory.mktemp("shared-registry"),
+        [REPO / "engine-api"],
+    )
     sys.path.insert(0, str(folder))
     try:
         yield importlib.import_module("shared_registry")

@@ -1,4 +1,5 @@
 """Walking the reference engine's catalogues from tests."""
+
 from renderlib import effects
 
 

@@ -2,6 +2,7 @@
 
 The probe lives in the engine library that _renderlib loaded; opening the
 same file again gives the same, already loaded, library."""
+
 import ctypes
 
 import _renderlib  # noqa: F401  (loads the engine)
@@ -60,8 +61,9 @@ class EngineProbe:
     def calls(self):
         """The call log, oldest first, as text."""
         lib = self.lib
-        return [lib.tarsel_probe_call(i).decode("utf-8", "surrogateescape")
-                for i in range(lib.tarsel_probe_call_count())]
+        return [
+            lib.tarsel_probe_call(i).decode("utf-8", "surrogateescape") for i in range(lib.tarsel_probe_call_count())
+        ]
 
     def keep_call_log(self, on=True):
         self.lib.tarsel_probe_set_call_log(int(on))

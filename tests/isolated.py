@@ -1,5 +1,6 @@
 """Host code run in a process of its own, so that a crash or a hang fails one
 test instead of the whole run."""
+
 import os
 import pathlib
 import signal

@@ -1,6 +1,7 @@
 """Builds native code from the tests: a separately configured reference engine
 and small extension modules. Compilers run without the sanitizer runtime that
 a sanitized test run preloads."""
+
 import os
 import pathlib
 import shutil
@@ -21,13 +22,26 @@ def tool(name):
 
 def run(command, cwd=None):
     env = {k: v for k, v in os.environ.items() if k not in ("LD_PRELOAD", "ASAN_OPTIONS", "UBSAN_OPTIONS")}
-    subprocess.run([str(part) for part in command], cwd=cwd, env=env, check=True,
-                   stdout=subprocess.PIPE, stderr=subprocess.STDOUT)
+    subprocess.run(
+        [str(part) for part in command], cwd=cwd, env=env, check=True, stdout=subprocess.PIPE, stderr=subprocess.STDOUT
+    )
 
 
 def cmake_build(source_dir, build_dir, *options):
-    run([tool("cmake"), "-S", source_dir, "-B", build_dir, "-G", "Ninja", "-DCMAKE_MAKE_PROGRAM=" + tool("ninja"),
-         "-DCMAKE_BUILD_TYPE=Release"] + list(options))
+    run(
+        [
+            tool("cmake"),
+            "-S",
+            source_dir,
+            "-B",
+            build_dir,
+            "-G",
+            "Ninja",
+            "-DCMAKE_MAKE_PROGRAM=" + tool("ninja"),
+            "-DCMAKE_BUILD_TYPE=Release",
+        ]
+        + list(options)
+    )
     run([tool("cmake"), "--build", build_dir])
     return pathlib.Path(build_dir)
 
@@ -41,9 +55,14 @@ def build_reference_engine(build_dir):
 def build_module_against(engine_dir, build_dir):
     """Builds the module alone against the engine libraries in `engine_dir`
     (headers from engine-api/); returns the folder holding _renderlib."""
-    cmake_build(REPO, build_dir, "-DRENDERLIB_ENGINE_INCLUDE_DIR=%s" % (REPO / "engine-api"),
-                "-DRENDERLIB_ENGINE_LIBRARY_DIR=%s" % engine_dir, "-DPython_EXECUTABLE=" + sys.executable,
-                "-DSWIG_EXECUTABLE=" + tool("swig"))
+    cmake_build(
+        REPO,
+        build_dir,
+        "-DRENDERLIB_ENGINE_INCLUDE_DIR=%s" % (REPO / "engine-api"),
+        "-DRENDERLIB_ENGINE_LIBRARY_DIR=%s" % engine_dir,
+        "-DPython_EXECUTABLE=" + sys.executable,
+        "-DSWIG_EXECUTABLE=" + tool("swig"),
+    )
     return pathlib.Path(build_dir) / "python" / "render-lib"
 
 
@@ -54,7 +73,17 @@ def build_swig_module(interface, build_dir, include_dirs=()):
     wrap = build_dir / (name + "_wrap.cxx")
     run([tool("swig"), "-c++", "-python", "-threads", "-outdir", build_dir, "-o", wrap, interface])
     extension = build_dir / ("_" + name + sysconfig.get_config_var("EXT_SUFFIX"))
-    run([os.environ.get("CXX", "g++"), "-std=c++17", "-shared", "-fPIC", "-w", "-O1",
-         "-I" + sysconfig.get_paths()["include"]] + ["-I%s" % d for d in include_dirs]
-        + [wrap, "-o", extension])
+    run(
+        [
+            os.environ.get("CXX", "g++"),
+            "-std=c++17",
+            "-shared",
+            "-fPIC",
+            "-w",
+            "-O1",
+            "-I" + sysconfig.get_paths()["include"],
+        ]
+        + ["-I%s" % d for d in include_dirs]
+        + [wrap, "-o", extension]
+    )
     return build_dir

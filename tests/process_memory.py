@@ -1,4 +1,5 @@
 """This process's resident memory, for tests that check it stays flat."""
+
 import os
 
 # AddressSanitizer's quarantine keeps freed memory resident by design, so

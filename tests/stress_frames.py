@@ -1,5 +1,6 @@
 """What the stress tests render with: frames of one colour per (input, frame),
 served to several renders at once, and one render of a frame."""
+
 import threading
 
 import numpy

@@ -9,6 +9,7 @@ the dump, and starts a new worker for the rest. Run in one process (-n 0),
 the stacks go to standard error and the run ends there.
 
 RENDERLIB_TEST_TIME_LIMIT sets the limit in seconds (300; 0 for none)."""
+
 import faulthandler
 import os
 import pathlib

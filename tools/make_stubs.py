@@ -48,6 +48,7 @@ Type rules, as the wrapper behaves:
 Any wrapper code the generator does not recognise stops it (and the build)
 with an error, so a changed interface cannot quietly turn into loose stubs.
 """
+
 import argparse
 import ast
 import keyword
@@ -148,8 +149,7 @@ SCALARS = {
 }
 
 # C element types of the std containers, as Python types.
-ELEMENTS = {"float": "float", "double": "float", "bool": "bool", "int": "int", "short": "int",
-            "std::string": "str"}
+ELEMENTS = {"float": "float", "double": "float", "bool": "bool", "int": "int", "short": "int", "std::string": "str"}
 
 
 # --------------------------------------------------------------------------
@@ -162,10 +162,27 @@ def run_swig(swig, includes, out, extra=()):
     if "SWIG Version %s" % SWIG_VERSION not in version:
         raise StubError("%s is not SWIG %s: %s" % (swig, SWIG_VERSION, version.strip()))
     # Quiet unless it fails: the build's own SWIG run shows the same warnings.
-    run = subprocess.run([swig, "-c++", "-python", "-threads", "-Wextra", *extra, "-I%s" % BINDING,
-                          *["-I%s" % include for include in includes], "-outdir", str(out),
-                          "-o", str(out / "wrap.cxx"), str(BINDING / "renderlib.i")],
-                         cwd=REPO, stdout=subprocess.PIPE, stderr=subprocess.STDOUT, text=True)
+    run = subprocess.run(
+        [
+            swig,
+            "-c++",
+            "-python",
+            "-threads",
+            "-Wextra",
+            *extra,
+            "-I%s" % BINDING,
+            *["-I%s" % include for include in includes],
+            "-outdir",
+            str(out),
+            "-o",
+            str(out / "wrap.cxx"),
+            str(BINDING / "renderlib.i"),
+        ],
+        cwd=REPO,
+        stdout=subprocess.PIPE,
+        stderr=subprocess.STDOUT,
+        text=True,
+    )
     if run.returncode:
         raise StubError("SWIG failed:\n%s" % run.stdout)
     return (out / "wrap.cxx").read_text(), (out / "renderlib.py").read_text()
@@ -189,7 +206,7 @@ def _drop_template_argument(text, prefix):
                 depth -= 1
                 if depth == 0:
                     break
-        text = text[:start] + text[end + 1:]
+        text = text[:start] + text[end + 1 :]
 
 
 def normalise(ctype):
@@ -206,7 +223,7 @@ def normalise(ctype):
 
 def template_arguments(text):
     """The top-level arguments of "name<a,b<c>>": ["a", "b<c>"]."""
-    inner = text[text.index("<") + 1:text.rindex(">")]
+    inner = text[text.index("<") + 1 : text.rindex(">")]
     parts, depth, current = [], 0, ""
     for char in inner:
         if char == "," and depth == 0:
@@ -241,13 +258,18 @@ class Sig:
 FUNCTION_RE = re.compile(r"^SWIGINTERN PyObject \*(\w+)\(PyObject \*[^\n]*\{\n", re.M)
 METHOD_TABLE_RE = re.compile(r'\{ "(\w+)", (\w+), (METH_\w+), NULL\}')
 TYPE_RE = re.compile(r'^static swig_type_info _swigt__(p_\w+) = \{"_\1", "([^"]*)"', re.M)
-REGISTER_RE = re.compile(r"SWIGINTERN PyObject \*(\w+)_swigregister\(.*?SWIG_TypeNewClientData\(SWIGTYPE_(p_\w+),",
-                         re.S)
+REGISTER_RE = re.compile(
+    r"SWIGINTERN PyObject \*(\w+)_swigregister\(.*?SWIG_TypeNewClientData\(SWIGTYPE_(p_\w+),", re.S
+)
 CONSTANT_RE = re.compile(r'SWIG_Python_SetConstant\(d, "(\w+)",SWIG_(From_int|FromCharPtr)\(')
-MESSAGE_RE = re.compile(r"""argument " "(\d+)"" of type '" "([^"]*)""'|argument (\d+) of type '([^']*)'"""
-                        r"""|arg (\d+) of type ([^:,"]*)[:,]|arg (\d+), """)
-ARGS_RE = re.compile(r'SWIG_Python_UnpackTuple\(args, "\w+", (\d+), (\d+), swig_obj\)'
-                     r"|\(nobjs < (\d+)\) \|\| \(nobjs > (\d+)\)|SWIG_Python_UnpackTuple\(args, \"\w+\", 0, 0, 0\)")
+MESSAGE_RE = re.compile(
+    r"""argument " "(\d+)"" of type '" "([^"]*)""'|argument (\d+) of type '([^']*)'"""
+    r"""|arg (\d+) of type ([^:,"]*)[:,]|arg (\d+), """
+)
+ARGS_RE = re.compile(
+    r'SWIG_Python_UnpackTuple\(args, "\w+", (\d+), (\d+), swig_obj\)'
+    r"|\(nobjs < (\d+)\) \|\| \(nobjs > (\d+)\)|SWIG_Python_UnpackTuple\(args, \"\w+\", 0, 0, 0\)"
+)
 
 
 class Wrapper:
@@ -258,9 +280,9 @@ class Wrapper:
         self.bodies = {}
         for match in FUNCTION_RE.finditer(source):
             end = source.index("\n}\n", match.end())
-            self.bodies[match.group(1)] = source[match.end():end]
-        table = source[source.index("static PyMethodDef SwigMethods[]"):]
-        table = table[:table.index("{ NULL, NULL, 0, NULL }")]
+            self.bodies[match.group(1)] = source[match.end() : end]
+        table = source[source.index("static PyMethodDef SwigMethods[]") :]
+        table = table[: table.index("{ NULL, NULL, 0, NULL }")]
         self.table = [(name, function, flags) for name, function, flags in METHOD_TABLE_RE.findall(table)]
         self.type_names = {mangled: names.split("|") for mangled, names in TYPE_RE.findall(source)}
         self.classes = {mangled: name for name, mangled in REGISTER_RE.findall(source)}
@@ -291,7 +313,7 @@ class Wrapper:
         text = normalise(ctype).rstrip("*")
         for kind in ("std::vector", "std::map"):
             if text.startswith(kind + "<"):
-                base = text[:text.rindex(">") + 1]
+                base = text[: text.rindex(">") + 1]
                 return kind, self.class_by_ctype.get(base), template_arguments(base)
         return None
 
@@ -365,17 +387,19 @@ class Wrapper:
             # Wraps a function as an instance method (SWIG's -fastproxy support).
             return [Sig([Arg("function", "Callable[..., Any]")], "Any")]
         if name.endswith("_swigregister"):
-            cls = name[:-len("_swigregister")]
+            cls = name[: -len("_swigregister")]
             return [Sig([Arg("cls", "type[%s]" % cls)], "None")]
         if name.endswith("_swiginit"):
             # SWIG_Python_InitShadowInstance: attaches a new object to its proxy.
-            cls = name[:-len("_swiginit")]
+            cls = name[: -len("_swiginit")]
             return [Sig([Arg("self", cls), Arg("this", "_SwigPyObject")], "None")]
         body = self.bodies[function]
         # In declaration order (SWIG numbers them so), which is also the
         # order of the autodoc prototypes that name their parameters.
-        variants = sorted(set(re.findall(r"return (_wrap_\w+__SWIG_(\d+))\(self, argc, argv\)", body)),
-                          key=lambda variant: int(variant[1]))
+        variants = sorted(
+            set(re.findall(r"return (_wrap_\w+__SWIG_(\d+))\(self, argc, argv\)", body)),
+            key=lambda variant: int(variant[1]),
+        )
         variants = [variant for variant, _number in variants]
         if variants:
             return [self._signature(name, self.bodies[v]) for v in variants]
@@ -401,12 +425,18 @@ class Wrapper:
         for i in range(count):
             pattern = re.compile(r"(?<!&)swig_obj\[%d\]" % i)
             first_use.append(next(n for n, line in enumerate(lines) if pattern.search(line)))
-        action = next((n for n, line in enumerate(lines) if re.match(
-            r"\s*(try \{|result = |resultobj = (?!0 ;)|director = |upcall = )", line)), len(lines))
+        action = next(
+            (
+                n
+                for n, line in enumerate(lines)
+                if re.match(r"\s*(try \{|result = |resultobj = (?!0 ;)|director = |upcall = )", line)
+            ),
+            len(lines),
+        )
         args = []
         for i in range(count):
             end = first_use[i + 1] if i + 1 < count else max(action, first_use[i] + 1)
-            segment = "\n".join(lines[first_use[i]:end])
+            segment = "\n".join(lines[first_use[i] : end])
             args.append(Arg("arg%d" % (i + 1), self._argument(name, i, segment, body)))
         result = self._result(name, body)
         abstract = "Swig::DirectorPureVirtualException::raise(" in body
@@ -456,11 +486,13 @@ class Wrapper:
             return self.container_in(ctype)
         if "swig::SwigPyIterator::descriptor()" in segment:
             return self.member_type(ctype, True)
-        pointer = re.search(r"SWIG_ConvertPtr\(%s, ?(?:&argp|SWIG_as_voidptrptr\(&arg)(\d+)\)?, ?(SWIGTYPE_\w+)"
-                            % re.escape(obj), segment)
+        pointer = re.search(
+            r"SWIG_ConvertPtr\(%s, ?(?:&argp|SWIG_as_voidptrptr\(&arg)(\d+)\)?, ?(SWIGTYPE_\w+)" % re.escape(obj),
+            segment,
+        )
         if pointer:
             number = pointer.group(1)
-            cls = self.class_of(pointer.group(2)[len("SWIGTYPE_"):])
+            cls = self.class_of(pointer.group(2)[len("SWIGTYPE_") :])
             if self._refuses_null(body, number):
                 return cls
             return "%s | None" % cls
@@ -473,25 +505,37 @@ class Wrapper:
         lines = body.split("\n")
         check = re.compile(r"if \(!argp?%s(\)| \|\|)" % number)
         for n, line in enumerate(lines):
-            if check.search(line) and "SWIG_ValueError" in " ".join(lines[n:n + 3]):
+            if check.search(line) and "SWIG_ValueError" in " ".join(lines[n : n + 3]):
                 return True
         # An array member's setter copies from the pointer, refusing a null.
-        return bool(re.search(r"if \(arg%s\) \{.*?\} else \{\s*SWIG_exception_fail\(SWIG_ValueError, "
-                              r"\"invalid null reference \" \"in variable" % number, body, re.S))
+        return bool(
+            re.search(
+                r"if \(arg%s\) \{.*?\} else \{\s*SWIG_exception_fail\(SWIG_ValueError, "
+                r"\"invalid null reference \" \"in variable" % number,
+                body,
+                re.S,
+            )
+        )
 
     def _result(self, name, body):
-        returned = [" ".join(statement.split()) for statement in re.findall(r"^\s*(resultobj = [^;]*;)", body, re.M)
-                    if not statement.startswith("resultobj = 0")]
+        returned = [
+            " ".join(statement.split())
+            for statement in re.findall(r"^\s*(resultobj = [^;]*;)", body, re.M)
+            if not statement.startswith("resultobj = 0")
+        ]
         outputs = [line for line in returned if line.startswith("resultobj = SWIG_Python_AppendOutput(")]
         main = [line for line in returned if line not in outputs]
         # The OUTPUT typemaps' pointer branch: their temporaries are always
         # SWIG_TMPOBJ, so the number is what is appended.
-        outputs = [line for line in outputs if not re.search(r"SWIG_NewPointerObj\(\(void\*\)\(arg\d+\), \w+, new_flags\)",
-                                                             line)]
+        outputs = [
+            line
+            for line in outputs
+            if not re.search(r"SWIG_NewPointerObj\(\(void\*\)\(arg\d+\), \w+, new_flags\)", line)
+        ]
         if not main:
             raise StubError("%s: no result" % name)
         result = self._main_result(name, body, main[0])
-        if "Py_BuildValue(\"(iN)\"" in body:
+        if 'Py_BuildValue("(iN)"' in body:
             # WidgetResult: (status, ((name, (v0, v1, v2, v3)), ...))
             result = "tuple[int, tuple[tuple[str, tuple[float, float, float, float]], ...]]"
         if "resultobj = list.release();" in body:
@@ -525,8 +569,8 @@ class Wrapper:
         if line.startswith("resultobj = SWIG_FromCharPtr("):
             if name.endswith("___repr__"):
                 helper = re.search(r"result = \(char \*\)(\w+)\((?:\([^)]*\))?arg1\)", body)
-                helper_body = self.source[self.source.index("SWIGINTERN char const *%s(" % helper.group(1)):]
-                if "static char text[" in helper_body[:helper_body.index("\n}\n")]:
+                helper_body = self.source[self.source.index("SWIGINTERN char const *%s(" % helper.group(1)) :]
+                if "static char text[" in helper_body[: helper_body.index("\n}\n")]:
                     return "str"  # %record_repr: the class's buffer, never null
             return "str | None"
         if line.startswith("resultobj = SWIG_FromCharPtrAndSize("):
@@ -542,30 +586,40 @@ class Wrapper:
         if line.startswith("resultobj = SWIG_NewPointerObj(swig::container_position(arg1, "):
             container = re.search(r"argument \" \"1\"\" of type '\" \"([^\"]*) \*\"\"'", body).group(1)
             return "SwigPyIterator[%s]" % self.iterated(container, name)
-        kept = re.match(r"resultobj = SWIG_NewPointerObj\((?:new pid_t\(result\)|&shared_allocator), "
-                        r"SWIGTYPE_(p_\w+), .*\);", line)
+        kept = re.match(
+            r"resultobj = SWIG_NewPointerObj\((?:new pid_t\(result\)|&shared_allocator), "
+            r"SWIGTYPE_(p_\w+), .*\);",
+            line,
+        )
         if kept:
             return self.class_of(kept.group(1))  # a new copy, or the module's own: never null
         pointer = re.match(r"resultobj = SWIG_NewPointerObj\((.*), SWIGTYPE_(p_\w+|\w+),\s*(.*)\);", line)
         if pointer is None:
-            pointer = re.match(r"resultobj = SWIG_NewPointerObj\((.*), (swig::SwigPyIterator::descriptor\(\)),\s*(.*)\);",
-                               line)
+            pointer = re.match(
+                r"resultobj = SWIG_NewPointerObj\((.*), (swig::SwigPyIterator::descriptor\(\)),\s*(.*)\);", line
+            )
         if pointer:
             value, mangled, flags = pointer.groups()
             if "SWIG_POINTER_NEW" in flags:
                 return "_SwigPyObject"  # a constructor's new object, before its proxy takes it
             if mangled == "p_swig__SwigPyIterator":
                 self_type = re.search(r"argument \" \"1\"\" of type '\" \"([^\"]*)\"\"'", body)
-                element = self.iterated(self_type.group(1), name) if self_type and self.container(
-                    self_type.group(1)) else "_T"
+                element = (
+                    self.iterated(self_type.group(1), name)
+                    if self_type and self.container(self_type.group(1))
+                    else "_T"
+                )
                 return "SwigPyIterator[%s]" % element  # SWIG's iterators are always new objects
             cls = self.class_of(mangled)
             if value.startswith("(new ") or value.startswith("new "):
                 return cls
             made = re.search(r"result = \([^;]*?\)(.*);", body)
             assignment = made.group(1) if made else ""
-            if assignment.startswith("&") or assignment.startswith("new ") or re.match(
-                    r"\(\w+ \*\) \(\(arg1\)->", assignment):
+            if (
+                assignment.startswith("&")
+                or assignment.startswith("new ")
+                or re.match(r"\(\w+ \*\) \(\(arg1\)->", assignment)
+            ):
                 return cls  # a member's address, a new object, an array member
             if assignment.startswith("std_vector_Sl_") or assignment.startswith("std_map_Sl_"):
                 if any(re.match(r"std::(vector|map)<.*>\*$", normalise(t)) for t in self.type_names[mangled]):
@@ -597,8 +651,14 @@ def parameter_names(companion_with_docs):
         return found
 
     def called(node):
-        calls = [n for n in ast.walk(node) if isinstance(n, ast.Call) and isinstance(n.func, ast.Attribute)
-                 and isinstance(n.func.value, ast.Name) and n.func.value.id == "_renderlib"]
+        calls = [
+            n
+            for n in ast.walk(node)
+            if isinstance(n, ast.Call)
+            and isinstance(n.func, ast.Attribute)
+            and isinstance(n.func.value, ast.Name)
+            and n.func.value.id == "_renderlib"
+        ]
         return [c.func.attr for c in calls]
 
     def record(flat, lines, drop_self=False, prefix=()):
@@ -622,8 +682,11 @@ def parameter_names(companion_with_docs):
                     else:
                         for flat in flats:
                             record(flat, prototypes(item))
-                if isinstance(item, ast.Assign) and isinstance(item.value, ast.Call) and getattr(
-                        item.value.func, "id", None) == "property":
+                if (
+                    isinstance(item, ast.Assign)
+                    and isinstance(item.value, ast.Call)
+                    and getattr(item.value.func, "id", None) == "property"
+                ):
                     attribute = item.targets[0].id
                     accessors = [a.attr for a in item.value.args if isinstance(a, ast.Attribute)]
                     if accessors:
@@ -683,7 +746,8 @@ def merge_defaults(signatures):
         return signatures
     for sig in signatures:
         if sig.result != longest.result or [a.type for a in sig.args] != [
-                a.type for a in longest.args[:len(sig.args)]]:
+            a.type for a in longest.args[: len(sig.args)]
+        ]:
             return signatures
     args = [replace(a, default=n >= shortest) for n, a in enumerate(longest.args)]
     return [replace(longest, args=args)]
@@ -729,8 +793,10 @@ def render_function(name, signatures, indent="", leading=(), decorators=(), drop
 
 def substitute(signatures, old, new):
     pattern = re.compile(r"\b%s\b(?!\[)" % re.escape(old))
-    return [replace(s, result=pattern.sub(new, s.result),
-                    args=[replace(a, type=pattern.sub(new, a.type)) for a in s.args]) for s in signatures]
+    return [
+        replace(s, result=pattern.sub(new, s.result), args=[replace(a, type=pattern.sub(new, a.type)) for a in s.args])
+        for s in signatures
+    ]
 
 
 def unbound_element(signatures):
@@ -765,8 +831,13 @@ def tidy(text):
     for line in text.split("\n"):
         kind = None
         if line and not line[0].isspace() and not line.startswith(("#", ")")):
-            kind = "class" if line.startswith(("class ", "@type_check_only")) else "def" if re.match(
-                r"(def |@)", line) else "other"
+            kind = (
+                "class"
+                if line.startswith(("class ", "@type_check_only"))
+                else "def"
+                if re.match(r"(def |@)", line)
+                else "other"
+            )
         if kind and previous and kind != previous and out and out[-1] != "" and not out[-1].startswith("@"):
             out.append("")
         if kind == "class" and len(out) > 1 and out[-1] == "" and out[-2] != "":
@@ -877,8 +948,11 @@ def companion_stub(wrapper, names, companion):
         return with_self_type(name, sigs, cls)
 
     for node in tree.body:
-        if isinstance(node, ast.Assign) and isinstance(node.value, ast.Attribute) and getattr(
-                node.value.value, "id", None) == "_renderlib":
+        if (
+            isinstance(node, ast.Assign)
+            and isinstance(node.value, ast.Attribute)
+            and getattr(node.value.value, "id", None) == "_renderlib"
+        ):
             target = node.targets[0].id
             if not target.startswith("_") or target.startswith("__") or target in wrapper.constants:
                 if target in wrapper.constants:
@@ -897,8 +971,12 @@ def companion_stub(wrapper, names, companion):
 def forwarded(function):
     """The flat function a companion function or method calls."""
     for node in ast.walk(function):
-        if isinstance(node, ast.Call) and isinstance(node.func, ast.Attribute) and getattr(
-                node.func.value, "id", None) == "_renderlib" and not node.func.attr.endswith("_swiginit"):
+        if (
+            isinstance(node, ast.Call)
+            and isinstance(node.func, ast.Attribute)
+            and getattr(node.func.value, "id", None) == "_renderlib"
+            and not node.func.attr.endswith("_swiginit")
+        ):
             return node.func.attr
     return None
 
@@ -925,8 +1003,12 @@ def proxy_class(wrapper, node, flat):
             target = item.targets[0].id
             value = item.value
             if target == "thisown":
-                body += ["    @property", "    def thisown(self) -> bool: ...", "    @thisown.setter",
-                         "    def thisown(self, value: bool) -> None: ..."]
+                body += [
+                    "    @property",
+                    "    def thisown(self) -> bool: ...",
+                    "    @thisown.setter",
+                    "    def thisown(self, value: bool) -> None: ...",
+                ]
             elif target == "__repr__":
                 body.append("    def __repr__(self) -> str: ...")
             elif target == "__swig_destroy__":
@@ -977,8 +1059,11 @@ def proxy_method(wrapper, cls, item, methods, flat):
         if "No constructor defined" in source:
             # The engine makes these; calling the class raises AttributeError.
             return ["    def __init__(self, no_constructor: Never, /) -> None: ..."]
-        target = next(n.func.attr for n in ast.walk(item) if isinstance(n, ast.Call) and isinstance(
-            n.func, ast.Attribute) and n.func.attr.startswith("new_"))
+        target = next(
+            n.func.attr
+            for n in ast.walk(item)
+            if isinstance(n, ast.Call) and isinstance(n.func, ast.Attribute) and n.func.attr.startswith("new_")
+        )
         sigs = [replace(s, result="None") for s in flat(target, cls)]
         director = "_self" in source
         return render_function("__init__", sigs, "    ", leading=("self",), drop_first=director, forwards=True)
@@ -1026,8 +1111,13 @@ def main(argv=None):
     parser = argparse.ArgumentParser(description=__doc__.split("\n\n")[0])
     parser.add_argument("--out", required=True, type=Path, help="folder to write the stubs into")
     parser.add_argument("--swig", default=default_swig(), help="SWIG %s executable" % SWIG_VERSION)
-    parser.add_argument("-I", dest="includes", action="append", metavar="DIR",
-                        help="folder of the engine's headers, as the build gives SWIG (engine-api/ if none)")
+    parser.add_argument(
+        "-I",
+        dest="includes",
+        action="append",
+        metavar="DIR",
+        help="folder of the engine's headers, as the build gives SWIG (engine-api/ if none)",
+    )
     parser.add_argument("--work", help="folder for SWIG's output (a temporary one if not given)")
     args = parser.parse_args(argv)
     if not args.swig:

@@ -2,6 +2,7 @@
 engine, while the engine is still using it; callback classes a host writes
 as null objects; engine vectors a drawing method keeps. Each runs in a
 process of its own: the faults these guard against crash the interpreter."""
+
 import textwrap
 
 import pytest
@@ -44,7 +45,8 @@ def test_a_drawing_object_that_uninstalls_and_drops_itself_mid_draw_lives_to_the
 
 
 def test_replacing_the_drawing_object_from_another_thread_during_draws():
-    out = run("""
+    out = run(
+        """
         calls = []  # (operation, drawing object): objects change, and only where a pass starts
 
         class Slow(SvgDrawing):
@@ -73,7 +75,9 @@ def test_replacing_the_drawing_object_from_another_thread_during_draws():
         _renderlib.tarsel_set_gfx_impl(None)
         changes = {name for (name, this), (_, before) in zip(calls[1:], calls) if this != before}
         print([name for name, _ in calls].count("end_drawing"), changes == {"set_graphics_context"})
-    """, timeout=60)
+    """,
+        timeout=60,
+    )
     assert out == ["200 True"]
 
 
@@ -106,11 +110,13 @@ def test_a_frame_source_that_lets_go_of_itself_in_load_frame_keeps_its_frame_for
     assert out == ["[0.25] True"]
 
 
-@pytest.mark.parametrize("kind, install", [("GfxInterface", "tarsel_set_gfx_impl"),
-                                           ("LoadFrameInterface", "set_load_frame_impl")])
+@pytest.mark.parametrize(
+    "kind, install", [("GfxInterface", "tarsel_set_gfx_impl"), ("LoadFrameInterface", "set_load_frame_impl")]
+)
 def test_a_callback_class_with_a_catch_all_getattr_is_made_and_installed(kind, install):
     # And objects that only look like one are refused.
-    out = run("""
+    out = run(
+        """
         class Anything:  # its this is made on the spot
             def __getattr__(self, name):
                 return lambda *args: 0
@@ -129,7 +135,9 @@ def test_a_callback_class_with_a_catch_all_getattr_is_made_and_installed(kind, i
                 _renderlib.%(install)s(thing)
             except TypeError as error:
                 print(error)
-    """ % {"kind": kind, "install": install})
+    """
+        % {"kind": kind, "install": install}
+    )
     assert out == ["SwigPyObject True"] + ["in method '%s', argument 1 of type '%s *'" % (install, kind)] * 4
 
 

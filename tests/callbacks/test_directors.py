@@ -1,6 +1,7 @@
 """Python subclasses of the callback classes: calls through the module's
 method wrappers, and hand-over to the native side. (Every wrapper's failure
 paths, the abstract bases' included, and reference counts: tests/core.)"""
+
 import gc
 import weakref
 
@@ -26,9 +27,13 @@ def test_the_method_wrappers_dispatch_to_the_python_override():
     assert _renderlib.GfxInterface_get_text_length_in_pixels(drawing.this, "abcd") == 24
     xs, ys = renderlib.float_vector([1, 2]), renderlib.float_vector([3, 4])
     _renderlib.GfxInterface_lines(drawing.this, xs, ys)
-    assert drawing.calls == [("line", (1.0, 2.0, 3.5, 4.0)), ("stipple_pattern", (0xF0F0,)),
-                             ("draw_text", ("caf\xe9", 5.0, 6.0)), ("get_text_length_in_pixels", ("abcd",)),
-                             ("lines", ((1.0, 2.0), (3.0, 4.0)))]
+    assert drawing.calls == [
+        ("line", (1.0, 2.0, 3.5, 4.0)),
+        ("stipple_pattern", (0xF0F0,)),
+        ("draw_text", ("caf\xe9", 5.0, 6.0)),
+        ("get_text_length_in_pixels", ("abcd",)),
+        ("lines", ((1.0, 2.0), (3.0, 4.0))),
+    ]
     assert list(xs) == [2, 4] and list(ys) == [3, 4]
 
 

@@ -1,6 +1,7 @@
 """The engine fetching other frames from a Python frame source during a
 render: from its own threads while the render call waits without the
 interpreter lock, with the descriptors and pixels handed back."""
+
 import gc
 import threading
 import weakref
@@ -93,20 +94,23 @@ def test_frames_come_from_engine_threads_at_the_engines_size_and_are_used(effect
     expected = numpy.empty_like(result)
     expected[:] = (current + 0.5 * nine + 0.25 * eight) / 1.75
     if size:  # a smaller frame covers the top-left corner only; elsewhere it is empty
-        expected[size[1]:, :] = expected[:, size[0]:] = current / 1.75
+        expected[size[1] :, :] = expected[:, size[0] :] = current / 1.75
     numpy.testing.assert_allclose(result, expected, rtol=1e-5)
 
 
-@pytest.mark.parametrize("name, changes, asked", [
-    ("T_TimeBlur", {"frames_before": "2", "frames_after": "1"}, [(0, 8), (0, 9), (0, 11), (1, 8), (1, 9), (1, 11)]),
-    # Trails rebuild their previous output: 0.5 ** 11 is the first weight below 1/1024.
-    ("T_Trails", {"persistence": "0.5"}, [(0, frame) for frame in range(FRAME - 11, FRAME)]),
-])
+@pytest.mark.parametrize(
+    "name, changes, asked",
+    [
+        ("T_TimeBlur", {"frames_before": "2", "frames_after": "1"}, [(0, 8), (0, 9), (0, 11), (1, 8), (1, 9), (1, 11)]),
+        # Trails rebuild their previous output: 0.5 ** 11 is the first weight below 1/1024.
+        ("T_Trails", {"persistence": "0.5"}, [(0, frame) for frame in range(FRAME - 11, FRAME)]),
+    ],
+)
 def test_the_inputs_and_frames_an_effect_asks_for(effect, name, changes, asked):
     source = FrameSource(lambda input, frame: colour(0, frame) if input == 0 else (1, 1, 1, 1))
     _renderlib.set_load_frame_impl(source)
     blur = effect(name, **changes)
-    inputs = [source_frame(), solid_frame((1, 1, 1, 1), WIDTH, HEIGHT)][:len(blur.effect_genotype._get_input_names())]
+    inputs = [source_frame(), solid_frame((1, 1, 1, 1), WIDTH, HEIGHT)][: len(blur.effect_genotype._get_input_names())]
     result = render(blur, inputs)
     assert sorted((input, frame) for input, frame, _, _ in source.requests) == asked
     if name == "T_TimeBlur":
@@ -198,13 +202,20 @@ for source in (Source(sys.argv[1]), Source(sys.argv[1]), Source()):
 """ % dict(ECHO, echoes="4")
 
 
-@pytest.mark.parametrize("failure, cause, message", [
-    ("raises", "LookupError", "frame 8 is not on disk"),
-    ("descriptor", "TypeError", "SWIG director type mismatch in output value of type 'T_RasterInfo'"),
-    ("bytes", "TypeError", "load_frame must return a bytearray, not 'bytes'"),
-    ("unreferenced", "ValueError", "load_frame's bytearray must stay referenced by the host until the render returns"),
-    ("short", "ValueError", "load_frame returned 2047 bytes; its descriptor describes 2048"),
-])
+@pytest.mark.parametrize(
+    "failure, cause, message",
+    [
+        ("raises", "LookupError", "frame 8 is not on disk"),
+        ("descriptor", "TypeError", "SWIG director type mismatch in output value of type 'T_RasterInfo'"),
+        ("bytes", "TypeError", "load_frame must return a bytearray, not 'bytes'"),
+        (
+            "unreferenced",
+            "ValueError",
+            "load_frame's bytearray must stay referenced by the host until the render returns",
+        ),
+        ("short", "ValueError", "load_frame returned 2047 bytes; its descriptor describes 2048"),
+    ],
+)
 def test_a_failed_request_ends_the_render_as_an_abort_caused_by_it(failure, cause, message):
     out = run_cleanly(FAILING, timeout=30, args=[failure]).splitlines()
     in_load_frame = str(failure == "raises")  # the host's own exception comes with its traceback

@@ -1,5 +1,6 @@
 """The engine drawing effect widgets through a Python drawing object, and mouse
 events dragging them."""
+
 import gc
 import weakref
 
@@ -39,23 +40,39 @@ def value_of(effect, canonical_name):
 def swatch(colour, top, label):
     """The drawing of a colour's swatch: filled, with a stippled white outline
     and its label."""
-    return [("color_3f", colour), ("line_width", (1.0,)), ("rect_filled", (10.0, top, 34.0, top + 16)),
-            ("color_3f", (1.0, 1.0, 1.0)), ("stipple_pattern", (0x0F0F,)), ("stipple_on", ()), ("begin_line", ()),
-            ("lines", ((10.0, 34.0, 34.0, 10.0, 10.0), (top, top, top + 16, top + 16, top))),
-            ("end_line", ()), ("stipple_off", ()), ("draw_text", (label, 40.0, top + 14))]
+    return [
+        ("color_3f", colour),
+        ("line_width", (1.0,)),
+        ("rect_filled", (10.0, top, 34.0, top + 16)),
+        ("color_3f", (1.0, 1.0, 1.0)),
+        ("stipple_pattern", (0x0F0F,)),
+        ("stipple_on", ()),
+        ("begin_line", ()),
+        ("lines", ((10.0, 34.0, 34.0, 10.0, 10.0), (top, top, top + 16, top + 16, top))),
+        ("end_line", ()),
+        ("stipple_off", ()),
+        ("draw_text", (label, 40.0, top + 14)),
+    ]
 
 
 def test_one_draw_in_order(instance, drawing):
     draw(instance("T_Gradient"))
     name, (context,) = drawing.calls[0]
     assert name == "set_graphics_context" and context is not None
-    assert drawing.calls[1:] == [("start_drawing", (3,))] + \
-        swatch((0.0, 0.0, 0.0), 10.0, "Start Color") + swatch((1.0, 1.0, 1.0), 34.0, "End Color") + [
+    assert drawing.calls[1:] == [("start_drawing", (3,))] + swatch((0.0, 0.0, 0.0), 10.0, "Start Color") + swatch(
+        (1.0, 1.0, 1.0), 34.0, "End Color"
+    ) + [
         # The centre's handle, its name centred under it by its measured width.
-        ("color_3f", (1.0, 1.0, 0.0)), ("line_width", (1.0,)),
-        ("line", (466.0, 270.0, 494.0, 270.0)), ("line", (480.0, 256.0, 480.0, 284.0)),
-        ("circle", (480.0, 270.0, 10.0)), ("get_text_length_in_pixels", ("Center",)),
-        ("draw_text", ("Center", 468.0, 294.0)), ("flush", ()), ("end_drawing", ())]
+        ("color_3f", (1.0, 1.0, 0.0)),
+        ("line_width", (1.0,)),
+        ("line", (466.0, 270.0, 494.0, 270.0)),
+        ("line", (480.0, 256.0, 480.0, 284.0)),
+        ("circle", (480.0, 270.0, 10.0)),
+        ("get_text_length_in_pixels", ("Center",)),
+        ("draw_text", ("Center", 468.0, 294.0)),
+        ("flush", ()),
+        ("end_drawing", ()),
+    ]
 
 
 def test_widget_pictures_use_every_drawing_operation(instance, drawing):
@@ -109,10 +126,13 @@ def test_events_that_touch_nothing(instance, drawing):
     assert drawing.calls == []  # mouse events draw nothing
 
 
-@pytest.mark.parametrize("operation, cause, message", [
-    ("rect_filled", ZeroDivisionError, "^the host's drawing failed$"),
-    ("get_text_length_in_pixels", TypeError, "^SWIG director type mismatch in output value of type 'long'$"),
-])
+@pytest.mark.parametrize(
+    "operation, cause, message",
+    [
+        ("rect_filled", ZeroDivisionError, "^the host's drawing failed$"),
+        ("get_text_length_in_pixels", TypeError, "^SWIG director type mismatch in output value of type 'long'$"),
+    ],
+)
 def test_a_failed_drawing_call_aborts_the_draw_with_it_as_cause(instance, probe, operation, cause, message):
     class Failing(SvgDrawing):
         def _record(self, name, *args):

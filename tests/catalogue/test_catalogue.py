@@ -1,5 +1,6 @@
 """Both catalogues as the module hands them over, walked completely: every
 effect created, read and freed."""
+
 import pytest
 
 import _renderlib
@@ -7,17 +8,61 @@ import renderlib
 from effect_helpers import all_entries, all_params
 from renderlib import effects
 
-PARAM_ATTRIBUTES = ["ptype", "name", "canonical_name", "n_channels", "n_channels_c1", "use_old_default_p",
-                    "old_default_version_limit", "min_bound", "max_bound", "step", "normalize_scale", "slider_min",
-                    "slider_max", "big_slider_min", "big_slider_max", "param_group", "flags_string"]
-FLAG_ATTRIBUTES = ["wenable_p", "fromfile_popup_p", "screen_mode", "autotrans_type", "hidden_p", "group_start_p",
-                   "group_start_open_p", "group_end_p", "doc_group_p", "needs_input_n", "auto_animation_type",
-                   "dont_publish_p", "builder_disable_p", "builder_disable_one_p"]
-GENOTYPE_ATTRIBUTES = ["name", "flare_param", "disable_gpu", "force_gpu_enable", "force_gpu_disable",
-                       "gpu_disable_reason", "rgba_mode", "rgba_ok_for_inputs", "transform_with_warp",
-                       "alpha_z_source_input", "need_other_frames_p", "use_prev_dest_p", "mask_color_p",
-                       "transition_p", "use_reduce_p", "effect_popup_name", "old_default_effect",
-                       "old_default_version_limit"]
+PARAM_ATTRIBUTES = [
+    "ptype",
+    "name",
+    "canonical_name",
+    "n_channels",
+    "n_channels_c1",
+    "use_old_default_p",
+    "old_default_version_limit",
+    "min_bound",
+    "max_bound",
+    "step",
+    "normalize_scale",
+    "slider_min",
+    "slider_max",
+    "big_slider_min",
+    "big_slider_max",
+    "param_group",
+    "flags_string",
+]
+FLAG_ATTRIBUTES = [
+    "wenable_p",
+    "fromfile_popup_p",
+    "screen_mode",
+    "autotrans_type",
+    "hidden_p",
+    "group_start_p",
+    "group_start_open_p",
+    "group_end_p",
+    "doc_group_p",
+    "needs_input_n",
+    "auto_animation_type",
+    "dont_publish_p",
+    "builder_disable_p",
+    "builder_disable_one_p",
+]
+GENOTYPE_ATTRIBUTES = [
+    "name",
+    "flare_param",
+    "disable_gpu",
+    "force_gpu_enable",
+    "force_gpu_disable",
+    "gpu_disable_reason",
+    "rgba_mode",
+    "rgba_ok_for_inputs",
+    "transform_with_warp",
+    "alpha_z_source_input",
+    "need_other_frames_p",
+    "use_prev_dest_p",
+    "mask_color_p",
+    "transition_p",
+    "use_reduce_p",
+    "effect_popup_name",
+    "old_default_effect",
+    "old_default_version_limit",
+]
 
 
 def test_catalogues_hold_named_categorised_effects():
@@ -72,14 +117,27 @@ def test_every_parameter_type_is_in_the_catalogue(instance):
             types.add(param.ptype)
             if param.ptype == _renderlib.ptype_color:
                 colour_channels.add(param.n_channels)
-    assert {_renderlib.ptype_float, _renderlib.ptype_int, _renderlib.ptype_color, _renderlib.ptype_popup,
-            _renderlib.ptype_boolean, _renderlib.ptype_pushbutton, _renderlib.ptype_string,
-            _renderlib.ptype_label, _renderlib.ptype_flare} <= types
+    assert {
+        _renderlib.ptype_float,
+        _renderlib.ptype_int,
+        _renderlib.ptype_color,
+        _renderlib.ptype_popup,
+        _renderlib.ptype_boolean,
+        _renderlib.ptype_pushbutton,
+        _renderlib.ptype_string,
+        _renderlib.ptype_label,
+        _renderlib.ptype_flare,
+    } <= types
     assert {3, 4} <= colour_channels
 
 
-@pytest.mark.parametrize("lookup, count", [("get_tarsel_plugin_info_i", "get_n_tarsel_effects"),
-                                           ("get_tarsel_builder_info_i", "get_n_tarsel_builder_effects")])
+@pytest.mark.parametrize(
+    "lookup, count",
+    [
+        ("get_tarsel_plugin_info_i", "get_n_tarsel_effects"),
+        ("get_tarsel_builder_info_i", "get_n_tarsel_builder_effects"),
+    ],
+)
 def test_indices_reach_the_engine_unchecked_and_null_becomes_none(probe, lookup, count):
     n = getattr(_renderlib, count)()
     assert probe.calls() == ["%s()" % count]

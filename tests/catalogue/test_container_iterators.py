@@ -2,6 +2,7 @@
 another container, moved past either end or kept after their container went,
 they raise instead of reading or writing freed memory. Each case runs in a
 process of its own, as such a use crashes a module without the checks."""
+
 import pytest
 
 from isolated import run_cleanly
@@ -28,7 +29,9 @@ def report(use):
 
 @pytest.mark.parametrize("vector", sorted(ELEMENTS))
 def test_vector_iterators_refuse_every_use_that_would_leave_the_vector(vector):
-    out = run_cleanly(REPORT + """
+    out = run_cleanly(
+        REPORT
+        + """
 elements = %(elements)s
 v, other = renderlib.%(vector)s(elements), renderlib.%(vector)s(elements)
 kept = v.begin()
@@ -63,7 +66,9 @@ alive = other.begin()
 del other
 gc.collect()
 report(lambda: alive.value() == elements[0])
-""" % {"vector": vector, "elements": ELEMENTS[vector]})
+"""
+        % {"vector": vector, "elements": ELEMENTS[vector]}
+    )
     assert out.splitlines() == [
         "RuntimeError %s changed size since the iterator was made" % vector,
         "RuntimeError %s changed size since the iterator was made" % vector,
@@ -86,7 +91,9 @@ report(lambda: alive.value() == elements[0])
 
 
 def test_value_map_iterators_refuse_a_changed_map():
-    out = run_cleanly(REPORT + """
+    out = run_cleanly(
+        REPORT
+        + """
 values = renderlib.value_map()
 values["a"], values["b"] = [1], [2]
 keys = values.key_iterator()
@@ -109,7 +116,8 @@ items = values.value_iterator()
 report(lambda: next(items))
 values.erase(values.begin())
 report(lambda: list(values))
-""")
+"""
+    )
     assert out.splitlines() == [
         "ok a",
         "RuntimeError value_map changed size since the iterator was made",

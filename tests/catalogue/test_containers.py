@@ -1,5 +1,6 @@
 """The container rules that differ from Python's own lists and dicts. The rest
 of the containers' behaviour is SWIG's stock code and is not re-tested here."""
+
 import random
 
 import pytest
@@ -24,10 +25,12 @@ def test_vector_rules_that_differ_from_lists():
 
 def test_an_element_that_does_not_convert_is_named_by_its_position():
     # For the overloaded constructors too: the element's own message, then where it stands.
-    for make, values, message in ((renderlib.bool_vector, [1, 0], "bool in sequence element 0 "),
-                                  (renderlib.string_vector, ["a", 5], "std::string in sequence element 1 "),
-                                  (renderlib.float_vector, [1.0, "x"], "float in sequence element 1 "),
-                                  (renderlib.param_vector, [None, 3], "Param in sequence element 1 ")):
+    for make, values, message in (
+        (renderlib.bool_vector, [1, 0], "bool in sequence element 0 "),
+        (renderlib.string_vector, ["a", 5], "std::string in sequence element 1 "),
+        (renderlib.float_vector, [1.0, "x"], "float in sequence element 1 "),
+        (renderlib.param_vector, [None, 3], "Param in sequence element 1 "),
+    ):
         with pytest.raises(TypeError) as raised:
             make(values)
         assert str(raised.value) == message
@@ -37,7 +40,9 @@ def test_an_element_that_does_not_convert_is_named_by_its_position():
         with pytest.raises(TypeError, match="^float in sequence element 1 $"):
             assign()
     assert list(v) == [1.0, 2.0] and len(values) == 0  # nothing changed
-    with pytest.raises(TypeError, match="^Wrong number or type of arguments for overloaded function 'new_float_vector'"):
+    with pytest.raises(
+        TypeError, match="^Wrong number or type of arguments for overloaded function 'new_float_vector'"
+    ):
         renderlib.float_vector(object())  # no overload takes it
 
 
@@ -55,8 +60,16 @@ def test_value_map_rules():
         del values["radius"]
 
 
-@pytest.mark.parametrize("vector", [renderlib.bool_vector, renderlib.string_vector, renderlib.float_vector,
-                                    renderlib.genotype_vector, renderlib.param_vector])
+@pytest.mark.parametrize(
+    "vector",
+    [
+        renderlib.bool_vector,
+        renderlib.string_vector,
+        renderlib.float_vector,
+        renderlib.genotype_vector,
+        renderlib.param_vector,
+    ],
+)
 def test_an_empty_vector_has_no_front_back_or_last_element_to_pop(vector):
     empty = vector()
     for method in ("front", "back", "pop_back"):

@@ -1,5 +1,6 @@
 """Effect descriptors, definitions and instances read from the reference
 engine's catalogue."""
+
 import pytest
 
 import _renderlib
@@ -54,14 +55,23 @@ def test_group_names_follow_group_flags(instance):
     ungrouped = [p for p in params if p.param_group < 0]
     assert all(genotype.get_param_group_name(p) == "" for p in ungrouped)
     assert any(p.flags.group_end_p for p in params)
-    _, documented = find(instance, lambda g: any(p.flags.doc_group_p and not p.flags.group_start_p and p.param_group >= 0
-                                                 for p in g._get_params()))
+    _, documented = find(
+        instance,
+        lambda g: any(
+            p.flags.doc_group_p and not p.flags.group_start_p and p.param_group >= 0 for p in g._get_params()
+        ),
+    )
     doc_only = next(p for p in documented._get_params() if p.flags.doc_group_p and not p.flags.group_start_p)
     assert documented.get_param_group_name(doc_only) == ""
-    with pytest.raises(TypeError, match=r"^in method 'Genotype_get_param_group_name', argument 2 of type 'Param const &'$"):
+    with pytest.raises(
+        TypeError, match=r"^in method 'Genotype_get_param_group_name', argument 2 of type 'Param const &'$"
+    ):
         genotype.get_param_group_name(genotype)
-    with pytest.raises(ValueError, match=r"^invalid null reference in method 'Genotype_get_param_group_name', "
-                                         r"argument 2 of type 'Param const &'$"):
+    with pytest.raises(
+        ValueError,
+        match=r"^invalid null reference in method 'Genotype_get_param_group_name', "
+        r"argument 2 of type 'Param const &'$",
+    ):
         genotype.get_param_group_name(None)
 
 
@@ -95,8 +105,12 @@ def test_limits_and_unlimited_bounds(instance):
 
 
 def test_old_defaults_apply_below_their_version_limit(instance):
-    params = [p for n, b in all_entries() for p in all_params(instance(n, b))
-              if p.use_old_default_p and p.ptype == _renderlib.ptype_float]
+    params = [
+        p
+        for n, b in all_entries()
+        for p in all_params(instance(n, b))
+        if p.use_old_default_p and p.ptype == _renderlib.ptype_float
+    ]
     assert params
     param = params[0]
     limit = param.old_default_version_limit

@@ -1,6 +1,7 @@
 """Every field the module reads in place, checked against raw bytes written
 with ctypes at the proxy's address: a wrong offset or bit is the fault that
 nothing else catches."""
+
 import ctypes
 import struct
 
@@ -109,15 +110,27 @@ class StringSlot:
 
 def test_param_members_at_their_offsets():
     param = renderlib.Param("layout", _renderlib.ptype_float, 3)
-    scalars = [("ptype", 8, "<i", 7), ("use_old_default_p", 76, "<h", -3),
-               ("old_default_version_limit", 78, "<h", 0x1234), ("param_group", 208, "<b", -5)]
+    scalars = [
+        ("ptype", 8, "<i", 7),
+        ("use_old_default_p", 76, "<h", -3),
+        ("old_default_version_limit", 78, "<h", 0x1234),
+        ("param_group", 208, "<b", -5),
+    ]
     for name, offset, fmt, value in scalars:
         saved = peek(param, offset, struct.calcsize(fmt))
         poke(param, offset, struct.pack(fmt, value))
         assert getattr(param, name) == value, name
         poke(param, offset, saved)
-    floats = [("min_bound", 80), ("max_bound", 84), ("step", 88), ("normalize_scale", 92), ("slider_min", 192),
-              ("slider_max", 196), ("big_slider_min", 200), ("big_slider_max", 204)]
+    floats = [
+        ("min_bound", 80),
+        ("max_bound", 84),
+        ("step", 88),
+        ("normalize_scale", 92),
+        ("slider_min", 192),
+        ("slider_max", 196),
+        ("big_slider_min", 200),
+        ("big_slider_max", 204),
+    ]
     for i, (_, offset) in enumerate(floats):
         poke(param, offset, struct.pack("<f", 0.5 + i))
     assert [getattr(param, name) for name, _ in floats] == [0.5 + i for i in range(len(floats))]
@@ -148,8 +161,14 @@ def test_genotype_members_at_their_offsets():
     assert peek(genotype, 0, 1336) == bytes(1336)
     poke(genotype, 0, b"N" * 32 + b"overflow")  # 32 bytes, no terminator
     assert genotype.name == "N" * 32
-    ints = [("disable_gpu", 392), ("force_gpu_enable", 396), ("force_gpu_disable", 400),
-            ("gpu_disable_reason", 404), ("rgba_mode", 1224), ("transform_with_warp", 1232)]
+    ints = [
+        ("disable_gpu", 392),
+        ("force_gpu_enable", 396),
+        ("force_gpu_disable", 400),
+        ("gpu_disable_reason", 404),
+        ("rgba_mode", 1224),
+        ("transform_with_warp", 1232),
+    ]
     for i, (_, offset) in enumerate(ints):
         poke(genotype, offset, struct.pack("<i", -100 - i))
     assert [getattr(genotype, name) for name, _ in ints] == [-100 - i for i in range(len(ints))]
@@ -167,8 +186,13 @@ def test_genotype_members_at_their_offsets():
         assert genotype.effect_popup_name == "Menu name"
 
 
-GENOTYPE_BITS = [("need_other_frames_p", 1240, 1), ("use_prev_dest_p", 1240, 2), ("mask_color_p", 1241, 6),
-                 ("transition_p", 1243, 2), ("use_reduce_p", 1244, 0)]
+GENOTYPE_BITS = [
+    ("need_other_frames_p", 1240, 1),
+    ("use_prev_dest_p", 1240, 2),
+    ("mask_color_p", 1241, 6),
+    ("transition_p", 1243, 2),
+    ("use_reduce_p", 1244, 0),
+]
 
 
 @pytest.mark.parametrize("name, byte, bit", GENOTYPE_BITS, ids=[g[0] for g in GENOTYPE_BITS])
@@ -199,4 +223,3 @@ def test_plugin_info_fields_at_their_offsets():
     assert (info.use_prev_dest_p, info.dynamic_genotype_p) == (1, 255)
     with StringSlot(info, 0, b"T_Example"), StringSlot(info, 32, b"Tests"):
         assert (info.plugin_name, info._category) == ("T_Example", "Tests")
-

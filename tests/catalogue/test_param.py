@@ -1,4 +1,5 @@
 """Param made from Python: construction, attributes, overloads, identity."""
+
 import re
 
 import pytest
@@ -11,7 +12,8 @@ CONSTRUCTOR_PROTOTYPES = (
     "  Possible C/C++ prototypes are:\n"
     "    Param::Param(char const *,enum param_type,int,screen_mode)\n"
     "    Param::Param(char const *,enum param_type,int)\n"
-    "    Param::Param(char const *,enum param_type)\n")
+    "    Param::Param(char const *,enum param_type)\n"
+)
 
 
 def test_a_param_made_from_a_name_and_type_has_one_channel_and_the_normal_mode():
@@ -32,8 +34,9 @@ def test_constructor_overloads_and_their_message():
         assert str(raised.value) == CONSTRUCTOR_PROTOTYPES
     with pytest.raises(TypeError) as raised:
         renderlib.Param("x", 1, 1, 0, 0)
-    assert str(raised.value) == ("new_Param expected at most 4 arguments, got 5\nAdditional information:\n"
-                                 + CONSTRUCTOR_PROTOTYPES)
+    assert str(raised.value) == (
+        "new_Param expected at most 4 arguments, got 5\nAdditional information:\n" + CONSTRUCTOR_PROTOTYPES
+    )
 
 
 def test_name_assignment():
@@ -83,7 +86,8 @@ def test_overloaded_methods_and_strict_booleans():
         "Wrong number or type of arguments for overloaded function 'Param_to_string'.\n"
         "  Possible C/C++ prototypes are:\n"
         "    Param::to_string(RenderContext *,bool)\n"
-        "    Param::to_string(RenderContext *)\n")
+        "    Param::to_string(RenderContext *)\n"
+    )
 
 
 def test_engine_members_of_a_param_made_from_python():

@@ -1,4 +1,5 @@
 """The engine's free parameter queries, called with pointer proxies."""
+
 import pytest
 
 import _renderlib
@@ -43,6 +44,8 @@ def test_node_flags_and_text(instance):
 
 def test_popup_names_through_a_pointer(instance):
     param = a_param(instance, lambda p: p.flags.fromfile_popup_p)
-    with pytest.raises(TypeError, match=r"^in method 'tarsel_get_fromfile_popup_names', argument 2 of type 'char \*\*\*'$"):
+    with pytest.raises(
+        TypeError, match=r"^in method 'tarsel_get_fromfile_popup_names', argument 2 of type 'char \*\*\*'$"
+    ):
         _renderlib.tarsel_get_fromfile_popup_names(param, [])
     assert _renderlib.tarsel_get_fromfile_popup_names(param, None) == len(param.get_fromfile_popup_names())

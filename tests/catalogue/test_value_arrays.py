@@ -1,4 +1,5 @@
 """ValueArray and ShortInputArray: fixed arrays overlaying engine records."""
+
 import ctypes
 import math
 
@@ -49,9 +50,13 @@ def test_data_is_a_pointer_and_assigning_one_copies_the_elements():
     assert int(source.data) == int(source.this)
     target.data = source.data
     assert list(target) == [0.5, 1.5, 2.5, 3.5]
-    with pytest.raises(ValueError, match=r"^invalid null reference in variable 'data' of type 'float \[MAX_CHANNELS\]'$"):
+    with pytest.raises(
+        ValueError, match=r"^invalid null reference in variable 'data' of type 'float \[MAX_CHANNELS\]'$"
+    ):
         target.data = None
-    with pytest.raises(TypeError, match=r"^in method 'ValueArray_data_set', argument 2 of type 'float \[MAX_CHANNELS\]'$"):
+    with pytest.raises(
+        TypeError, match=r"^in method 'ValueArray_data_set', argument 2 of type 'float \[MAX_CHANNELS\]'$"
+    ):
         target.data = [1.0, 2.0, 3.0, 4.0]
     with pytest.raises(ValueError, match=r"^invalid null reference in variable 'data' of type 'short \[MAX_INPUTS\]'$"):
         renderlib.ShortInputArray().data = None

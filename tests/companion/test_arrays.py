@@ -1,4 +1,5 @@
 """numpy arrays as render buffers: every supported layout, and the refusals."""
+
 import numpy as np
 import pytest
 
@@ -13,8 +14,7 @@ TOP = {"uint8": 255, "uint16": 65535}
 
 def expected(rgba, layout, dtype):
     """The card as the engine stores it in `layout` of `dtype`."""
-    channels = {"R": rgba[..., 0], "G": rgba[..., 1], "B": rgba[..., 2], "A": rgba[..., 3],
-                "L": rgba[..., :3] @ LUMA}
+    channels = {"R": rgba[..., 0], "G": rgba[..., 1], "B": rgba[..., 2], "A": rgba[..., 3], "L": rgba[..., :3] @ LUMA}
     values = np.stack([channels[c] for c in layout], axis=-1)
     if dtype in TOP:
         return np.rint(np.clip(values, 0, 1) * TOP[dtype])
@@ -38,23 +38,27 @@ def test_every_layout_renders_into_its_array(layout, dtype):
     np.testing.assert_allclose(got, expected(card, layout, dtype), atol=tolerance)
 
 
-@pytest.mark.parametrize("channels, pixel_type", [(1, "pixel_l8"), (2, "pixel_la8"), (3, "pixel_rgb8"),
-                                                    (4, "pixel_rgba8")])
+@pytest.mark.parametrize(
+    "channels, pixel_type", [(1, "pixel_l8"), (2, "pixel_la8"), (3, "pixel_rgb8"), (4, "pixel_rgba8")]
+)
 def test_the_default_layout_follows_the_channel_count(channels, pixel_type):
-    array = np.zeros((4, 4, channels)[:2 if channels == 1 else 3], np.uint8)
+    array = np.zeros((4, 4, channels)[: 2 if channels == 1 else 3], np.uint8)
     assert arrays.raster_info_for(array).pixel_type == getattr(_renderlib, pixel_type)
 
 
-@pytest.mark.parametrize("array, layout, error, message", [
-    (np.zeros((8, 8, 4), np.uint8).transpose(1, 0, 2), None, ValueError, "not C-contiguous"),
-    (np.zeros((2, 8, 8, 4), np.uint8), None, ValueError, "not 4-dimensional"),
-    (np.zeros(8, np.uint8), None, ValueError, "not 1-dimensional"),
-    (np.zeros((8, 8, 4), np.int32), None, ValueError, "no RGBA pixels of int32"),
-    (np.zeros((8, 8, 3), np.uint16), "BGR", ValueError, "no BGR pixels of uint16"),
-    (np.zeros((8, 8, 4), np.uint8), "RGB", ValueError, "4 channels do not match layout 'RGB'"),
-    (np.zeros((8, 8, 5), np.uint8), None, ValueError, "5 channels do not match layout None"),
-    (bytearray(256), None, TypeError, "expected a numpy array, got bytearray"),
-])
+@pytest.mark.parametrize(
+    "array, layout, error, message",
+    [
+        (np.zeros((8, 8, 4), np.uint8).transpose(1, 0, 2), None, ValueError, "not C-contiguous"),
+        (np.zeros((2, 8, 8, 4), np.uint8), None, ValueError, "not 4-dimensional"),
+        (np.zeros(8, np.uint8), None, ValueError, "not 1-dimensional"),
+        (np.zeros((8, 8, 4), np.int32), None, ValueError, "no RGBA pixels of int32"),
+        (np.zeros((8, 8, 3), np.uint16), "BGR", ValueError, "no BGR pixels of uint16"),
+        (np.zeros((8, 8, 4), np.uint8), "RGB", ValueError, "4 channels do not match layout 'RGB'"),
+        (np.zeros((8, 8, 5), np.uint8), None, ValueError, "5 channels do not match layout None"),
+        (bytearray(256), None, TypeError, "expected a numpy array, got bytearray"),
+    ],
+)
 def test_arrays_the_engine_cannot_take_are_refused(array, layout, error, message):
     with pytest.raises(error, match=message):
         arrays.raster_info_for(array, layout)
@@ -68,8 +72,13 @@ def test_array_for_allocates_what_the_descriptor_describes(pixel_type):
     assert arrays.raster_info_for(array, arrays.layout_of(info)).pixel_type == pixel_type
 
 
-@pytest.mark.parametrize("field, value, message", [("extra_line_stride_elts", 4, "pads its lines"),
-                                                    ("pixel_type", _renderlib.pixel_rgb10, "no array type for pixel")])
+@pytest.mark.parametrize(
+    "field, value, message",
+    [
+        ("extra_line_stride_elts", 4, "pads its lines"),
+        ("pixel_type", _renderlib.pixel_rgb10, "no array type for pixel"),
+    ],
+)
 def test_array_for_refuses_padded_lines_and_unknown_types(field, value, message):
     info, _ = effects.raster(_renderlib.pixel_rgba8, 7, 5)
     setattr(info, field, value)

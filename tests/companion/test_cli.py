@@ -1,4 +1,5 @@
 """The command line: each command, its one-line errors and its exit codes."""
+
 import pathlib
 import subprocess
 import sys
@@ -32,8 +33,22 @@ def test_render_reads_inputs_and_writes_every_tiff_depth(capsys, tmp_path):
     write_image(tmp_path / "in.tif", source, "16")
     for depth, dtype in (("8", np.uint8), ("16", np.uint16), ("float", np.float32)):
         out = tmp_path / ("out-%s.tif" % depth)
-        status, _, err = run(capsys, "render", "T_Transform", "-p", "position=24 16", "-i", str(tmp_path / "in.tif"),
-                             "-o", str(out), "--depth", depth, "--colorspace", "linear", "-q")
+        status, _, err = run(
+            capsys,
+            "render",
+            "T_Transform",
+            "-p",
+            "position=24 16",
+            "-i",
+            str(tmp_path / "in.tif"),
+            "-o",
+            str(out),
+            "--depth",
+            depth,
+            "--colorspace",
+            "linear",
+            "-q",
+        )
         assert status == 0, err
         stored = tifffile.imread(out)
         assert stored.dtype == dtype and stored.shape == (32, 48, 4)
@@ -46,27 +61,52 @@ def test_render_reads_inputs_and_writes_every_tiff_depth(capsys, tmp_path):
 def test_a_sequence_input_is_read_frame_by_frame(capsys, tmp_path):
     for frame in range(2):
         write_image(tmp_path / ("in%d.png" % frame), card_frame(40, 24, frame * 12))
-    status, _, err = run(capsys, "render", "T_Transform", "-p", "position=20 12", "-i", str(tmp_path / "in#.png"),
-                         "-o", str(tmp_path / "out#.png"), "-f", "0-1", "--colorspace", "linear", "-q")
+    status, _, err = run(
+        capsys,
+        "render",
+        "T_Transform",
+        "-p",
+        "position=20 12",
+        "-i",
+        str(tmp_path / "in#.png"),
+        "-o",
+        str(tmp_path / "out#.png"),
+        "-f",
+        "0-1",
+        "--colorspace",
+        "linear",
+        "-q",
+    )
     assert status == 0, err
     for frame in range(2):
-        np.testing.assert_array_equal(np.asarray(Image.open(tmp_path / ("out%d.png" % frame))),
-                                      np.asarray(Image.open(tmp_path / ("in%d.png" % frame))))
+        np.testing.assert_array_equal(
+            np.asarray(Image.open(tmp_path / ("out%d.png" % frame))),
+            np.asarray(Image.open(tmp_path / ("in%d.png" % frame))),
+        )
 
 
-@pytest.mark.parametrize("argv, status, message", [
-    (["render", "T_Nothing", "-o", "x.png"], 2, "renderlib: no effect 'T_Nothing' (see: renderlib list"),
-    (["info", "T_Nothing"], 2, "renderlib: no effect 'T_Nothing'"),
-    (["render", "T_Blur", "-o", "x.png", "-p", "nothing=1"], 2, "renderlib: T_Blur has no parameter 'nothing'"),
-    (["render", "T_Blur", "-o", "x.png", "-f", "0-3"], 2, "needs an output pattern such as out.####.png"),
-    (["render", "T_Blur", "-o", "x.png", "-i", "a.png", "-i", "b.png"], 4, "renderlib: cannot read a.png"),
-    (["render", "T_Gradient", "-o", "x.png", "-i", "{card}"], 2, "T_Gradient takes 0 input(s), 1 given"),
-    (["render", "T_Gradient", "-o", "{tmp}/no/such/folder/x.png", "--size", "8x8"], 4, "cannot write"),
-    (["render", "T_Gradient", "-o", "{tmp}/x.png", "--depth", "16", "--size", "8x8"], 2,
-     ".png files are written at 8 bits a channel; use .tif for 16"),
-    (["monitor", "T_Glow", "--mode", "800x600p60", "-q"], 5, "renderlib: connecting preview in 800x600p60 failed: "
-     "EM_errorNotFound"),
-])
+@pytest.mark.parametrize(
+    "argv, status, message",
+    [
+        (["render", "T_Nothing", "-o", "x.png"], 2, "renderlib: no effect 'T_Nothing' (see: renderlib list"),
+        (["info", "T_Nothing"], 2, "renderlib: no effect 'T_Nothing'"),
+        (["render", "T_Blur", "-o", "x.png", "-p", "nothing=1"], 2, "renderlib: T_Blur has no parameter 'nothing'"),
+        (["render", "T_Blur", "-o", "x.png", "-f", "0-3"], 2, "needs an output pattern such as out.####.png"),
+        (["render", "T_Blur", "-o", "x.png", "-i", "a.png", "-i", "b.png"], 4, "renderlib: cannot read a.png"),
+        (["render", "T_Gradient", "-o", "x.png", "-i", "{card}"], 2, "T_Gradient takes 0 input(s), 1 given"),
+        (["render", "T_Gradient", "-o", "{tmp}/no/such/folder/x.png", "--size", "8x8"], 4, "cannot write"),
+        (
+            ["render", "T_Gradient", "-o", "{tmp}/x.png", "--depth", "16", "--size", "8x8"],
+            2,
+            ".png files are written at 8 bits a channel; use .tif for 16",
+        ),
+        (
+            ["monitor", "T_Glow", "--mode", "800x600p60", "-q"],
+            5,
+            "renderlib: connecting preview in 800x600p60 failed: EM_errorNotFound",
+        ),
+    ],
+)
 def test_failures_are_one_line_with_a_reliable_status(capsys, tmp_path, monkeypatch, argv, status, message):
     monkeypatch.chdir(tmp_path)  # nothing may be written, and nowhere but here
     card = tmp_path / "card.png"
@@ -78,9 +118,16 @@ def test_failures_are_one_line_with_a_reliable_status(capsys, tmp_path, monkeypa
     assert sorted(p.name for p in tmp_path.iterdir()) == ["card.png"]
 
 
-@pytest.mark.parametrize("argv", [["render", "T_Blur"], ["render", "T_Blur", "-o", "x", "-f", "5-2"],
-                                  ["render", "T_Blur", "-o", "x", "--size", "0x2"],
-                                  ["render", "T_Blur", "-o", "x", "-p", "radius"], ["frobnicate"]])
+@pytest.mark.parametrize(
+    "argv",
+    [
+        ["render", "T_Blur"],
+        ["render", "T_Blur", "-o", "x", "-f", "5-2"],
+        ["render", "T_Blur", "-o", "x", "--size", "0x2"],
+        ["render", "T_Blur", "-o", "x", "-p", "radius"],
+        ["frobnicate"],
+    ],
+)
 def test_bad_options_are_usage_errors(capsys, argv):
     with pytest.raises(SystemExit) as exited:
         main(argv)
@@ -90,21 +137,24 @@ def test_bad_options_are_usage_errors(capsys, argv):
 
 def test_contact_sheet_renders_every_effect(capsys, tmp_path):
     from renderlib import effects
+
     status, out, err = run(capsys, "contact-sheet", "-o", str(tmp_path), "--size", "64x36", "-q")
     assert (status, out) == (0, ""), err
     names = [e.plugin_name for builder in (False, True) for e in effects.catalogue(builder)]
     assert sorted(p.name for p in tmp_path.iterdir()) == sorted(
-        ["%s.png" % name for name in names] + ["contact-sheet.png", "widgets.png"])
+        ["%s.png" % name for name in names] + ["contact-sheet.png", "widgets.png"]
+    )
     with Image.open(tmp_path / "contact-sheet.png") as sheet:
         rows = (len(names) + 3) // 4
         assert sheet.size == (4 * (64 + 8) + 8, rows * (36 + 22 + 8) + 8)
         # Each cell holds its effect's render.
-        cell = np.asarray(sheet)[8:8 + 36, 8 + 72:8 + 72 + 64]
+        cell = np.asarray(sheet)[8 : 8 + 36, 8 + 72 : 8 + 72 + 64]
         blur = np.asarray(Image.open(tmp_path / ("%s.png" % names[1])).convert("RGB"))
         np.testing.assert_array_equal(cell, blur)
     # The widgets are drawn over the flare's render at twice the size: lines here and there, the render elsewhere.
     from renderlib.images import quantised
     from renderlib.rendering import EffectRenderer
+
     with EffectRenderer("T_LensFlare", None, [lambda f: card_frame(128, 72, f)]) as renderer:
         plain = quantised(renderer.render(12, 128, 72), "8")[..., :3]
     with Image.open(tmp_path / "widgets.png") as widgets:
@@ -116,6 +166,10 @@ def test_the_installed_command_runs_the_same_program(tmp_path):
     command = [str(pathlib.Path(sys.executable).with_name("renderlib"))]
     done = subprocess.run(command + ["info", "T_Nothing"], capture_output=True, text=True, timeout=60)
     assert done.returncode == 2 and done.stderr.startswith("renderlib: no effect 'T_Nothing'")
-    done = subprocess.run(command + ["render", "T_Gradient", "--size", "16x9", "-o", str(tmp_path / "g.png")],
-                          capture_output=True, text=True, timeout=60)
+    done = subprocess.run(
+        command + ["render", "T_Gradient", "--size", "16x9", "-o", str(tmp_path / "g.png")],
+        capture_output=True,
+        text=True,
+        timeout=60,
+    )
     assert done.returncode == 0 and done.stdout == "%s: 1 frame(s) of 16x9\n" % (tmp_path / "g.png")

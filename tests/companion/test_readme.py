@@ -1,4 +1,5 @@
 """The README's host program runs as written."""
+
 import pathlib
 import re
 

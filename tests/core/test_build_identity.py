@@ -1,4 +1,5 @@
 """Version text, build identifiers, colour configuration and the user check."""
+
 import os
 import re
 import subprocess
@@ -18,11 +19,14 @@ def test_module_and_engine_built_together_share_one_identifier():
 
 
 def test_a_module_built_against_a_separately_built_engine_fails_the_check(module_on_separate_engine):
-    script = ("import _renderlib; print(_renderlib.__file__); "
-              "print(_renderlib.check_build_id(), _renderlib.ext_build_id(), _renderlib.get_tarsel_build_id())")
+    script = (
+        "import _renderlib; print(_renderlib.__file__); "
+        "print(_renderlib.check_build_id(), _renderlib.ext_build_id(), _renderlib.get_tarsel_build_id())"
+    )
     env = dict(os.environ, PYTHONPATH=str(module_on_separate_engine))
-    out = subprocess.run([sys.executable, "-c", script], env=env, capture_output=True, text=True, check=True,
-                         timeout=120).stdout
+    out = subprocess.run(
+        [sys.executable, "-c", script], env=env, capture_output=True, text=True, check=True, timeout=120
+    ).stdout
     location, result = out.splitlines()
     assert location.startswith(str(module_on_separate_engine))
     check, module_id, engine_id = result.split()
@@ -69,8 +73,10 @@ def test_user_check_takes_only_encodable_text(bad):
 
 def test_the_version_command_reports_engine_identity_and_user(capsys):
     assert main(["version"]) == 0
-    fields = {key.strip(): value.strip() for key, value in (line.split(":", 1) for line in
-                                                            capsys.readouterr().out.splitlines())}
+    fields = {
+        key.strip(): value.strip()
+        for key, value in (line.split(":", 1) for line in capsys.readouterr().out.splitlines())
+    }
     assert fields["engine version"] == _renderlib.get_tarsel_version_info()
     assert fields["engine build id"] == fields["module build id"] == _renderlib.ext_build_id()
     assert fields["build identity"] == "match"

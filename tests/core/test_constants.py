@@ -1,6 +1,7 @@
 """The constants the module registers at import: the engine's enumerations
 with the engine's values, all of them published again by the companion
 package, and an import that registers without calling the engine."""
+
 import pathlib
 import re
 
@@ -16,8 +17,11 @@ NOT_REGISTERED = {"const_format_tag": "declared without members: Param.format() 
 
 
 def module_constants():
-    return {name: value for name, value in vars(_renderlib).items()
-            if isinstance(value, (int, str)) and not name.startswith("__")}
+    return {
+        name: value
+        for name, value in vars(_renderlib).items()
+        if isinstance(value, (int, str)) and not name.startswith("__")
+    }
 
 
 def engine_enumerations():

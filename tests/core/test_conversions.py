@@ -1,5 +1,6 @@
 """How arguments and results cross the boundary: integers, texts, argument
 counts and proxy objects."""
+
 import re
 
 import pytest
@@ -8,10 +9,17 @@ import _renderlib
 import renderlib
 
 
-@pytest.mark.parametrize("value, error", [
-    (2147483648, OverflowError), (-2147483649, OverflowError), (2 ** 70, OverflowError),
-    (1.0, TypeError), ("1", TypeError), (None, TypeError),
-])
+@pytest.mark.parametrize(
+    "value, error",
+    [
+        (2147483648, OverflowError),
+        (-2147483649, OverflowError),
+        (2**70, OverflowError),
+        (1.0, TypeError),
+        ("1", TypeError),
+        (None, TypeError),
+    ],
+)
 def test_32_bit_int_arguments_take_ints_in_range_only(value, error):
     info = renderlib.T_RasterInfo()
     info.ds_xsize = 7
@@ -50,24 +58,37 @@ def test_unsigned_and_float_ranges(shared_registry):
     with pytest.raises(OverflowError, match=r"argument 1 of type 'float'$"):
         shared_registry.halve(1e39)
     with pytest.raises(TypeError, match=r"argument 1 of type 'float'$"):
-        shared_registry.halve(2 ** 1100)
+        shared_registry.halve(2**1100)
 
 
 # The message of a refused call names the function and, for a count, what it
 # takes (an overload set adds its prototypes); of a refused argument, the
 # first one that fails.
-@pytest.mark.parametrize("call, message", [
-    (lambda helpers: _renderlib.T_RasterInfo_ds_xsize_set(renderlib.T_RasterInfo()),
-     r"^T_RasterInfo_ds_xsize_set expected 2 arguments, got 1$"),
-    (lambda helpers: _renderlib.T_RasterInfo_ds_xsize_set(renderlib.T_RasterInfo(), 1, 2),
-     r"^T_RasterInfo_ds_xsize_set expected 2 arguments, got 3$"),
-    (lambda helpers: helpers.scaled(), r"^scaled expected at least 1 arguments, got 0$"),
-    (lambda helpers: helpers.scaled(1, 2, 3), r"^scaled expected at most 2 arguments, got 3$"),
-    (lambda helpers: helpers.arity(1, 2, 3), r"^arity expected at most 2 arguments, got 3\nAdditional information:\n"
-                                             r"Wrong number or type of arguments for overloaded function 'arity'"),
-    (lambda helpers: helpers.arity(), r"^Wrong number or type of arguments for overloaded function 'arity'"),
-    (lambda helpers: _renderlib.T_RasterInfo_ds_xsize_set(5, "not an int"), r"argument 1 of type 'T_RasterInfo \*'$"),
-])
+@pytest.mark.parametrize(
+    "call, message",
+    [
+        (
+            lambda helpers: _renderlib.T_RasterInfo_ds_xsize_set(renderlib.T_RasterInfo()),
+            r"^T_RasterInfo_ds_xsize_set expected 2 arguments, got 1$",
+        ),
+        (
+            lambda helpers: _renderlib.T_RasterInfo_ds_xsize_set(renderlib.T_RasterInfo(), 1, 2),
+            r"^T_RasterInfo_ds_xsize_set expected 2 arguments, got 3$",
+        ),
+        (lambda helpers: helpers.scaled(), r"^scaled expected at least 1 arguments, got 0$"),
+        (lambda helpers: helpers.scaled(1, 2, 3), r"^scaled expected at most 2 arguments, got 3$"),
+        (
+            lambda helpers: helpers.arity(1, 2, 3),
+            r"^arity expected at most 2 arguments, got 3\nAdditional information:\n"
+            r"Wrong number or type of arguments for overloaded function 'arity'",
+        ),
+        (lambda helpers: helpers.arity(), r"^Wrong number or type of arguments for overloaded function 'arity'"),
+        (
+            lambda helpers: _renderlib.T_RasterInfo_ds_xsize_set(5, "not an int"),
+            r"argument 1 of type 'T_RasterInfo \*'$",
+        ),
+    ],
+)
 def test_a_refused_call_names_the_function_and_what_it_takes(shared_registry, call, message):
     with pytest.raises(TypeError, match=message):
         call(shared_registry)

@@ -5,6 +5,7 @@ fenced blocks, run in page order in one namespace against the reference
 engine. A page must have examples, and must leave the process as it found it:
 no instance, display, image or shared-memory segment of its own left alive,
 no abort request standing, no message handler or drawing object installed."""
+
 import ctypes
 import doctest
 import gc
@@ -44,8 +45,9 @@ def doctest_text(page):
             kept.append(line)
         else:
             if line.lstrip().startswith(">>>"):
-                raise AssertionError("%s:%d: an example in a ```%s block would not run; use ```pycon"
-                                     % (page.name, number, language))
+                raise AssertionError(
+                    "%s:%d: an example in a ```%s block would not run; use ```pycon" % (page.name, number, language)
+                )
             kept.append("")
     assert fence is None, "%s: a fenced block is never closed" % page.name
     return "\n".join(kept) + "\n"
@@ -63,15 +65,17 @@ class LeftBehind:
 
     def counts(self):
         gc.collect()
-        return {"effect instances": self.probe.live_instances(),
-                "monitor displays": self.monitor.qrv_probe_live_displays(),
-                "monitor images": self.monitor.qrv_probe_live_images(),
-                "segments": self.segments()}
+        return {
+            "effect instances": self.probe.live_instances(),
+            "monitor displays": self.monitor.qrv_probe_live_displays(),
+            "monitor images": self.monitor.qrv_probe_live_images(),
+            "segments": self.segments(),
+        }
 
     @staticmethod
     def segments():
         mine = SEGMENTS.glob("%s*%d*" % (SEGMENT_PREFIX, os.getpid()))
-        return sorted(path.name[len(SEGMENT_PREFIX):] for path in mine)
+        return sorted(path.name[len(SEGMENT_PREFIX) :] for path in mine)
 
     def installed(self, entry):
         """Whether the last `entry(...)` call in the engine's log installed something."""
@@ -81,8 +85,7 @@ class LeftBehind:
 
 @pytest.mark.parametrize("page", PAGES, ids=lambda page: page.name)
 def test_page_examples(page, probe):
-    test = doctest.DocTestParser().get_doctest(doctest_text(page), {"__name__": page.stem}, page.name,
-                                               str(page), 0)
+    test = doctest.DocTestParser().get_doctest(doctest_text(page), {"__name__": page.stem}, page.name, str(page), 0)
     assert test.examples, "%s has no examples" % page.name
     left = LeftBehind(probe)
     before = left.counts()
@@ -113,8 +116,7 @@ def test_the_index_links_every_page():
 
 def test_only_pycon_blocks_and_plain_doctest_text_run(tmp_path):
     page = tmp_path / "page.md"
-    page.write_text("Prose.\n\n```pycon\n>>> 1 + 1\n2\n```\n```sh\necho >>> not run\n```\n\n"
-                    "    >>> 2 + 2\n    4\n")
+    page.write_text("Prose.\n\n```pycon\n>>> 1 + 1\n2\n```\n```sh\necho >>> not run\n```\n\n    >>> 2 + 2\n    4\n")
     test = doctest.DocTestParser().get_doctest(doctest_text(page), {}, page.name, str(page), 0)
     # The fence ends the first example's output; each example keeps its line.
     assert [(e.source, e.want, e.lineno) for e in test.examples] == [("1 + 1\n", "2\n", 3), ("2 + 2\n", "4\n", 10)]

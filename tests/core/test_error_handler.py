@@ -1,4 +1,5 @@
 """The engine's message channel and the translation of engine aborts."""
+
 import sys
 import threading
 
@@ -15,7 +16,8 @@ def test_messages_from_an_engine_worker_reach_the_handler_in_order(probe, error_
     # thread (which has no Python thread state) delivers the messages.
     assert probe.emit_from_worker(500, _renderlib.Err_Warning, "grain") == 500
     assert [(level, message) for level, message, _ in received] == [
-        (_renderlib.Err_Warning, "grain %d" % i) for i in range(500)]
+        (_renderlib.Err_Warning, "grain %d" % i) for i in range(500)
+    ]
     assert {thread for _, _, thread in received} != {threading.get_ident()}
 
 
@@ -65,9 +67,23 @@ def test_an_engine_abort_becomes_runtime_error_and_changes_nothing(probe, error_
     assert _renderlib.get_n_tarsel_effects() > 0  # the next call is served
 
 
-@pytest.mark.parametrize("name, arguments", [("get_tarsel_plugin_info_i", (0,))] + [(name, ()) for name in (
-    "get_n_tarsel_effects", "get_n_tarsel_builder_effects", "get_tarsel_version_info", "get_tarsel_build_id",
-    "check_build_id", "get_ocio_path", "tarsel_abort_render", "tarsel_clear_abort")])
+@pytest.mark.parametrize(
+    "name, arguments",
+    [("get_tarsel_plugin_info_i", (0,))]
+    + [
+        (name, ())
+        for name in (
+            "get_n_tarsel_effects",
+            "get_n_tarsel_builder_effects",
+            "get_tarsel_version_info",
+            "get_tarsel_build_id",
+            "check_build_id",
+            "get_ocio_path",
+            "tarsel_abort_render",
+            "tarsel_clear_abort",
+        )
+    ],
+)
 def test_every_engine_call_is_guarded(probe, name, arguments):
     probe.abort_next_call()
     with pytest.raises(RuntimeError, match="^Tarsel Abort$"):
@@ -117,5 +133,12 @@ def test_a_handler_exception_surfaces_from_the_call_whatever_it_returns():
         # The instance the failed call made went with its result.
         print(probe.live_instances() - made)
     """)
-    assert out.splitlines() == ["proxy ValueError", "None ValueError", "bool ValueError", "tuple ValueError",
-                                "engine ValueError", "3", "1"]
+    assert out.splitlines() == [
+        "proxy ValueError",
+        "None ValueError",
+        "bool ValueError",
+        "tuple ValueError",
+        "engine ValueError",
+        "3",
+        "1",
+    ]

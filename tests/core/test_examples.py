@@ -1,4 +1,5 @@
 """The example host programs run to completion against the reference engine."""
+
 import pathlib
 import subprocess
 import sys

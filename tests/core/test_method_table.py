@@ -8,6 +8,7 @@ method table, so the entries are read in place through ctypes (name and
 ml_flags), and the table is walked from its first entry to the terminating
 null entry.
 """
+
 import ast
 import ctypes
 import pathlib
@@ -23,8 +24,12 @@ CONVENTIONS = {0x0001: "METH_VARARGS", 0x0004: "METH_NOARGS", 0x0008: "METH_O"}
 
 
 class PyMethodDef(ctypes.Structure):
-    _fields_ = [("ml_name", ctypes.c_char_p), ("ml_meth", ctypes.c_void_p), ("ml_flags", ctypes.c_int),
-                ("ml_doc", ctypes.c_char_p)]
+    _fields_ = [
+        ("ml_name", ctypes.c_char_p),
+        ("ml_meth", ctypes.c_void_p),
+        ("ml_flags", ctypes.c_int),
+        ("ml_doc", ctypes.c_char_p),
+    ]
 
 
 class PyCFunctionObjectPrefix(ctypes.Structure):
@@ -38,16 +43,20 @@ def read_list(path=LIST_FILE):
     for number, line in enumerate(path.read_text(encoding="utf-8").splitlines(), 1):
         fields = line.split()
         if fields and not fields[0].startswith("#"):
-            assert len(fields) == 2 and fields[1] in CONVENTIONS.values() and fields[0] not in entries, \
+            assert len(fields) == 2 and fields[1] in CONVENTIONS.values() and fields[0] not in entries, (
                 f"{path.name} line {number} is malformed or names a function twice: {line!r}"
+            )
             entries[fields[0]] = fields[1]
     return entries
 
 
 def module_functions():
     """The module's own builtin functions in its dictionary order: {name: function}."""
-    return {name: value for name, value in vars(_renderlib).items()
-            if isinstance(value, types.BuiltinFunctionType) and value.__self__ is _renderlib}
+    return {
+        name: value
+        for name, value in vars(_renderlib).items()
+        if isinstance(value, types.BuiltinFunctionType) and value.__self__ is _renderlib
+    }
 
 
 def method_def(function):
@@ -66,8 +75,9 @@ def table():
     # in one array, ordered by address as the module dictionary is, and the
     # walked entries are the function objects' own.
     functions = module_functions()
-    assert functions and all(method_def(f).ml_name.decode("ascii") == f.__name__ == name
-                             for name, f in functions.items())
+    assert functions and all(
+        method_def(f).ml_name.decode("ascii") == f.__name__ == name for name, f in functions.items()
+    )
     address = ctypes.addressof(method_def(next(iter(functions.values()))))
     entries = []
     while len(entries) <= len(functions):
@@ -76,29 +86,38 @@ def table():
             break
         entries.append((entry.ml_name.decode("ascii"), convention_name(entry.ml_flags)))
         address += ctypes.sizeof(PyMethodDef)
-    assert entries == [(name, convention_name(method_def(f).ml_flags)) for name, f in functions.items()], \
+    assert entries == [(name, convention_name(method_def(f).ml_flags)) for name, f in functions.items()], (
         "the module's functions are not one contiguous array in dictionary order"
+    )
     return entries
 
 
 def test_the_module_s_table_equals_the_list(table):
     listed, found, names = read_list(), dict(table), [name for name, _ in table]
-    report = {"in the list, missing from the module": set(listed) - set(found),
-              "in the module, not in the list": set(found) - set(listed),
-              "wrong calling convention": {f"{name}: listed {listed[name]}, module has {found[name]}"
-                                           for name in set(listed) & set(found) if listed[name] != found[name]},
-              "in the module's table more than once": {name for name in names if names.count(name) > 1}}
-    report = [f"{title} ({len(entries)}):\n    " + "\n    ".join(sorted(entries))
-              for title, entries in report.items() if entries]
+    report = {
+        "in the list, missing from the module": set(listed) - set(found),
+        "in the module, not in the list": set(found) - set(listed),
+        "wrong calling convention": {
+            f"{name}: listed {listed[name]}, module has {found[name]}"
+            for name in set(listed) & set(found)
+            if listed[name] != found[name]
+        },
+        "in the module's table more than once": {name for name in names if names.count(name) > 1},
+    }
+    report = [
+        f"{title} ({len(entries)}):\n    " + "\n    ".join(sorted(entries))
+        for title, entries in report.items()
+        if entries
+    ]
     assert not report, "_renderlib's method table differs from method_table.txt:\n  " + "\n  ".join(report)
 
 
 def test_swig_heads_the_table_and_what_a_host_makes_it_can_delete(table):
     names = [name for name, _ in table]
     assert table[0] == ("SWIG_PyInstanceMethod_New", "METH_O")  # SWIG 4.0.2 heads every table with its own
-    made = {name[len("new_"):] for name in names if name.startswith("new_")}
-    assert made == {name[:-len("_swiginit")] for name in names if name.endswith("_swiginit")}
-    assert made <= {name[len("delete_"):] for name in names if name.startswith("delete_")}
+    made = {name[len("new_") :] for name in names if name.startswith("new_")}
+    assert made == {name[: -len("_swiginit")] for name in names if name.endswith("_swiginit")}
+    assert made <= {name[len("delete_") :] for name in names if name.startswith("delete_")}
 
 
 def test_the_companion_package_defines_and_registers_the_module_s_classes_in_order(table):
@@ -106,10 +125,14 @@ def test_the_companion_package_defines_and_registers_the_module_s_classes_in_ord
     defined = [node.name for node in tree.body if isinstance(node, ast.ClassDef) and not node.name.startswith("_")]
     registered = []
     for node in tree.body:
-        if isinstance(node, ast.Expr) and isinstance(node.value, ast.Call) and \
-                isinstance(node.value.func, ast.Attribute) and node.value.func.attr.endswith("_swigregister"):
+        if (
+            isinstance(node, ast.Expr)
+            and isinstance(node.value, ast.Call)
+            and isinstance(node.value.func, ast.Attribute)
+            and node.value.func.attr.endswith("_swigregister")
+        ):
             (argument,) = node.value.args
             assert node.value.func.attr == f"{argument.id}_swigregister"
             registered.append(argument.id)
-    in_table = [name[:-len("_swigregister")] for name, _ in table if name.endswith("_swigregister")]
+    in_table = [name[: -len("_swigregister")] for name, _ in table if name.endswith("_swigregister")]
     assert defined == registered == in_table and in_table

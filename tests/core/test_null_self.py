@@ -1,4 +1,5 @@
 """A method called on None (or on a null proxy) raises instead of crashing."""
+
 import pytest
 
 import _renderlib
@@ -11,7 +12,8 @@ def test_every_method_refuses_a_null_object():
     # 13; a call either fails in conversion (TypeError), refuses the null
     # object (ValueError) or, for an operator, answers NotImplemented. Run
     # apart: a crash must not take the test session with it.
-    out = run_cleanly("""
+    out = run_cleanly(
+        """
         import inspect, _renderlib, renderlib
 
         refused, refusals = 0, ("invalid null reference", "no display", "no image")
@@ -34,12 +36,16 @@ def test_every_method_refuses_a_null_object():
                     assert result is NotImplemented, "%s(None, ...) returned %r" % (member, result)
                     break
         print(refused)
-    """, timeout=120)
+    """,
+        timeout=120,
+    )
     assert int(out) > 300  # most members reach the check; the rest refuse None earlier
 
 
 def test_the_refusal_names_function_and_type():
     with pytest.raises(ValueError) as raised:
         _renderlib.T_RasterInfo_ds_xsize_get(None)
-    assert str(raised.value) == \
-        "invalid null reference in method 'T_RasterInfo_ds_xsize_get', argument 1 of type 'T_RasterInfo *'"
+    assert (
+        str(raised.value)
+        == "invalid null reference in method 'T_RasterInfo_ds_xsize_get', argument 1 of type 'T_RasterInfo *'"
+    )

@@ -1,5 +1,6 @@
 """Type sharing between _renderlib and another module on the same registry,
 and the identity rule of engine records."""
+
 import ctypes
 
 import pytest
@@ -37,11 +38,12 @@ def test_records_are_equal_by_native_address_and_hash_by_its_low_bits(shared_reg
     assert hash(other) == low_32_bits_signed(int(other.this))
 
 
-@pytest.mark.parametrize("foreign", [None, 5, "context", renderlib.T_RasterInfo()], ids=repr)
+@pytest.mark.parametrize(
+    "foreign", [None, 5, "context", renderlib.T_RasterInfo()], ids=lambda foreign: type(foreign).__name__
+)
 def test_comparing_a_record_with_anything_else_falls_back_to_python(shared_registry, foreign):
     context = shared_registry.context_handle(0)
     assert (context == foreign) is False
     assert (context != foreign) is True
     assert _renderlib.RenderContext___eq__(context, foreign) is NotImplemented
     assert _renderlib.RenderContext___ne__(context, foreign) is NotImplemented
-

@@ -1,6 +1,7 @@
 """The suite's time limit for each test (tests/time_limit.py), on a small
 suite of its own: a test that hangs holding the interpreter lock fails with
 the stacks of its threads, and the tests after it still run."""
+
 import os
 import subprocess
 import sys
@@ -8,7 +9,7 @@ import textwrap
 
 from isolated import TESTS
 
-HANGING_SUITE = '''
+HANGING_SUITE = """
 import ctypes
 
 
@@ -22,7 +23,7 @@ def test_hangs_holding_the_interpreter_lock():
 
 def test_after():
     pass
-'''
+"""
 
 
 def test_a_test_that_hangs_holding_the_lock_fails_alone_with_its_stacks(tmp_path):
@@ -30,11 +31,27 @@ def test_a_test_that_hangs_holding_the_lock_fails_alone_with_its_stacks(tmp_path
     (tmp_path / "test_hanging.py").write_text(textwrap.dedent(HANGING_SUITE))
     env = dict(os.environ, PYTHONPATH=os.pathsep.join([str(TESTS)] + sys.path), RENDERLIB_TEST_TIME_LIMIT="2")
     env.pop("RENDERLIB_STACK_DUMPS", None)
-    done = subprocess.run([sys.executable, "-m", "pytest", "-q", "-p", "no:cacheprovider", "-n", "1",
-                           "--max-worker-restart=5", str(tmp_path)],
-                          cwd=tmp_path, capture_output=True, text=True, timeout=120, env=env)
+    done = subprocess.run(
+        [
+            sys.executable,
+            "-m",
+            "pytest",
+            "-q",
+            "-p",
+            "no:cacheprovider",
+            "-n",
+            "1",
+            "--max-worker-restart=5",
+            str(tmp_path),
+        ],
+        cwd=tmp_path,
+        capture_output=True,
+        text=True,
+        timeout=120,
+        env=env,
+    )
     assert done.returncode == 1, done.stdout[-3000:]
     assert "1 failed, 2 passed" in done.stdout, done.stdout[-3000:]
-    report = done.stdout[done.stdout.index("crashed while running"):]
+    report = done.stdout[done.stdout.index("crashed while running") :]
     assert "test_hanging.py::test_hangs_holding_the_interpreter_lock ran past its 2 s" in report
-    assert 'line 10 in test_hangs_holding_the_interpreter_lock' in report, report[:3000]
+    assert "line 10 in test_hangs_holding_the_interpreter_lock" in report, report[:3000]

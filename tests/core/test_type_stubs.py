@@ -6,6 +6,7 @@ mypy's stubtest compares them with the modules as installed; mypy --strict
 checks the hand-written modules and a typed host (which also runs here), and
 must find nothing wrong with either; and it checks a host's mistakes, every
 one of which it must report and every one of which fails at run time too."""
+
 import os
 import pathlib
 import pkgutil
@@ -27,7 +28,7 @@ ALLOWLIST = HERE / "stubtest_allowlist.txt"
 
 # A host written against the stubs: every line must type-check under --strict,
 # and the assert_type lines pin what the stubs say the binding gives.
-TYPED_HOST = '''
+TYPED_HOST = """
 from typing_extensions import assert_type
 
 import _renderlib
@@ -95,17 +96,17 @@ def messages_of(name: str) -> list[str]:
     finally:
         _renderlib.set_error_handler(None)
     return seen
-'''
+"""
 
 # A host's mistakes, after a correct start: (statement, mypy's error code,
 # the exception the binding raises for it).
-MISTAKES_START = '''
+MISTAKES_START = """
 import _renderlib
 import renderlib
 
 info = renderlib.T_RasterInfo()
 pixels = bytearray(64)
-'''
+"""
 MISTAKES = [
     # A bool argument takes True and False only.
     ('_renderlib.init_tarsel_effect("T_Gradient", 1)', "arg-type", TypeError),
@@ -119,8 +120,12 @@ MISTAKES = [
     # Records the engine makes have no constructor.
     ("renderlib.EffectGlobals_t()", "call-arg", AttributeError),
     # Pixels are a buffer, not text.
-    ('_renderlib.render_tarsel_effect_to_native_image(None, "", "pixels", 0, 0, 1, 1, [info], [pixels], 1.0, 1,'
-     ' 1.0, 0, 0, 0, 25, False, "srgb", "srgb", "linear")', "arg-type", TypeError),
+    (
+        '_renderlib.render_tarsel_effect_to_native_image(None, "", "pixels", 0, 0, 1, 1, [info], [pixels], 1.0, 1,'
+        ' 1.0, 0, 0, 0, 25, False, "srgb", "srgb", "linear")',
+        "arg-type",
+        TypeError,
+    ),
     # A catalogue entry may be None (past the end, here).
     ("_renderlib.get_tarsel_plugin_info_i(1 << 20).plugin_name", "union-attr", AttributeError),
 ]
@@ -134,8 +139,9 @@ def run(command, cwd, strip_preload=False):
         # A static check loads nothing of the binding: no sanitizer runtime needed.
         for name in ("LD_PRELOAD", "ASAN_OPTIONS", "UBSAN_OPTIONS", "PYTHONMALLOC"):
             env.pop(name, None)
-    return subprocess.run([str(part) for part in command], cwd=cwd, env=env, capture_output=True, text=True,
-                          timeout=300)
+    return subprocess.run(
+        [str(part) for part in command], cwd=cwd, env=env, capture_output=True, text=True, timeout=300
+    )
 
 
 def config(tmp_path):
@@ -150,8 +156,22 @@ def mypy(tmp_path, name, source):
     if source:
         (tmp_path / ("%s.py" % name)).write_text(textwrap.dedent(source))
     options = ["--warn-unreachable", "%s.py" % name] if source else ["--config-file", config(tmp_path), "-p", name]
-    result = run([sys.executable, "-m", "mypy", "--strict", "--no-error-summary", "--show-error-codes", "--no-pretty",
-                  "--cache-dir", tmp_path / "mypy-cache", *options], tmp_path, strip_preload=True)
+    result = run(
+        [
+            sys.executable,
+            "-m",
+            "mypy",
+            "--strict",
+            "--no-error-summary",
+            "--show-error-codes",
+            "--no-pretty",
+            "--cache-dir",
+            tmp_path / "mypy-cache",
+            *options,
+        ],
+        tmp_path,
+        strip_preload=True,
+    )
     errors = []
     for line in result.stdout.splitlines():
         match = MYPY_LINE.match(line)
@@ -165,8 +185,20 @@ def mypy(tmp_path, name, source):
 def test_stubtest_finds_the_stubs_true_to_the_installed_modules(tmp_path):
     # From an empty folder, so that the installed modules and stubs are what
     # is checked, not anything in the working directory.
-    result = run([sys.executable, "-m", "mypy.stubtest", "_renderlib", "renderlib", "--allowlist", ALLOWLIST,
-                  "--mypy-config-file", config(tmp_path)], tmp_path)
+    result = run(
+        [
+            sys.executable,
+            "-m",
+            "mypy.stubtest",
+            "_renderlib",
+            "renderlib",
+            "--allowlist",
+            ALLOWLIST,
+            "--mypy-config-file",
+            config(tmp_path),
+        ],
+        tmp_path,
+    )
     report = result.stdout + result.stderr
     assert result.returncode == 0, report
     checked = re.search(r"Success: no issues found in (\d+) modules", report)
@@ -210,7 +242,9 @@ def test_every_mistake_is_reported_and_fails_at_run_time(tmp_path):
     reported = {(line, code) for line, code, _message in errors}
     missing = sorted(expected - reported)
     assert not missing, "mypy let these through: %s\n%s" % (
-        [MISTAKES[line - first_line][0] for line, _code in missing], result.stdout)
+        [MISTAKES[line - first_line][0] for line, _code in missing],
+        result.stdout,
+    )
     # Nothing else: the correct start is not reported.
     assert all(line >= first_line for line, _code, _message in errors), result.stdout
 

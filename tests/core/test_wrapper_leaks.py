@@ -4,6 +4,7 @@ heap in use and the interpreter's own blocks), the objects handed to the calls
 keep their reference counts, and the engine's and the monitor library's live
 objects come back to their counts. A function added to the module without a
 case here fails test_every_wrapper_is_exercised."""
+
 import ast
 import base64
 import ctypes
@@ -40,12 +41,15 @@ MEASURE_MEMORY = not (UNDER_ADDRESS_SANITIZER or UNDER_VALGRIND)
 # Functions of the module no case calls, and why: SWIG's registration of
 # each proxy class (<Class>_swigregister), run once as renderlib is imported;
 # calling it again would re-register the class.
-NOT_EXERCISED = {name: "SWIG's registration of the proxy class %s" % name[:-len("_swigregister")]
-                 for name in dir(_renderlib) if name.endswith("_swigregister")}
+NOT_EXERCISED = {
+    name: "SWIG's registration of the proxy class %s" % name[: -len("_swigregister")]
+    for name in dir(_renderlib)
+    if name.endswith("_swigregister")
+}
 
 
 STRANGER = type("Stranger", (), {"__doc__": "An argument no wrapper takes."})()
-BIG = 2 ** 40  # outside every 32-bit range
+BIG = 2**40  # outside every 32-bit range
 ANY = object()  # any result will do
 
 
@@ -57,7 +61,9 @@ def text(value):
 
 def stub_text():
     """The extension module's type stubs, which give each function's arity."""
-    return (pathlib.Path(_renderlib.__file__).parent / "_renderlib-stubs" / "__init__.pyi").read_text()  # installed by the build
+    return (
+        pathlib.Path(_renderlib.__file__).parent / "_renderlib-stubs" / "__init__.pyi"
+    ).read_text()  # installed by the build
 
 
 @functools.lru_cache(maxsize=None)
@@ -80,9 +86,12 @@ def module_functions():
 
 # --- The memory of the C heap, the engine and the monitor library ----------
 
+
 class MallInfo2(ctypes.Structure):
-    _fields_ = [(name, ctypes.c_size_t) for name in
-                "arena ordblks smblks hblks hblkhd usmblks fsmblks uordblks fordblks keepcost".split()]
+    _fields_ = [
+        (name, ctypes.c_size_t)
+        for name in "arena ordblks smblks hblks hblkhd usmblks fsmblks uordblks fordblks keepcost".split()
+    ]
 
 
 mallinfo2 = getattr(ctypes.CDLL(None), "mallinfo2", None)  # glibc 2.33 and later
@@ -102,11 +111,16 @@ MONITOR.qrv_probe_set_init_fails.argtypes = MONITOR.qrv_probe_set_no_devices.arg
 
 
 def live_objects():
-    return {"instances": ENGINE.live_instances(), "params": ENGINE.live_params(), "stamps": ENGINE.stamp_count(),
-            "displays+images": (MONITOR.qrv_probe_live_displays(), MONITOR.qrv_probe_live_images())}
+    return {
+        "instances": ENGINE.live_instances(),
+        "params": ENGINE.live_params(),
+        "stamps": ENGINE.stamp_count(),
+        "displays+images": (MONITOR.qrv_probe_live_displays(), MONITOR.qrv_probe_live_images()),
+    }
 
 
 # --- Calling by name ---------------------------------------------------------
+
 
 class Calls:
     """Calls functions of _renderlib by name and remembers which."""
@@ -131,20 +145,27 @@ class Calls:
     # result itself (None, a bool and NotImplemented the very object).
     def rows(self, *rows):
         for want, name, *args in ((ANY, row) if isinstance(row, str) else row for row in rows):
-            if all(isinstance(w, type) and issubclass(w, BaseException) for w in
-                   (want if isinstance(want, tuple) and want else (want,))):
+            if all(
+                isinstance(w, type) and issubclass(w, BaseException)
+                for w in (want if isinstance(want, tuple) and want else (want,))
+            ):
                 self.fails(want, name, *args)
                 continue
             result = self(name, *args)
-            same = result is want if want is None or want is NotImplemented or isinstance(want, bool) else \
-                result == want
-            assert want is ANY or (want(result) if callable(want) else same), \
-                "%s%.200r gave %.200r, not %.200r" % (name, tuple(args), result, want)
+            same = (
+                result is want if want is None or want is NotImplemented or isinstance(want, bool) else result == want
+            )
+            assert want is ANY or (want(result) if callable(want) else same), "%s%.200r gave %.200r, not %.200r" % (
+                name,
+                tuple(args),
+                result,
+                want,
+            )
             # The same call with a stranger in each later place is refused once
             # the arguments before it are converted (and must leak nothing).
             for at in range(1, len(args)):
                 try:
-                    result = self(name, *args[:at], STRANGER, *args[at + 1:])
+                    result = self(name, *args[:at], STRANGER, *args[at + 1 :])
                 except (TypeError, ValueError, OverflowError, SystemError):
                     continue
                 assert result is NotImplemented, "%s took a stranger as argument %d" % (name, at + 1)
@@ -155,8 +176,12 @@ class Calls:
 
     def on(self, prefix, obj, *rows):
         """rows(), each row (want, member, *arguments) a call of `<prefix>member` on `obj`."""
-        self.rows(*[(want, prefix + member, obj, *args)
-                    for want, member, *args in ((ANY, row) if isinstance(row, str) else row for row in rows)])
+        self.rows(
+            *[
+                (want, prefix + member, obj, *args)
+                for want, member, *args in ((ANY, row) if isinstance(row, str) else row for row in rows)
+            ]
+        )
 
     def aborted(self, name, *args):
         """The engine fails the call: the probe makes its next entry throw."""
@@ -184,14 +209,24 @@ def construct(call, cls, *args):
 def members(call, prefix, obj, write=True, keep=()):
     cls = getattr(renderlib, prefix[:-1])
     if hasattr(_renderlib, prefix + "__eq__"):
-        call.on(prefix, obj, (True, "__eq__", obj), (False, "__ne__", obj), (NotImplemented, "__eq__", STRANGER),
-                (NotImplemented, "__ne__", STRANGER))
+        call.on(
+            prefix,
+            obj,
+            (True, "__eq__", obj),
+            (False, "__ne__", obj),
+            (NotImplemented, "__eq__", STRANGER),
+            (NotImplemented, "__ne__", STRANGER),
+        )
     for name in sorted(dir(_renderlib)):
-        if not name.startswith(prefix) or name.endswith("_swigregister") or arities()[name] != (1, 1) or \
-                isinstance(inspect.getattr_static(cls, name[len(prefix):], None), staticmethod):
+        if (
+            not name.startswith(prefix)
+            or name.endswith("_swigregister")
+            or arities()[name] != (1, 1)
+            or isinstance(inspect.getattr_static(cls, name[len(prefix) :], None), staticmethod)
+        ):
             continue
         value = call(name, obj)
-        setter = name[:-len("get")] + "set"
+        setter = name[: -len("get")] + "set"
         if write and name.endswith("_get") and hasattr(_renderlib, setter) and setter not in keep:
             call.rows((None, setter, obj, value))
             if isinstance(value, int):
@@ -230,13 +265,53 @@ VIEW = (96, 54, 0.0, 0.0, 0.5, 0.5)  # a widget's view: size, offset, centre
 
 
 def render_arguments(effect, dest, rasters, images, frame=0):
-    return [effect, "", dest, frame, 0, 1, 1, rasters, images, 1.0, len(rasters), 1.0, 0, 0, 0, 25, False,
-            LINEAR, LINEAR, LINEAR]
+    return [
+        effect,
+        "",
+        dest,
+        frame,
+        0,
+        1,
+        1,
+        rasters,
+        images,
+        1.0,
+        len(rasters),
+        1.0,
+        0,
+        0,
+        0,
+        25,
+        False,
+        LINEAR,
+        LINEAR,
+        LINEAR,
+    ]
 
 
 def flare_arguments(effect, dest, rasters, images):
-    return [effect, "", 4.0, 4.0, dest, 0, 0, 1, 1, rasters, images, 1.0, len(rasters), 1.0, 0, 0,
-            LINEAR, LINEAR, LINEAR, False]
+    return [
+        effect,
+        "",
+        4.0,
+        4.0,
+        dest,
+        0,
+        0,
+        1,
+        1,
+        rasters,
+        images,
+        1.0,
+        len(rasters),
+        1.0,
+        0,
+        0,
+        LINEAR,
+        LINEAR,
+        LINEAR,
+        False,
+    ]
 
 
 def builder_effect_name():
@@ -250,7 +325,7 @@ def engine_genotypes(call, builder_too=True):
 
 
 def changed(row, at, value):
-    return row[:at] + [value] + row[at + 1:]
+    return row[:at] + [value] + row[at + 1 :]
 
 
 @family
@@ -258,13 +333,17 @@ def records(call, helpers, tmp_path):
     # Every record a host can make on its own: made, each field read and
     # written back, deleted; then the engine's catalogue, walked.
     def step():
-        for cls in [getattr(renderlib, name) for name in
-                    "Plugin_Info Genotype ParamFlags T_RasterInfo T_RenderInfo MessageHeader_t ShmemManager".split()]:
+        for cls in [
+            getattr(renderlib, name)
+            for name in "Plugin_Info Genotype ParamFlags T_RasterInfo T_RenderInfo MessageHeader_t ShmemManager".split()
+        ]:
             record = construct(call, cls)
             members(call, cls.__name__ + "_", record)
             call("delete_" + cls.__name__, record)
-        for count_of, entry in (("get_n_tarsel_effects", "get_tarsel_plugin_info_i"),
-                                ("get_n_tarsel_builder_effects", "get_tarsel_builder_info_i")):
+        for count_of, entry in (
+            ("get_n_tarsel_effects", "get_tarsel_plugin_info_i"),
+            ("get_n_tarsel_builder_effects", "get_tarsel_builder_info_i"),
+        ):
             count = call(count_of)
             assert count > 0
             for i in range(count):
@@ -287,8 +366,9 @@ def engine(call, helpers, tmp_path):
     def step():
         effect = call("init_tarsel_effect", name, False)
         members(call, "EffectGlobals_t_", effect, write=False)
-        call.on("EffectGlobals_t_", effect, (name, "plugin_name_get"), (bool, "_get_shared_params"),
-                (True, "__ne__", kept))
+        call.on(
+            "EffectGlobals_t_", effect, (name, "plugin_name_get"), (bool, "_get_shared_params"), (True, "__ne__", kept)
+        )
         call.rows((TypeError, "EffectGlobals_t__get_genotypes", kept.effect_genotype))
         call.each("tarsel_effect_is_time_varying", (ANY, effect, name, 0), (OverflowError, effect, name, BIG))
         call.each("tarsel_get_gpu_status", (ANY, effect), (ANY, None))
@@ -304,9 +384,16 @@ def engine(call, helpers, tmp_path):
         ENGINE.emit_from_worker(2, _renderlib.Err_Warning, "leak check")
         call("get_tarsel_version_info")
         ENGINE.set_version_text(b"engine \xff\xfe")
-        call.rows((None, "set_error_handler", None), (None, "tarsel_free_all_stamp_collections"),
-                  "tarsel_shutdown_apps", "get_tarsel_version_info", "ext_build_id", "get_tarsel_build_id",
-                  (True, "check_build_id"), (ANY, "SWIG_PyInstanceMethod_New", draw_nothing))
+        call.rows(
+            (None, "set_error_handler", None),
+            (None, "tarsel_free_all_stamp_collections"),
+            "tarsel_shutdown_apps",
+            "get_tarsel_version_info",
+            "ext_build_id",
+            "get_tarsel_build_id",
+            (True, "check_build_id"),
+            (ANY, "SWIG_PyInstanceMethod_New", draw_nothing),
+        )
         call.each("check_user", (True, me), (False, someone), (False, None))
         call.each("shmem_error_to_string", *[(ANY, error) for error in range(7)], (OverflowError, BIG))
         ENGINE.set_version_text(None)
@@ -322,8 +409,13 @@ def engine(call, helpers, tmp_path):
 
 def sample_params(genotypes):
     """A parameter of every type, and of each kind of special one."""
-    return list({(param.ptype, param.n_channels, bool(param.flags.fromfile_popup_p), param.is_point()): param
-                 for genotype in genotypes for param in genotype._get_params()}.values())
+    return list(
+        {
+            (param.ptype, param.n_channels, bool(param.flags.fromfile_popup_p), param.is_point()): param
+            for genotype in genotypes
+            for param in genotype._get_params()
+        }.values()
+    )
 
 
 @family
@@ -343,33 +435,67 @@ def parameters(call, helpers, tmp_path):
             members(call, "Param_", param, keep={"Param_name_set"})
             members(call, "ParamFlags_", call("Param_flags_get", param))
             for values in (call("Param_default_value_get", param), call("Param_old_default_value_get", param)):
-                call.on("ValueArray_", values, (4, "__len__"), (None, "__setitem__", 0, values[0]),
-                        (ANY, "__getitem__", 0))
-            call.on("Param_", param, (ANY, "needs_old_default", 1.0), (ANY, "maybe_set_to_old_default", None, 1.0),
-                    (ANY, "maybe_set_to_old_default", None, 1.0, 0), (ANY, "to_string", None),
-                    (ANY, "to_string", None, True), (ANY, "to_string_const", None))
-            call.rows((ANY, "tarsel_param_to_string", param), (ANY, "tarsel_get_param_title", param, 0, title, 256),
-                      (ANY, "tarsel_get_fromfile_popup_names", param, None),
-                      (ANY, "tarsel_get_param_bounds2", param, 1.0, 0, *pointers, 0))
+                call.on(
+                    "ValueArray_", values, (4, "__len__"), (None, "__setitem__", 0, values[0]), (ANY, "__getitem__", 0)
+                )
+            call.on(
+                "Param_",
+                param,
+                (ANY, "needs_old_default", 1.0),
+                (ANY, "maybe_set_to_old_default", None, 1.0),
+                (ANY, "maybe_set_to_old_default", None, 1.0, 0),
+                (ANY, "to_string", None),
+                (ANY, "to_string", None, True),
+                (ANY, "to_string_const", None),
+            )
+            call.rows(
+                (ANY, "tarsel_param_to_string", param),
+                (ANY, "tarsel_get_param_title", param, 0, title, 256),
+                (ANY, "tarsel_get_fromfile_popup_names", param, None),
+                (ANY, "tarsel_get_param_bounds2", param, 1.0, 0, *pointers, 0),
+            )
         param = params[1]
         # Each Param keeps only its latest cJSON tree: the one before is freed.
-        call.on("Param_", param, (bool, "to_json", None), (ANY, "to_json", None, True),
-                (TypeError, "to_string_const", None, 1), (TypeError, "maybe_set_to_old_default", None, 1.0, -1))
-        call.rows((OverflowError, "tarsel_get_param_title", param, 0, title, -1),
-                  (TypeError, "tarsel_get_fromfile_popup_names", param, []), (TypeError, "new_Param", label, 1.0))
+        call.on(
+            "Param_",
+            param,
+            (bool, "to_json", None),
+            (ANY, "to_json", None, True),
+            (TypeError, "to_string_const", None, 1),
+            (TypeError, "maybe_set_to_old_default", None, 1.0, -1),
+        )
+        call.rows(
+            (OverflowError, "tarsel_get_param_title", param, 0, title, -1),
+            (TypeError, "tarsel_get_fromfile_popup_names", param, []),
+            (TypeError, "new_Param", label, 1.0),
+        )
         # Parameters a host makes: every constructor overload, every setter.
         for more in ((), (2,), (2, _renderlib.screen_mode_screen_center)):
             own = construct(call, renderlib.Param, label, _renderlib.ptype_float, *more)
             members(call, "Param_", own)
-            call.on("Param_", own, (None, "name_set", label), (None, "name_set", None),
-                    (OverflowError, "n_channels_set", 256))
+            call.on(
+                "Param_",
+                own,
+                (None, "name_set", label),
+                (None, "name_set", None),
+                (OverflowError, "n_channels_set", 256),
+            )
             call("delete_Param", own)
         for cls, value, wrong in ((renderlib.ValueArray, 1.5, 1e39), (renderlib.ShortInputArray, 7, 32768)):
             array, other = construct(call, cls), construct(call, cls)
-            call.on(cls.__name__ + "_", array, (bool, "__len__"), (None, "__setitem__", 1, value),
-                    (value, "__getitem__", 1), (IndexError, "__getitem__", 8), (IndexError, "__setitem__", 8, value),
-                    (OverflowError, "__getitem__", -1), (OverflowError, "__setitem__", 0, wrong),
-                    (ValueError, "data_set", None), (TypeError, "data_set", [value]))
+            call.on(
+                cls.__name__ + "_",
+                array,
+                (bool, "__len__"),
+                (None, "__setitem__", 1, value),
+                (value, "__getitem__", 1),
+                (IndexError, "__getitem__", 8),
+                (IndexError, "__setitem__", 8, value),
+                (OverflowError, "__getitem__", -1),
+                (OverflowError, "__setitem__", 0, wrong),
+                (ValueError, "data_set", None),
+                (TypeError, "data_set", [value]),
+            )
             call(cls.__name__ + "_data_set", other, call(cls.__name__ + "_data_get", array))
             for each in (array, other):
                 call("delete_" + cls.__name__, each)
@@ -378,8 +504,10 @@ def parameters(call, helpers, tmp_path):
                 call("ShortInputArray___getitem__", shorts, i)
         for genotype in genotypes:
             members(call, "Genotype_", genotype)
-            call.each("Genotype_get_param_group_name",
-                      *[(ANY, genotype, param) for param in call("Genotype__get_params", genotype)[:3]])
+            call.each(
+                "Genotype_get_param_group_name",
+                *[(ANY, genotype, param) for param in call("Genotype__get_params", genotype)[:3]],
+            )
             call.rows((ANY, "tarsel_any_nodes_get_flag", genotype, 0x20000))
             call.each("add_param_to_list", (0, genotype, 0, collector), (0, genotype, 10_000, collector))
             info = call("Genotype_effect_info_get", genotype)
@@ -395,14 +523,20 @@ def parameters(call, helpers, tmp_path):
 
 @family
 def renders(call, helpers, tmp_path):
-    gradient, blur, flare = made_effects = [call("init_tarsel_effect", text(name), False)
-                                            for name in ("T_Gradient", "T_Blur", "T_LensFlare")]
+    gradient, blur, flare = made_effects = [
+        call("init_tarsel_effect", text(name), False) for name in ("T_Gradient", "T_Blur", "T_LensFlare")
+    ]
     dest_info, dest = effects.raster(_renderlib.pixel_rgba8, 8, 8)
     source_info, source = effects.raster(_renderlib.pixel_rgba8, 8, 8)
     float_info, _ = effects.raster(_renderlib.pixel_rgbaf, 8, 8)
     array = numpy.zeros((8, 8, 4), numpy.float32)
-    rasters, images, alone, nothing_in, floats = [dest_info, source_info], [None, source], [dest_info], [None], \
-        [float_info]
+    rasters, images, alone, nothing_in, floats = (
+        [dest_info, source_info],
+        [None, source],
+        [dest_info],
+        [None],
+        [float_info],
+    )
     wrong_rasters, wrong_images, other_record = (dest_info, source_info), [None, 5], renderlib.T_RenderInfo()
     blurred = render_arguments(blur, dest, rasters, images)
     # An effect that asks the host for other frames, and the hosts' frame sources.
@@ -412,25 +546,44 @@ def renders(call, helpers, tmp_path):
     echoed = render_arguments(echo, echo_dest[1], [echo_dest[0], current[0]], [None, current[1]])
 
     def step():
-        call.rows((True, RENDER, *blurred), (True, RENDER, *render_arguments(gradient, dest, alone, nothing_in)),
-                  (True, RENDER, *render_arguments(gradient, array, floats, nothing_in)),
-                  (True, FLARE, *flare_arguments(flare, dest, alone, nothing_in)),
-                  (OverflowError, RENDER, *render_arguments(blur, dest, rasters, images, frame=BIG)))
+        call.rows(
+            (True, RENDER, *blurred),
+            (True, RENDER, *render_arguments(gradient, dest, alone, nothing_in)),
+            (True, RENDER, *render_arguments(gradient, array, floats, nothing_in)),
+            (True, FLARE, *flare_arguments(flare, dest, alone, nothing_in)),
+            (OverflowError, RENDER, *render_arguments(blur, dest, rasters, images, frame=BIG)),
+        )
         for name, arguments in ((RENDER, render_arguments), (FLARE, flare_arguments)):
-            for wrong in ((dest, wrong_rasters, images), (dest, rasters, wrong_images),
-                          (dest, [other_record], nothing_in)):
+            for wrong in (
+                (dest, wrong_rasters, images),
+                (dest, rasters, wrong_images),
+                (dest, [other_record], nothing_in),
+            ):
                 call.fails(TypeError, name, *arguments(blur, *wrong))
             call.aborted(name, *arguments(blur, dest, rasters, images))
-        call.rows((None, "tarsel_abort_render"), (RuntimeError, RENDER, *blurred), (None, "tarsel_clear_abort"),
-                  (True, RENDER, *blurred))
-        call.rows((None, "set_load_frame_impl", source), (True, RENDER, *echoed),
-                  (None, "set_load_frame_impl", missing), (RuntimeError, RENDER, *echoed),
-                  (None, "set_load_frame_impl", None),
-                  (ValueError, "LoadFrameInterface_load_frame", missing.this, 0, 0, 16, 8),
-                  (TypeError, "LoadFrameInterface_current_raster_info", not_a_descriptor.this, 0),
-                  (RuntimeError, "LoadFrameInterface_load_frame", source, 0, 0, 0, 0))  # the abstract base's own
-        call.on("LoadFrameInterface_", source.this, (lambda pixels: pixels is frame[1], "load_frame", 0, 0, 16, 8),
-                (ANY, "current_raster_info", 0), (OverflowError, "current_raster_info", BIG))
+        call.rows(
+            (None, "tarsel_abort_render"),
+            (RuntimeError, RENDER, *blurred),
+            (None, "tarsel_clear_abort"),
+            (True, RENDER, *blurred),
+        )
+        call.rows(
+            (None, "set_load_frame_impl", source),
+            (True, RENDER, *echoed),
+            (None, "set_load_frame_impl", missing),
+            (RuntimeError, RENDER, *echoed),
+            (None, "set_load_frame_impl", None),
+            (ValueError, "LoadFrameInterface_load_frame", missing.this, 0, 0, 16, 8),
+            (TypeError, "LoadFrameInterface_current_raster_info", not_a_descriptor.this, 0),
+            (RuntimeError, "LoadFrameInterface_load_frame", source, 0, 0, 0, 0),
+        )  # the abstract base's own
+        call.on(
+            "LoadFrameInterface_",
+            source.this,
+            (lambda pixels: pixels is frame[1], "load_frame", 0, 0, 16, 8),
+            (ANY, "current_raster_info", 0),
+            (OverflowError, "current_raster_info", BIG),
+        )
         director_lifetimes(call, StillSource, frame)
 
     def cleanup():
@@ -438,9 +591,37 @@ def renders(call, helpers, tmp_path):
         _renderlib.set_load_frame_impl(None)
         _renderlib.free_tarsel_effect(echo)
 
-    return step, made_effects + [dest_info, dest, source_info, source, float_info, array, rasters, images, alone,
-                                 nothing_in, floats, wrong_rasters, wrong_images, other_record, LINEAR, frame, *frame,
-                                 echo_dest[1], current[1], source, missing, not_a_descriptor, echo, *echoed], cleanup
+    return (
+        step,
+        made_effects
+        + [
+            dest_info,
+            dest,
+            source_info,
+            source,
+            float_info,
+            array,
+            rasters,
+            images,
+            alone,
+            nothing_in,
+            floats,
+            wrong_rasters,
+            wrong_images,
+            other_record,
+            LINEAR,
+            frame,
+            *frame,
+            echo_dest[1],
+            current[1],
+            source,
+            missing,
+            not_a_descriptor,
+            echo,
+            *echoed,
+        ],
+        cleanup,
+    )
 
 
 @family
@@ -479,28 +660,53 @@ def images(call, helpers, tmp_path):
         info.pixel_type = 27  # no such layout
         call.each("make_tarsel_raster_info", (0, info, 10, 5))
         call.each("tarsel_get_native_image_dims", (ANY, info), (ANY, None))
-        call.rows((lambda data: len(data) == 104, "raster_info_to_bytearray", info),
-                  (ValueError, "delete_RenderContext", None))  # a host never owns one
+        call.rows(
+            (lambda data: len(data) == 104, "raster_info_to_bytearray", info),
+            (ValueError, "delete_RenderContext", None),
+        )  # a host never owns one
         call.each("make_tarsel_raster_info_from_bits", (None, info, bits), (ValueError, info, short_bits))
         call.each("make_tarsel_raster_info_from_base64", (None, info, encoded))
-        call.each("base64decode", (ANY, encoded, decoded_at, 120), (ANY, three, None, 0),
-                  (OverflowError, three, decoded_at, BIG))
-        call.on("RenderContext_", first, (True, "__eq__", first), (True, "__ne__", second),
-                (NotImplemented, "__eq__", 3), "__hash__")
-        call.rows((size, *sized), ([8, 1], *resize), (OverflowError, *changed(resize, 3, BIG)), (ANY, *convert),
-                  (ANY, *changed(convert, 1, effect)), (ANY, *comp), (OverflowError, *changed(comp, 5, BIG)),
-                  (None, "set_error_handler", handler), "get_ocio_path")
+        call.each(
+            "base64decode",
+            (ANY, encoded, decoded_at, 120),
+            (ANY, three, None, 0),
+            (OverflowError, three, decoded_at, BIG),
+        )
+        call.on(
+            "RenderContext_",
+            first,
+            (True, "__eq__", first),
+            (True, "__ne__", second),
+            (NotImplemented, "__eq__", 3),
+            "__hash__",
+        )
+        call.rows(
+            (size, *sized),
+            ([8, 1], *resize),
+            (OverflowError, *changed(resize, 3, BIG)),
+            (ANY, *convert),
+            (ANY, *changed(convert, 1, effect)),
+            (ANY, *comp),
+            (OverflowError, *changed(comp, 5, BIG)),
+            (None, "set_error_handler", handler),
+            "get_ocio_path",
+        )
         call.each("set_tarsel_luts", (ANY, lut_path, empty, 1.0), (ANY, missing, empty, 1.0))  # the handler hears it
         call("set_error_handler", None)
         messages.clear()
         index = call(*register)
         assert index >= 0
-        call.rows((None, "tarsel_get_flare_texture_error"), (lambda got: got[0] == 0, "tarsel_get_texture_info", index),
-                  (TypeError, *changed(register, 5, "pixels")), (TypeError, *changed(register, 3, 4.0)),
-                  (OverflowError, *changed(register, 1, BIG)))
+        call.rows(
+            (None, "tarsel_get_flare_texture_error"),
+            (lambda got: got[0] == 0, "tarsel_get_texture_info", index),
+            (TypeError, *changed(register, 5, "pixels")),
+            (TypeError, *changed(register, 3, 4.0)),
+            (OverflowError, *changed(register, 1, BIG)),
+        )
         call.each("tarsel_get_texture_pixels", (16, index, out))
-        call.each("tarsel_load_flare_texture", (lambda i: i >= 0, spot), (lambda i: i < 0, no_spot),
-                  (lambda i: i < 0, None))
+        call.each(
+            "tarsel_load_flare_texture", (lambda i: i >= 0, spot), (lambda i: i < 0, no_spot), (lambda i: i < 0, None)
+        )
         assert call("tarsel_get_flare_texture_error")
         call("tarsel_free_all_flare_textures")
         call.each("tarsel_get_texture_info", (lambda got: got[0] != 0, index), (OverflowError, BIG))
@@ -511,9 +717,35 @@ def images(call, helpers, tmp_path):
         call("free_tarsel_effect", effect)
         _renderlib.tarsel_free_all_flare_textures()
 
-    return step, [source_info, source, dest_info, dest, shown, effect, lut_path, missing, messages, handler, bits,
-                  short_bits, encoded, three, decoded, decoded_at, *contexts, pixels, out, wrong_out, spot, no_spot,
-                  path], cleanup
+    return (
+        step,
+        [
+            source_info,
+            source,
+            dest_info,
+            dest,
+            shown,
+            effect,
+            lut_path,
+            missing,
+            messages,
+            handler,
+            bits,
+            short_bits,
+            encoded,
+            three,
+            decoded,
+            decoded_at,
+            *contexts,
+            pixels,
+            out,
+            wrong_out,
+            spot,
+            no_spot,
+            path,
+        ],
+        cleanup,
+    )
 
 
 def director_lifetimes(call, cls, *args):
@@ -534,10 +766,18 @@ def draw_nothing(self, *args):
 
 # A graphics object that draws nothing and keeps nothing: every method of the
 # interface is its own.
-QuietDrawing = type("QuietDrawing", (renderlib.GfxInterface,), dict(
-    {name: draw_nothing for name, value in vars(renderlib.GfxInterface).items()
-     if callable(value) and not name.startswith("_")},
-    get_text_length_in_pixels=lambda self, text: 6 * len(text)))
+QuietDrawing = type(
+    "QuietDrawing",
+    (renderlib.GfxInterface,),
+    dict(
+        {
+            name: draw_nothing
+            for name, value in vars(renderlib.GfxInterface).items()
+            if callable(value) and not name.startswith("_")
+        },
+        get_text_length_in_pixels=lambda self, text: 6 * len(text),
+    ),
+)
 
 
 def raise_key_error(self, *args):
@@ -553,34 +793,68 @@ def drawing_callbacks(call, helpers, tmp_path):
     flare = call("init_tarsel_effect", text("T_LensFlare"), False)
     words, empty = text("abcd"), text("")
     values, short_values = renderlib.float_vector([96, 54, 0]), [96.0, 54.0]
-    calls = [("set_graphics_context", None), ("set_graphics_context", xs), ("start_drawing", 1), ("end_drawing",),
-             ("begin_line",), ("end_line",), ("line", 1, 2, 3.5, 4), ("lines", xs, ys), ("color_3f", 1.0, 0.5, 0.0),
-             ("stipple_on",), ("stipple_off",), ("stipple_pattern", 0xF0F0), ("line_width", 2.0), ("flush",),
-             ("circle", 1, 2, 3), ("dot", 1, 2, 3), ("rect_filled", 1, 2, 3, 4), ("draw_text", words, 5, 6),
-             ("get_text_length_in_pixels", words)]
-    draw, mouse = ["tarsel_widget_draw", flare, empty, *VIEW, values], \
-        ["tarsel_widget_mouse_event", flare, empty, *VIEW, values, 10, 10, _renderlib.MouseEventType_PRESS]
+    calls = [
+        ("set_graphics_context", None),
+        ("set_graphics_context", xs),
+        ("start_drawing", 1),
+        ("end_drawing",),
+        ("begin_line",),
+        ("end_line",),
+        ("line", 1, 2, 3.5, 4),
+        ("lines", xs, ys),
+        ("color_3f", 1.0, 0.5, 0.0),
+        ("stipple_on",),
+        ("stipple_off",),
+        ("stipple_pattern", 0xF0F0),
+        ("line_width", 2.0),
+        ("flush",),
+        ("circle", 1, 2, 3),
+        ("dot", 1, 2, 3),
+        ("rect_filled", 1, 2, 3, 4),
+        ("draw_text", words, 5, 6),
+        ("get_text_length_in_pixels", words),
+    ]
+    draw, mouse = (
+        ["tarsel_widget_draw", flare, empty, *VIEW, values],
+        ["tarsel_widget_mouse_event", flare, empty, *VIEW, values, 10, 10, _renderlib.MouseEventType_PRESS],
+    )
 
     def step():
-        call.on("GfxInterface_", drawing.this, *[(ANY, *each) for each in calls],
-                (OverflowError, "stipple_pattern", 65536), (ValueError, "lines", None, ys),
-                (TypeError, "lines", [1.0], ys))
-        call.rows((TypeError, "GfxInterface_get_text_length_in_pixels", wrong.this, words),
-                  (KeyError, "GfxInterface_circle", raising.this, 1, 2, 3),
-                  (RuntimeError, "GfxInterface_line", drawing, 0, 0, 1, 1))  # the abstract base's own
+        call.on(
+            "GfxInterface_",
+            drawing.this,
+            *[(ANY, *each) for each in calls],
+            (OverflowError, "stipple_pattern", 65536),
+            (ValueError, "lines", None, ys),
+            (TypeError, "lines", [1.0], ys),
+        )
+        call.rows(
+            (TypeError, "GfxInterface_get_text_length_in_pixels", wrong.this, words),
+            (KeyError, "GfxInterface_circle", raising.this, 1, 2, 3),
+            (RuntimeError, "GfxInterface_line", drawing, 0, 0, 1, 1),
+        )  # the abstract base's own
         fresh = director_lifetimes(call, QuietDrawing)
         call("GfxInterface_flush", fresh.this)
         del fresh
-        call.rows((None, "tarsel_set_gfx_impl", drawing), (ANY, *draw), (ANY, *changed(draw, 9, short_values)),
-                  (ANY, *mouse), (ANY, *changed(changed(mouse, 9, short_values), 12, _renderlib.MouseEventType_DRAG)),
-                  (None, "tarsel_set_gfx_impl", None), (OverflowError, *changed(mouse, 10, BIG)))
+        call.rows(
+            (None, "tarsel_set_gfx_impl", drawing),
+            (ANY, *draw),
+            (ANY, *changed(draw, 9, short_values)),
+            (ANY, *mouse),
+            (ANY, *changed(changed(mouse, 9, short_values), 12, _renderlib.MouseEventType_DRAG)),
+            (None, "tarsel_set_gfx_impl", None),
+            (OverflowError, *changed(mouse, 10, BIG)),
+        )
 
     def cleanup():
         _renderlib.tarsel_set_gfx_impl(None)
         call("free_tarsel_effect", flare)
 
-    return step, [drawing, drawing.this, wrong, wrong.this, raising, raising.this, xs, ys, flare, words, values,
-                  short_values], cleanup
+    return (
+        step,
+        [drawing, drawing.this, wrong, wrong.this, raising, raising.this, xs, ys, flare, words, values, short_values],
+        cleanup,
+    )
 
 
 class StillSource(renderlib.LoadFrameInterface):
@@ -619,10 +893,17 @@ def shared_memory(call, helpers, tmp_path):
     def step():
         server, client = call("ShmemManager_serve", name, size, size), call("ShmemManager_connect", name)
         assert server is not None and client is not None
-        call.on(t, server, (bool, "write_string", message), (bool, "write_string", message, note),
-                (bool, "try_write_string", message), (bool, "timed_write_string", message, 1.0, note),
-                (bool, "write_pybuf", payload), (bool, "try_write_pybuf", payload, note),
-                (bool, "timed_write_pybuf", payload, 1.0))
+        call.on(
+            t,
+            server,
+            (bool, "write_string", message),
+            (bool, "write_string", message, note),
+            (bool, "try_write_string", message),
+            (bool, "timed_write_string", message, 1.0, note),
+            (bool, "write_pybuf", payload),
+            (bool, "try_write_pybuf", payload, note),
+            (bool, "timed_write_pybuf", payload, 1.0),
+        )
         for reserve, *extra in (("reserve_pybuf",), ("try_reserve_pybuf",), ("timed_reserve_pybuf", 1.0)):
             call(t + reserve, server, 16, *extra, note)[:] = sixteen
             assert call(t + "commit", server)
@@ -630,17 +911,36 @@ def shared_memory(call, helpers, tmp_path):
             members(call, "MessageHeader_t_", call(t + "get_msg_header", client))
             reader, *extra = readers[i % len(readers)]
             bytes(call(t + reader, client, *extra))
-        call.on(t, client, (None, "try_read_pybuf"), (None, "timed_read_pybuf", 0.0), (None, "get_msg_header"),
-                (bool, "is_segment_valid"),
-                (lambda error: error != _renderlib.ShmemError_SHMEM_NO_ERROR, "get_last_error"))
-        call.on(t, server, (None, "try_reserve_pybuf", oversized), (operator.not_, "try_write_pybuf", bytes(oversized)),
-                (bool, "client_pid_exists"), "print_stats", "get_server_pid",
-                # A message without the buffer protocol: a SystemError caused by the TypeError.
-                (SystemError, "write_pybuf", STRANGER), (SystemError, "try_write_pybuf", 5),
-                (SystemError, "timed_write_pybuf", message, 1.0),
-                (TypeError, "reserve_pybuf", -1))  # overloaded: no match
-        call.each("ShmemManager_serve", (None, name, size, size),  # served already
-                  (None, other, 16, 16), (None, bad, size, size), (OverflowError, other, -1, 1))  # queues too small
+        call.on(
+            t,
+            client,
+            (None, "try_read_pybuf"),
+            (None, "timed_read_pybuf", 0.0),
+            (None, "get_msg_header"),
+            (bool, "is_segment_valid"),
+            (lambda error: error != _renderlib.ShmemError_SHMEM_NO_ERROR, "get_last_error"),
+        )
+        call.on(
+            t,
+            server,
+            (None, "try_reserve_pybuf", oversized),
+            (operator.not_, "try_write_pybuf", bytes(oversized)),
+            (bool, "client_pid_exists"),
+            "print_stats",
+            "get_server_pid",
+            # A message without the buffer protocol: a SystemError caused by the TypeError.
+            (SystemError, "write_pybuf", STRANGER),
+            (SystemError, "try_write_pybuf", 5),
+            (SystemError, "timed_write_pybuf", message, 1.0),
+            (TypeError, "reserve_pybuf", -1),
+        )  # overloaded: no match
+        call.each(
+            "ShmemManager_serve",
+            (None, name, size, size),  # served already
+            (None, other, 16, 16),
+            (None, bad, size, size),
+            (OverflowError, other, -1, 1),
+        )  # queues too small
         call.each("ShmemManager_connect", (None, missing), (None, None))
         assert call(t + "remove", server)
         client.this.disown()
@@ -666,26 +966,64 @@ def monitor(call, helpers, tmp_path):
 
     def step():
         display = call("EM_DisplayInit")
-        wrap = [d + "EM_XIImageWrapper", display, pixels, 8, 4, 32, frame_name, False,
-                _renderlib.EM_ImageFormat_32BitIntBGRA, 1.0, 2.2, False, True]
+        wrap = [
+            d + "EM_XIImageWrapper",
+            display,
+            pixels,
+            8,
+            4,
+            32,
+            frame_name,
+            False,
+            _renderlib.EM_ImageFormat_32BitIntBGRA,
+            1.0,
+            2.2,
+            False,
+            True,
+        ]
         image = call(*wrap)
-        call.on(d, display, (bool, "devices"), (bool, "device_modes", preview), ([], "device_modes", nowhere),
-                (none, "connect", preview, mode), (640, "get_width", preview), (360, "get_height", preview),
-                # A frame not of the connected mode's size is refused.
-                (lambda error: error != none, "display_frame", preview, image),
-                (not_found, "display_frame", nowhere, image))
-        call.on("EM_XIImage_", image, (8, "getWidth"), (4, "getHeight"), (32, "getRowBytes"), (2, "addRef"),
-                (1, "removeRef"))
+        call.on(
+            d,
+            display,
+            (bool, "devices"),
+            (bool, "device_modes", preview),
+            ([], "device_modes", nowhere),
+            (none, "connect", preview, mode),
+            (640, "get_width", preview),
+            (360, "get_height", preview),
+            # A frame not of the connected mode's size is refused.
+            (lambda error: error != none, "display_frame", preview, image),
+            (not_found, "display_frame", nowhere, image),
+        )
+        call.on(
+            "EM_XIImage_",
+            image,
+            (8, "getWidth"),
+            (4, "getHeight"),
+            (32, "getRowBytes"),
+            (2, "addRef"),
+            (1, "removeRef"),
+        )
         whole = call(*wrap[:2], frame, 640, 360, 640 * 4, *wrap[6:])
         assert call(d + "display_frame", display, preview, whole) == none
         del whole
         call("delete_EM_XIImage", image)
         call.fails(ValueError, "EM_XIImage_getWidth", image)  # its last reference went
         call(*changed(wrap, 6, None))  # the proxy gives its reference back
-        call.rows((TypeError, *changed(wrap, 2, "pixels")), (TypeError, *changed(wrap, 7, 1)),
-                  (OverflowError, *changed(wrap, 3, BIG)), (TypeError, "EM_XIImage_addRef", display))
-        call.on(d, display, (_renderlib.EM_errorParam, "connect", None, mode), (not_found, "connect", nowhere, mode),
-                (none, "disconnect", preview), (0, "get_width", preview))
+        call.rows(
+            (TypeError, *changed(wrap, 2, "pixels")),
+            (TypeError, *changed(wrap, 7, 1)),
+            (OverflowError, *changed(wrap, 3, BIG)),
+            (TypeError, "EM_XIImage_addRef", display),
+        )
+        call.on(
+            d,
+            display,
+            (_renderlib.EM_errorParam, "connect", None, mode),
+            (not_found, "connect", nowhere, mode),
+            (none, "disconnect", preview),
+            (0, "get_width", preview),
+        )
         call.each("release_external_monitor", (None, display), (ValueError, display))  # the second: released already
         call.fails(ValueError, d + "devices", display)
         # The library's fault switches: its start fails; it finds no device.
@@ -704,23 +1042,54 @@ def monitor(call, helpers, tmp_path):
 def vector_calls(call, kind, first, second):
     """Every wrapper of one std::vector instance, with elements `first` and `second`."""
     cls, p = getattr(renderlib, kind), kind + "_"
-    vector, other, three = (construct(call, cls, items) for items in ([first, second, first], [first, second],
-                                                                       [first, second, first]))
+    vector, other, three = (
+        construct(call, cls, items) for items in ([first, second, first], [first, second], [first, second, first])
+    )
     for arguments in ((), (3,), (3, first), (vector,)):
         call("delete_" + kind, construct(call, cls, *arguments))
     call.rows((TypeError, "new_" + kind, STRANGER), ((OverflowError, TypeError), "new_" + kind, -1))
-    call.on(p, vector, (3, "__len__"), (3, "size"), (True, "__bool__"), (True, "__nonzero__"), (False, "empty"),
-            "get_allocator", (ANY, "reserve", 8), (lambda n: n >= 8, "capacity"), (ANY, "append", second),
-            (ANY, "push_back", first), (ANY, "__getitem__", 0), (ANY, "__getitem__", -1),
-            (ANY, "__getitem__", slice(0, 2)), (IndexError, "__getitem__", 99), (ANY, "__setitem__", 0, second),
-            (ANY, "__setitem__", slice(0, 1), [first]), (ANY, "__setitem__", slice(4, 5)),
-            (ValueError, "__setitem__", slice(0, 4, 2), [first]), (ANY, "__delitem__", 0),
-            (ANY, "__delitem__", slice(0, 1)), (IndexError, "__delitem__", 99), (ANY, "__getslice__", 0, 2),
-            (ANY, "__setslice__", 0, 1, [second]), (ANY, "__setslice__", 0, 1), (ANY, "__delslice__", 0, 1),
-            # back, front and pop_back are only ever called on a vector that
-            # has elements: on an empty one they read or free what is not there.
-            (ANY, "append", first), (ANY, "append", second), (ANY, "append", first), (lambda n: n >= 3, "size"), "back",
-            "front", "pop", "pop_back", (ANY, "assign", 3, second), (ANY, "resize", 4), (ANY, "resize", 5, first))
+    call.on(
+        p,
+        vector,
+        (3, "__len__"),
+        (3, "size"),
+        (True, "__bool__"),
+        (True, "__nonzero__"),
+        (False, "empty"),
+        "get_allocator",
+        (ANY, "reserve", 8),
+        (lambda n: n >= 8, "capacity"),
+        (ANY, "append", second),
+        (ANY, "push_back", first),
+        (ANY, "__getitem__", 0),
+        (ANY, "__getitem__", -1),
+        (ANY, "__getitem__", slice(0, 2)),
+        (IndexError, "__getitem__", 99),
+        (ANY, "__setitem__", 0, second),
+        (ANY, "__setitem__", slice(0, 1), [first]),
+        (ANY, "__setitem__", slice(4, 5)),
+        (ValueError, "__setitem__", slice(0, 4, 2), [first]),
+        (ANY, "__delitem__", 0),
+        (ANY, "__delitem__", slice(0, 1)),
+        (IndexError, "__delitem__", 99),
+        (ANY, "__getslice__", 0, 2),
+        (ANY, "__setslice__", 0, 1, [second]),
+        (ANY, "__setslice__", 0, 1),
+        (ANY, "__delslice__", 0, 1),
+        # back, front and pop_back are only ever called on a vector that
+        # has elements: on an empty one they read or free what is not there.
+        (ANY, "append", first),
+        (ANY, "append", second),
+        (ANY, "append", first),
+        (lambda n: n >= 3, "size"),
+        "back",
+        "front",
+        "pop",
+        "pop_back",
+        (ANY, "assign", 3, second),
+        (ANY, "resize", 4),
+        (ANY, "resize", 5, first),
+    )
     at = call(p + "insert", vector, call(p + "begin", vector), first)
     call(p + "insert", vector, at, 2, second)
     call(p + "erase", vector, call(p + "begin", vector))
@@ -736,9 +1105,24 @@ def iterate(call, prefix, sequence):
     """Every wrapper of SWIG's iterator, over a sequence of three."""
     begin, also_begin, end, closed = (call(prefix + name, sequence) for name in ("begin", "begin", "end", "iterator"))
     p = "SwigPyIterator_"
-    call.on(p, begin, "value", "incr", (ANY, "incr", 1), "decr", (ANY, "decr", 1), (ANY, "distance", end),
-            (True, "equal", also_begin), (True, "__eq__", also_begin), (False, "__ne__", also_begin),
-            (NotImplemented, "__eq__", STRANGER), "next", "__next__", "previous", "decr")
+    call.on(
+        p,
+        begin,
+        "value",
+        "incr",
+        (ANY, "incr", 1),
+        "decr",
+        (ANY, "decr", 1),
+        (ANY, "distance", end),
+        (True, "equal", also_begin),
+        (True, "__eq__", also_begin),
+        (False, "__ne__", also_begin),
+        (NotImplemented, "__eq__", STRANGER),
+        "next",
+        "__next__",
+        "previous",
+        "decr",
+    )
     copy = call(p + "copy", begin)
     call.rows((ANY, p + "value", copy), (ANY, p + "advance", begin, 1))
     # The in-place operators hand the iterator over to their result (as
@@ -748,8 +1132,17 @@ def iterate(call, prefix, sequence):
     call.rows((ANY, p + "__sub__", end, begin))
     call.on(p, begin, (ANY, "__add__", 1))
     # A closed iterator: nothing before its start, three steps, then the end.
-    call.on(p, closed, (StopIteration, "previous"), "__next__", "__next__", "__next__", (StopIteration, "__next__"),
-            (StopIteration, "__next__"), (StopIteration, "value"))
+    call.on(
+        p,
+        closed,
+        (StopIteration, "previous"),
+        "__next__",
+        "__next__",
+        "__next__",
+        (StopIteration, "__next__"),
+        (StopIteration, "__next__"),
+        (StopIteration, "value"),
+    )
     call("delete_SwigPyIterator", copy)
 
 
@@ -757,8 +1150,13 @@ def iterate(call, prefix, sequence):
 def containers(call, helpers, tmp_path):
     made_effects, genotypes = engine_genotypes(call, builder_too=False)
     param = genotypes[0]._get_params()[0]
-    elements = {"bool_vector": (True, False), "float_vector": (1.5, 2.5), "string_vector": (text("ab"), text("cd")),
-                "genotype_vector": (genotypes[0], None), "param_vector": (param, None)}
+    elements = {
+        "bool_vector": (True, False),
+        "float_vector": (1.5, 2.5),
+        "string_vector": (text("ab"), text("cd")),
+        "genotype_vector": (genotypes[0], None),
+        "param_vector": (param, None),
+    }
     key, other_key, missing = text("radius"), text("center"), text("missing")
     values, numbers = [2.5, 1.0], renderlib.float_vector([1.0, 2.0, 3.0])
     p = "value_map_"
@@ -772,37 +1170,72 @@ def containers(call, helpers, tmp_path):
         for kind, (first, second) in elements.items():
             vector_calls(call, kind, first, second)
         mapping = construct(call, renderlib.value_map)
-        call.on(p, mapping, (None, "__setitem__", key, values), (None, "__setitem__", missing, values),
-                (None, "__setitem__", other_key, renderlib.float_vector(values)))
+        call.on(
+            p,
+            mapping,
+            (None, "__setitem__", key, values),
+            (None, "__setitem__", missing, values),
+            (None, "__setitem__", other_key, renderlib.float_vector(values)),
+        )
         iterate(call, p, mapping)
         call(p + "__setitem__", mapping, missing)  # without a value: removes the key
         copy = construct(call, renderlib.value_map, mapping)
         call("delete_value_map", construct(call, renderlib.value_map, {key: values}))
         call.fails(TypeError, "new_value_map", STRANGER)
-        call.on(p, mapping, (IndexError, "__delitem__", missing), ((2.5, 1.0), "__getitem__", key),
-                (IndexError, "__getitem__", missing), (True, "__contains__", key), (True, "has_key", key),
-                (1, "count", key), (2, "__len__"), (2, "size"), (True, "__bool__"), (True, "__nonzero__"),
-                (False, "empty"), (ANY, "lower_bound", key), (ANY, "upper_bound", key), "keys", "values", "items",
-                "asdict", "end", "key_iterator", "value_iterator", "rbegin", "rend", "get_allocator")
+        call.on(
+            p,
+            mapping,
+            (IndexError, "__delitem__", missing),
+            ((2.5, 1.0), "__getitem__", key),
+            (IndexError, "__getitem__", missing),
+            (True, "__contains__", key),
+            (True, "has_key", key),
+            (1, "count", key),
+            (2, "__len__"),
+            (2, "size"),
+            (True, "__bool__"),
+            (True, "__nonzero__"),
+            (False, "empty"),
+            (ANY, "lower_bound", key),
+            (ANY, "upper_bound", key),
+            "keys",
+            "values",
+            "items",
+            "asdict",
+            "end",
+            "key_iterator",
+            "value_iterator",
+            "rbegin",
+            "rend",
+            "get_allocator",
+        )
         call(p + "erase", mapping, call(p + "find", mapping, key))
         call.on(p, mapping, (1, "erase", other_key), (IndexError, "__delitem__", missing), (ANY, "swap", copy))
         call(p + "erase", mapping, call(p + "begin", mapping), call(p + "end", mapping))
         call("value_map_clear", copy)
-        call.rows((None, "delete_value_map", copy), (None, "delete_value_map", mapping),
-                  # `iterator - n` and `iterator + n` past either end make a
-                  # copy and then stop: the copy is freed.
-                  (ANY, "SwigPyIterator___sub__", numbers.end(), 1),
-                  (ANY, "SwigPyIterator___sub__", numbers.begin(), 1),
-                  (ANY, "SwigPyIterator___add__", numbers.begin(), 5),
-                  (TypeError, "tarsel_widget_draw", flare, empty, *VIEW, floats),
-                  (TypeError, "tarsel_widget_mouse_event", flare, empty, *VIEW, floats, 10, 10, 0),
-                  (TypeError, "value_map___setitem__", kept, key, floats),
-                  (TypeError, "new_value_map", {"radius": [1.0], "size": floats}),
-                  *[(TypeError, "new_" + kind, items) for kind, items in refused.items()])
+        call.rows(
+            (None, "delete_value_map", copy),
+            (None, "delete_value_map", mapping),
+            # `iterator - n` and `iterator + n` past either end make a
+            # copy and then stop: the copy is freed.
+            (ANY, "SwigPyIterator___sub__", numbers.end(), 1),
+            (ANY, "SwigPyIterator___sub__", numbers.begin(), 1),
+            (ANY, "SwigPyIterator___add__", numbers.begin(), 5),
+            (TypeError, "tarsel_widget_draw", flare, empty, *VIEW, floats),
+            (TypeError, "tarsel_widget_mouse_event", flare, empty, *VIEW, floats, 10, 10, 0),
+            (TypeError, "value_map___setitem__", kept, key, floats),
+            (TypeError, "new_value_map", {"radius": [1.0], "size": floats}),
+            *[(TypeError, "new_" + kind, items) for kind, items in refused.items()],
+        )
 
-    return step, made_effects + [param, key, other_key, missing, values, numbers, flare, empty, floats, kept] + \
-        list(refused.values()) + [e for pair in elements.values() for e in pair], \
-        lambda: free_all(call, made_effects + [flare])
+    return (
+        step,
+        made_effects
+        + [param, key, other_key, missing, values, numbers, flare, empty, floats, kept]
+        + list(refused.values())
+        + [e for pair in elements.values() for e in pair],
+        lambda: free_all(call, made_effects + [flare]),
+    )
 
 
 @family
@@ -816,8 +1249,11 @@ def argument_errors(call, helpers, tmp_path):
     # Functions that take any object first, or whose None is not refused
     # (the two record writers, which the images family leaves out too).
     takes_anything = {"SWIG_PyInstanceMethod_New", "new_GfxInterface", "new_LoadFrameInterface"}
-    unsafe_with_none = {"make_tarsel_raster_info_from_base64", "make_tarsel_raster_info_from_bits",
-                        "raster_info_to_bytearray"}
+    unsafe_with_none = {
+        "make_tarsel_raster_info_from_base64",
+        "make_tarsel_raster_info_from_bits",
+        "raster_info_to_bytearray",
+    }
     # SWIG's overload dispatch of this operator answers three arguments with
     # NotImplemented while leaving its TypeError set (a SystemError results).
     no_extra_argument = {"SwigPyIterator___sub__"}
@@ -828,8 +1264,11 @@ def argument_errors(call, helpers, tmp_path):
             result = call(name, *arguments)
         except refused:
             return
-        assert anything or (name.endswith(operators) and result is NotImplemented), \
-            "%s%r gave %r" % (name, tuple(arguments), result)
+        assert anything or (name.endswith(operators) and result is NotImplemented), "%s%r gave %r" % (
+            name,
+            tuple(arguments),
+            result,
+        )
 
     def step():
         for name in functions:
@@ -854,10 +1293,15 @@ def argument_errors(call, helpers, tmp_path):
 
 # --- The tests --------------------------------------------------------------
 
+
 def shared_constant(item):
     """Objects the interpreter itself keeps and counts references to."""
-    return item is None or isinstance(item, bool) or (type(item) is int and -5 <= item <= 256) or \
-        (type(item) is str and len(item) < 2)
+    return (
+        item is None
+        or isinstance(item, bool)
+        or (type(item) is int and -5 <= item <= 256)
+        or (type(item) is str and len(item) < 2)
+    )
 
 
 # Interpreter blocks, C heap bytes and resident KiB in use. A full collection
@@ -895,20 +1339,29 @@ def check_flat(name, make, helpers, tmp_path):
         references, live = [sys.getrefcount(item) for item in watched], live_objects()
         start, middle, end = memory(), run(ROUNDS), run(ROUNDS)
         after = [sys.getrefcount(item) for item in watched]
-        moved = ["%s %.60r: %+d" % (type(item).__name__, item, now - then)
-                 for item, then, now in zip(watched, references, after) if now != then]
+        moved = [
+            "%s %.60r: %+d" % (type(item).__name__, item, now - then)
+            for item, then, now in zip(watched, references, after)
+            if now != then
+        ]
         assert moved == [], "%s: references gained or lost over %d rounds: %s" % (name, 2 * ROUNDS, moved)
         assert live_objects() == live, "%s: engine or monitor objects left alive" % name
         (blocks, heap, rss), (more_blocks, more_heap, more_rss) = [
-            [b - a for a, b in zip(earlier, later)] for earlier, later in ((start, middle), (middle, end))]
+            [b - a for a, b in zip(earlier, later)] for earlier, later in ((start, middle), (middle, end))
+        ]
         # A leak of one object, or of one small block of the C heap (32 bytes),
         # a round shows as ROUNDS blocks or ROUNDS * 32 bytes a stretch.
-        assert not MEASURE_MEMORY or min(blocks, more_blocks) < ROUNDS // 2, \
+        assert not MEASURE_MEMORY or min(blocks, more_blocks) < ROUNDS // 2, (
             "%s: %d and %d interpreter blocks more in %d rounds" % (name, blocks, more_blocks, ROUNDS)
-        assert not MEASURE_MEMORY or min(heap, more_heap) < ROUNDS * 16, \
+        )
+        assert not MEASURE_MEMORY or min(heap, more_heap) < ROUNDS * 16, (
             "%s: the C heap grew by %d and %d bytes in %d rounds" % (name, heap, more_heap, ROUNDS)
-        assert not MEASURE_MEMORY or rss + more_rss < 1024, \
-            "%s: resident memory grew by %d KiB in %d rounds" % (name, rss + more_rss, 2 * ROUNDS)
+        )
+        assert not MEASURE_MEMORY or rss + more_rss < 1024, "%s: resident memory grew by %d KiB in %d rounds" % (
+            name,
+            rss + more_rss,
+            2 * ROUNDS,
+        )
     finally:
         cleanup()
         MONITOR.qrv_probe_set_init_fails(0)
@@ -950,6 +1403,7 @@ def test_every_wrapper_is_exercised(shared_registry, tmp_path):
             finally:
                 cleanup()
             exercised |= call.names
-    assert NOT_EXERCISED and all(isinstance(getattr(renderlib, name[:-len("_swigregister")], None), type)
-                                 for name in NOT_EXERCISED)
+    assert NOT_EXERCISED and all(
+        isinstance(getattr(renderlib, name[: -len("_swigregister")], None), type) for name in NOT_EXERCISED
+    )
     assert sorted(set(module_functions()) ^ exercised) == sorted(NOT_EXERCISED)

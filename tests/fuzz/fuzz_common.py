@@ -3,6 +3,7 @@ the inputs of a short run, and the driver of a Python target: atheris with
 libFuzzer's flags, or --replay [--inputs N] [--seed S] [paths] without it,
 which runs the files under paths and N generated inputs, prints "replayed M
 inputs" once all passed, and a failing input (base64) before its exception."""
+
 import base64
 import faulthandler
 import inspect
@@ -24,7 +25,7 @@ class ByteReader:
         self.data, self.at = data, 0
 
     def bytes(self, count):
-        part = self.data[self.at:self.at + count]
+        part = self.data[self.at : self.at + count]
         self.at += len(part)
         return part
 
@@ -61,8 +62,11 @@ def inputs(paths, count, seed, max_len):
     """Every file under `paths`, then `count` inputs of a seeded generator:
     random bytes, or a file changed a little (bytes set, inserted or deleted,
     a bit flipped, another file's tail spliced on)."""
-    corpus = [file.read_bytes() for path in map(pathlib.Path, paths)
-              for file in (sorted(p for p in path.rglob("*") if p.is_file()) if path.is_dir() else [path])]
+    corpus = [
+        file.read_bytes()
+        for path in map(pathlib.Path, paths)
+        for file in (sorted(p for p in path.rglob("*") if p.is_file()) if path.is_dir() else [path])
+    ]
     yield from corpus
     rng = random.Random(seed)
     for _ in range(count):
@@ -82,7 +86,7 @@ def inputs(paths, count, seed, max_len):
                 data[at] ^= 1 << rng.randrange(8)
             else:
                 other = rng.choice(corpus)
-                data[at:] = other[rng.randrange(len(other) + 1):]
+                data[at:] = other[rng.randrange(len(other) + 1) :]
         yield bytes(data[:max_len])
 
 
@@ -106,6 +110,7 @@ def main(test_one_input, max_len, default_inputs=2000):
         print("replayed %d inputs" % ran, flush=True)
         return
     import atheris
+
     # The target's own choices become coverage the fuzzer can follow.
     for value in list(vars(sys.modules[test_one_input.__module__]).values()):
         if inspect.isfunction(value) and value.__module__ == test_one_input.__module__:
@@ -125,8 +130,12 @@ def byte_address_module(folder=None):
     import importlib
     import sysconfig
     from native_build import REPO, build_swig_module
-    folder = pathlib.Path(folder or os.environ.get("RENDERLIB_FUZZ_HELPERS")
-                          or REPO / "build-fuzz" / "helpers" / sysconfig.get_config_var("SOABI"))
+
+    folder = pathlib.Path(
+        folder
+        or os.environ.get("RENDERLIB_FUZZ_HELPERS")
+        or REPO / "build-fuzz" / "helpers" / sysconfig.get_config_var("SOABI")
+    )
     if not (folder / ("_shared_registry" + sysconfig.get_config_var("EXT_SUFFIX"))).exists():
         folder.mkdir(parents=True, exist_ok=True)
         build_swig_module(TESTS_DIR / "shared_registry.i", folder, [REPO / "engine-api"])

@@ -5,6 +5,7 @@ be refused with the exception and argument the binding's rules give, the
 record left as it was, or do what a model of the decoder written here does,
 the bytes around the decoder's destination untouched. Run under atheris by
 tools/fuzz.sh, without it by --replay (see fuzz_common)."""
+
 import base64
 import re
 
@@ -36,7 +37,7 @@ def decode_into(raw, dest, start, length):
     """base64decode(raw, &dest[start], length) on bytearray `dest`; False for a write outside it."""
     if length == 0:
         return True
-    dest[start:start + length] = bytes(length)
+    dest[start : start + length] = bytes(length)
     j = 0
     for i, c in enumerate(decoded(raw)):
         v, phase = ALPHABET.find(c) if c in ALPHABET else c, i % 4
@@ -75,7 +76,7 @@ def text_argument(r):
         text = "".join(TEXT_CHARS[r.byte() % len(TEXT_CHARS)] for _ in range(r.int_in(0, 220)))
     elif mode == 1:
         text = base64.b64encode(r.bytes(r.int_in(0, 170))).decode()
-        text = text[:r.int_in(0, len(text))] if r.flag() else text
+        text = text[: r.int_in(0, len(text))] if r.flag() else text
     elif mode in (2, 3):
         text = r.bytes(r.int_in(0, 160)).decode(*(("latin-1",), ("utf-8", "surrogateescape"))[mode - 2])
     elif mode == 4:
@@ -93,8 +94,10 @@ def check(call, args, refusal):
     try:
         result = call(*args)
     except (TypeError, ValueError, OverflowError) as error:
-        assert refusal and isinstance(error, refusal[0]) and re.search(r"argument %d\b" % refusal[1], str(error)), \
-            (refusal, error)
+        assert refusal and isinstance(error, refusal[0]) and re.search(r"argument %d\b" % refusal[1], str(error)), (
+            refusal,
+            error,
+        )
         return None
     assert refusal is None, ("taken", refusal, args)
     return result
@@ -114,8 +117,17 @@ class Case:
     def from_base64(self):
         (info, kind), (text, raw) = self.record_argument(), text_argument(self.r)
         # Conversions first, in argument order, then the null checks.
-        refusal = ((TypeError, 1) if kind == "wrong" else (TypeError, 2) if raw is None and text is not None else
-                   (ValueError, 1) if info is None else (ValueError, 2) if text is None else None)
+        refusal = (
+            (TypeError, 1)
+            if kind == "wrong"
+            else (TypeError, 2)
+            if raw is None and text is not None
+            else (ValueError, 1)
+            if info is None
+            else (ValueError, 2)
+            if text is None
+            else None
+        )
         check(_renderlib.make_tarsel_raster_info_from_base64, (info, text), refusal)
         if refusal is None:
             raw = raw.split(b"\0", 1)[0]
@@ -126,16 +138,28 @@ class Case:
     def from_bits(self):
         (info, kind), (text, raw) = self.record_argument(), text_argument(self.r)
         short = text is None or (raw is not None and len(raw) < IMAGE)
-        refusal = ((TypeError, 1) if kind == "wrong" else (ValueError, 2) if short else (TypeError, 2) if raw is None
-                   else (ValueError, 1) if info is None else None)
+        refusal = (
+            (TypeError, 1)
+            if kind == "wrong"
+            else (ValueError, 2)
+            if short
+            else (TypeError, 2)
+            if raw is None
+            else (ValueError, 1)
+            if info is None
+            else None
+        )
         check(_renderlib.make_tarsel_raster_info_from_bits, (info, text), refusal)
         if refusal is None:
             self.shadow = raw[:IMAGE]
 
     def to_bytearray(self):
         info, kind = self.record_argument()
-        image = check(_renderlib.raster_info_to_bytearray, (info,), None if kind == "ok" else
-                      (TypeError if kind == "wrong" else ValueError, 1))
+        image = check(
+            _renderlib.raster_info_to_bytearray,
+            (info,),
+            None if kind == "ok" else (TypeError if kind == "wrong" else ValueError, 1),
+        )
         assert kind != "ok" or (type(image) is bytearray and image == self.shadow), image
 
     def decode(self):
@@ -149,20 +173,31 @@ class Case:
         if bad == 0:
             dest = r.pick([buffer, 3, "dest", renderlib.T_RasterInfo()])
         elif bad == 1:
-            length = r.pick([1.0, 2 ** 31, -2 ** 31 - 1, "4", None])
+            length = r.pick([1.0, 2**31, -(2**31) - 1, "4", None])
         elif bad == 2:
             dest = None
         elif bad == 3:
-            length = r.int_in(-2 ** 31, -1)
+            length = r.int_in(-(2**31), -1)
         expected = bytearray(buffer)
-        refusal = ((TypeError, 1) if raw is None and text is not None else (TypeError, 2) if bad == 0 else
-                   ((TypeError, OverflowError), 3) if bad == 1 else (ValueError, 3) if length < 0 else
-                   (ValueError, 1) if length > 0 and text is None else
-                   (ValueError, 2) if length > 0 and dest is None else None)
+        refusal = (
+            (TypeError, 1)
+            if raw is None and text is not None
+            else (TypeError, 2)
+            if bad == 0
+            else ((TypeError, OverflowError), 3)
+            if bad == 1
+            else (ValueError, 3)
+            if length < 0
+            else (ValueError, 1)
+            if length > 0 and text is None
+            else (ValueError, 2)
+            if length > 0 and dest is None
+            else None
+        )
         check(_renderlib.base64decode, (text, dest, length), refusal)
         if refusal is None and text is not None and dest is not None:
             assert decode_into(raw, expected, before, length)
-            assert expected[before + length:] == b"\xa5" * GUARD  # the length given was enough
+            assert expected[before + length :] == b"\xa5" * GUARD  # the length given was enough
         assert buffer == expected, (text, length, bytes(buffer).hex(), bytes(expected).hex())
 
     def run(self):

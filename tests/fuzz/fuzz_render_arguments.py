@@ -4,6 +4,7 @@ must return or raise TypeError, ValueError, OverflowError or BufferError: as
 a model of the typemaps says with the render returning at once (the default),
 or rendering tiny frames for real (--render). Run under atheris by
 tools/fuzz.sh, without it by --replay."""
+
 import array
 import base64
 import ctypes
@@ -28,8 +29,28 @@ ALLOWED = (TypeError, ValueError, OverflowError, BufferError)
 FLT_MAX = 3.4028234663852886e38
 PIXEL_TYPES = [1, 2, 3, 4, 5, 6, 7, 8, 9, 10, 11, 12, 13, 14, 15, 17, 18, 19, 20, 21, 22, 23, 24, 25, 26, 28]
 # Kinds of the twenty positions, in order.
-KINDS = ["instance", "text", "dest", "int", "int", "int", "int", "rasters", "images", "float", "int", "float",
-         "int", "int", "int", "int", "bool", "text", "text", "text"]
+KINDS = [
+    "instance",
+    "text",
+    "dest",
+    "int",
+    "int",
+    "int",
+    "int",
+    "rasters",
+    "images",
+    "float",
+    "int",
+    "float",
+    "int",
+    "int",
+    "int",
+    "int",
+    "bool",
+    "text",
+    "text",
+    "text",
+]
 instances = []  # (instance, descriptor names)
 dead_instance = None
 
@@ -54,6 +75,7 @@ def look_alike(this=None, slots=False, raising=False, on_this=None):
         if raising:
             raise RuntimeError("no record here")
         return (on_this and on_this()) or this
+
     return type("T_RasterInfo", (), {"__slots__": (), "this": property(get_this)})()
 
 
@@ -69,25 +91,51 @@ def readonly_array(size):
     return a
 
 
-BUFFER_KINDS = [bytearray, lambda n: (ctypes.c_char * n)(), lambda n: numpy.zeros(n, numpy.uint8),
-                lambda n: array.array("B", bytes(n)), lambda n: memoryview(bytearray(n)),
-                lambda n: numpy.zeros(n // 4, numpy.float32) if n % 4 == 0 else bytearray(n)]
+BUFFER_KINDS = [
+    bytearray,
+    lambda n: (ctypes.c_char * n)(),
+    lambda n: numpy.zeros(n, numpy.uint8),
+    lambda n: array.array("B", bytes(n)),
+    lambda n: memoryview(bytearray(n)),
+    lambda n: numpy.zeros(n // 4, numpy.float32) if n % 4 == 0 else bytearray(n),
+]
 # Arguments whose buffer cannot be had: TypeError, whatever the object raised.
-NOT_BUFFERS = [lambda: numpy.zeros((4, 4), numpy.float32)[:, ::2], lambda: memoryview(bytearray(16))[::2],
-               released_view, lambda: "pixels", lambda: 16, lambda: None, lambda: [bytearray(4)],
-               renderlib.T_RasterInfo]
+NOT_BUFFERS = [
+    lambda: numpy.zeros((4, 4), numpy.float32)[:, ::2],
+    lambda: memoryview(bytearray(16))[::2],
+    released_view,
+    lambda: "pixels",
+    lambda: 16,
+    lambda: None,
+    lambda: [bytearray(4)],
+    renderlib.T_RasterInfo,
+]
 # Items of the rasters list other than a record or None: (maker, refused).
 WRONG_RASTERS = [
-    (renderlib.T_RenderInfo, True), (lambda: 7, True), (lambda: "raster", True), (lambda: bytearray(104), True),
-    (NamedRaster, True), (lambda: renderlib.T_RasterInfo().this, True), (look_alike, True),
-    (lambda: look_alike(this=5), True), (lambda: look_alike(slots=True, raising=True), True),
+    (renderlib.T_RenderInfo, True),
+    (lambda: 7, True),
+    (lambda: "raster", True),
+    (lambda: bytearray(104), True),
+    (NamedRaster, True),
+    (lambda: renderlib.T_RasterInfo().this, True),
+    (look_alike, True),
+    (lambda: look_alike(this=5), True),
+    (lambda: look_alike(slots=True, raising=True), True),
     (lambda: look_alike(slots=True, this=renderlib.T_RenderInfo().this), True),
     (lambda: look_alike(this=renderlib.T_RenderInfo()), True),
     (lambda: look_alike(slots=True, this=renderlib.T_RasterInfo().this), False),
     (lambda: look_alike(this=renderlib.T_RasterInfo()), False),
 ]
-WRONG_IMAGES = [lambda: bytes(8), lambda: readonly_array(4), lambda: memoryview(b"abc"), released_view,
-                lambda: numpy.zeros((4, 4), numpy.uint8)[:, ::2], lambda: "pixels", lambda: 8, renderlib.T_RasterInfo]
+WRONG_IMAGES = [
+    lambda: bytes(8),
+    lambda: readonly_array(4),
+    lambda: memoryview(b"abc"),
+    released_view,
+    lambda: numpy.zeros((4, 4), numpy.uint8)[:, ::2],
+    lambda: "pixels",
+    lambda: 8,
+    renderlib.T_RasterInfo,
+]
 
 
 def writable_buffer(r, size):  # writable, contiguous, exactly `size` bytes
@@ -98,13 +146,52 @@ def wrong_scalar(r, kind):
     """A value for an int, float, bool or text position, right or wrong:
     (value, None when it converts, else the exception class)."""
     if kind == "int":
-        value = r.pick([0, 1, -1, 2 ** 31 - 1, -2 ** 31, 2 ** 31, -2 ** 31 - 1, 2 ** 63, 2 ** 64 + 5, True,
-                        IntSubclass(7), r.int32(), 1.0, "1", None, b"\x01"])
-        in_range = isinstance(value, int) and -2 ** 31 <= value < 2 ** 31
+        value = r.pick(
+            [
+                0,
+                1,
+                -1,
+                2**31 - 1,
+                -(2**31),
+                2**31,
+                -(2**31) - 1,
+                2**63,
+                2**64 + 5,
+                True,
+                IntSubclass(7),
+                r.int32(),
+                1.0,
+                "1",
+                None,
+                b"\x01",
+            ]
+        )
+        in_range = isinstance(value, int) and -(2**31) <= value < 2**31
         return value, None if in_range else OverflowError if isinstance(value, int) else TypeError
     if kind == "float":
-        value = r.pick([0.0, 1.0, -1.0, math.nan, math.inf, -math.inf, 3.5e38, -1e300, FLT_MAX, 1, 2 ** 127,
-                        2 ** 128, 10 ** 400, FloatSubclass(0.5), r.float32(), True, "1.0", None, 1j])
+        value = r.pick(
+            [
+                0.0,
+                1.0,
+                -1.0,
+                math.nan,
+                math.inf,
+                -math.inf,
+                3.5e38,
+                -1e300,
+                FLT_MAX,
+                1,
+                2**127,
+                2**128,
+                10**400,
+                FloatSubclass(0.5),
+                r.float32(),
+                True,
+                "1.0",
+                None,
+                1j,
+            ]
+        )
         try:
             as_double = float(value) if isinstance(value, (int, float)) else None
         except OverflowError:
@@ -115,8 +202,23 @@ def wrong_scalar(r, kind):
     if kind == "bool":
         value = r.pick([True, False, 1, 0, None, "true", 1.0])
         return value, None if isinstance(value, bool) else TypeError
-    value = r.pick(["", "linear", "srgb", None, "Blur", "\0", "x" * 300, "\u00e9t\u00e9", "\udc80",
-                    TextSubclass("srgb"), b"linear", 3, renderlib.T_RasterInfo])
+    value = r.pick(
+        [
+            "",
+            "linear",
+            "srgb",
+            None,
+            "Blur",
+            "\0",
+            "x" * 300,
+            "\u00e9t\u00e9",
+            "\udc80",
+            TextSubclass("srgb"),
+            b"linear",
+            3,
+            renderlib.T_RasterInfo,
+        ]
+    )
     value = value() if value is renderlib.T_RasterInfo else value
     return value, None if value is None or (isinstance(value, str) and value != "\udc80") else TypeError
 
@@ -147,6 +249,7 @@ def list_argument(r, kind, wrong):
 
             def rewrite():
                 items[:] = [renderlib.T_RasterInfo() if i is not None else None for i in items] if replace else []
+
             items[k], refused[k] = look_alike(slots=True, this=keep.this, on_this=rewrite), False
         if r.one_in(6):
             looped = look_alike()
@@ -175,8 +278,18 @@ def conversion_case(r):
         error = None
         if kind == "instance":
             if wrong:
-                value, error = r.pick([renderlib.T_RasterInfo, lambda: instances[0][0].effect_genotype, lambda: 3,
-                                       lambda: "T_Blur", lambda: renderlib.T_RasterInfo().this])(), TypeError
+                value, error = (
+                    r.pick(
+                        [
+                            renderlib.T_RasterInfo,
+                            lambda: instances[0][0].effect_genotype,
+                            lambda: 3,
+                            lambda: "T_Blur",
+                            lambda: renderlib.T_RasterInfo().this,
+                        ]
+                    )(),
+                    TypeError,
+                )
             else:
                 value = chosen_instance = r.pick([None, dead_instance] + [i for i, _ in instances] * 3)
         elif kind == "dest":
@@ -184,8 +297,9 @@ def conversion_case(r):
             if choice < 5:
                 value = writable_buffer(r, r.int_in(0, 64))
             elif choice == 5:  # read-only is taken
-                value = r.pick([lambda: bytes(r.int_in(0, 32)), lambda: memoryview(b"pixels"),
-                                lambda: readonly_array(8)])()
+                value = r.pick(
+                    [lambda: bytes(r.int_in(0, 32)), lambda: memoryview(b"pixels"), lambda: readonly_array(8)]
+                )()
             else:
                 value, error = (r.pick(NOT_BUFFERS[3:]) if choice == 9 else NOT_BUFFERS[choice - 6])(), TypeError
         elif kind in ("rasters", "images"):
@@ -211,9 +325,12 @@ def conversion_case(r):
     except ALLOWED as raised:
         result, error = None, raised
     # Checked once every argument has converted, in argument order.
-    errors += [ValueError if chosen_instance is dead_instance else None,
-               ValueError if isinstance(n_rasters, int) and n_rasters > 0 and any(
-                   0 < lengths[kind] < n_rasters for kind in lengths) else None]
+    errors += [
+        ValueError if chosen_instance is dead_instance else None,
+        ValueError
+        if isinstance(n_rasters, int) and n_rasters > 0 and any(0 < lengths[kind] < n_rasters for kind in lengths)
+        else None,
+    ]
     first = next(((p, e) for p, e in zip(list(range(1, 21)) + [1, 11], errors) if e is not None), None)
     if first is None:
         assert error is None, error
@@ -236,7 +353,7 @@ def make_raster(r):
         raw = bytearray(r.bytes(104).ljust(104, b"\0"))
         for offset in (8, 12):  # origins: mostly near the frame
             if not r.one_in(8):
-                raw[offset:offset + 4] = struct.pack("<i", r.int_in(-6, 6))
+                raw[offset : offset + 4] = struct.pack("<i", r.int_in(-6, 6))
         if not r.one_in(8):
             raw[48:52] = struct.pack("<i", r.pick([0, 1]))  # res_factor
         _renderlib.make_tarsel_raster_info_from_base64(info, base64.b64encode(bytes(raw)).decode())
@@ -279,7 +396,7 @@ def render_case(r):
     for buffer in inputs:
         view = memoryview(buffer).cast("B")
         pattern = r.bytes(r.int_in(1, 64)) or b"\x80"
-        view[:] = (pattern * (len(view) // len(pattern) + 1))[:len(view)]
+        view[:] = (pattern * (len(view) // len(pattern) + 1))[: len(view)]
     n_rasters = len(rasters) if not r.one_in(6) else r.int_in(0, len(rasters))
     images_arg = images if not r.one_in(8) else []
     past_lists = r.one_in(10)
@@ -287,33 +404,57 @@ def render_case(r):
         n_rasters = len(rasters) + r.int_in(1, 4)  # more entries than the lists hold: refused
     field = mostly(r, [0, 0, 1, 2], [3, -1])
     flags = mostly(r, [0, 0, 1, 2, 3], [r.int32()])
-    frame = r.pick([0, 1, 5, -3, r.int32() // 2, -2 ** 31, 2 ** 31 - 1])  # and runs of frames past the ends
+    frame = r.pick([0, 1, 5, -3, r.int32() // 2, -(2**31), 2**31 - 1])  # and runs of frames past the ends
     before_dest = bytes(memoryview(dest).cast("B"))
     before_inputs = [bytes(memoryview(b).cast("B")) for b in inputs]
     spaces = [mostly(r, ["linear", "srgb", "", None], [bad]) for bad in ("cmyk", "rgb", "\u00e9")]
-    args = [instance, descriptor, dest, frame, field, mostly(r, [1, 1, 2, 4, 0], [-1, 3]), r.int_in(-1, 3),
-            rasters, images_arg, mostly(r, [1.0, 0.0, 0.5, 2.0, -1.0], [math.nan, math.inf]), n_rasters,
-            mostly(r, [1.0, 0.0, 2.0, 0.5], [-1.0, math.nan, math.inf]), r.int_in(0, 2), r.int32(), flags,
-            mostly(r, [25, 0, 1, 30, 1000], [-5]), r.flag()] + spaces
+    args = [
+        instance,
+        descriptor,
+        dest,
+        frame,
+        field,
+        mostly(r, [1, 1, 2, 4, 0], [-1, 3]),
+        r.int_in(-1, 3),
+        rasters,
+        images_arg,
+        mostly(r, [1.0, 0.0, 0.5, 2.0, -1.0], [math.nan, math.inf]),
+        n_rasters,
+        mostly(r, [1.0, 0.0, 2.0, 0.5], [-1.0, math.nan, math.inf]),
+        r.int_in(0, 2),
+        r.int32(),
+        flags,
+        mostly(r, [25, 0, 1, 30, 1000], [-5]),
+        r.flag(),
+    ] + spaces
     try:
         result = render(*args)
     except ALLOWED as error:
         # Only a freed instance and n_rasters past the lists are refused.
-        assert type(error) is ValueError and ((instance is dead_instance and "argument 1 " in str(error)) or
-                                              (past_lists and "argument 11 " in str(error))), error
+        assert type(error) is ValueError and (
+            (instance is dead_instance and "argument 1 " in str(error)) or (past_lists and "argument 11 " in str(error))
+        ), error
         return
     assert not past_lists and type(result) is bool, result
     reads_dest = any(image is dest for image in images)
     for buffer, before in zip(inputs, before_inputs):
         assert reads_dest or bytes(memoryview(buffer).cast("B")) == before, "an input buffer was written"
-    if result and field in (1, 2) and not flags & 1 and dest_info.ds_ysize > 0 and dest_size > 0 \
-            and dest_info.pixel_type in PIXEL_TYPES and not any(image is dest for image in images[1:]):
+    if (
+        result
+        and field in (1, 2)
+        and not flags & 1
+        and dest_info.ds_ysize > 0
+        and dest_size > 0
+        and dest_info.pixel_type in PIXEL_TYPES
+        and not any(image is dest for image in images[1:])
+    ):
         height, after = dest_info.ds_ysize, bytes(memoryview(dest).cast("B"))
         line = dest_size // height
         for y in range(height):
             stored = (height - 1 - y if dest_info.flip_y_p else y) * line
-            assert (dest_info.y_origin + y) & 1 == field - 1 or after[stored:stored + line] == \
-                before_dest[stored:stored + line], "line %d of the other field was written" % y
+            assert (dest_info.y_origin + y) & 1 == field - 1 or after[stored : stored + line] == before_dest[
+                stored : stored + line
+            ], "line %d of the other field was written" % y
 
 
 def TestOneInput(data):

@@ -2,6 +2,7 @@
 targets without atheris (--replay), the C++ target built with g++ under the
 address and undefined-behaviour sanitizers; and the faults the fuzzing found,
 replayed one by one (reproducers/reproduce.py). tools/fuzz.sh runs them long."""
+
 import os
 import pathlib
 import re
@@ -25,11 +26,16 @@ def corpus(target):
 
 
 def check_run(command, expected, env, timeout=120, stdin=None):
-    done = subprocess.run([str(part) for part in command], cwd=FUZZ, env=env, stdin=stdin, capture_output=True,
-                          timeout=timeout)
+    done = subprocess.run(
+        [str(part) for part in command], cwd=FUZZ, env=env, stdin=stdin, capture_output=True, timeout=timeout
+    )
     out, err = done.stdout.decode(errors="replace"), done.stderr.decode(errors="replace")
-    assert done.returncode == 0 and expected in out and not SANITIZER_REPORT.search(err), \
-        "%s ended with %d\n%s\n%s" % (command[1:], done.returncode, out[-4000:], err[-8000:])
+    assert done.returncode == 0 and expected in out and not SANITIZER_REPORT.search(err), "%s ended with %d\n%s\n%s" % (
+        command[1:],
+        done.returncode,
+        out[-4000:],
+        err[-8000:],
+    )
 
 
 def helpers(shared_registry):
@@ -37,23 +43,44 @@ def helpers(shared_registry):
     return dict(os.environ, RENDERLIB_FUZZ_HELPERS=str(pathlib.Path(shared_registry.__file__).parent))
 
 
-@pytest.mark.parametrize("script, mode, target, count", [
-    ("fuzz_raster_serialisation.py", [], "raster_serialisation", 3000),
-    ("fuzz_render_arguments.py", [], "render_arguments", 3000),
-    ("fuzz_render_arguments.py", ["--render"], "render_arguments-render", 1500),
-], ids=["raster_serialisation", "render_arguments", "render_arguments-render"])
+@pytest.mark.parametrize(
+    "script, mode, target, count",
+    [
+        ("fuzz_raster_serialisation.py", [], "raster_serialisation", 3000),
+        ("fuzz_render_arguments.py", [], "render_arguments", 3000),
+        ("fuzz_render_arguments.py", ["--render"], "render_arguments-render", 1500),
+    ],
+    ids=["raster_serialisation", "render_arguments", "render_arguments-render"],
+)
 def test_python_target(script, mode, target, count, shared_registry):
     files = sum(1 for folder in corpus(target) for p in folder.rglob("*") if p.is_file())
     # The count is printed only after the last input passed.
-    check_run([sys.executable, script, "--replay", "--inputs", count, "--seed", SEED] + mode + corpus(target),
-              "replayed %d inputs" % (files + count), helpers(shared_registry))
+    check_run(
+        [sys.executable, script, "--replay", "--inputs", count, "--seed", SEED] + mode + corpus(target),
+        "replayed %d inputs" % (files + count),
+        helpers(shared_registry),
+    )
 
 
 def test_segment(tmp_path):
     binary = tmp_path / "fuzz_segment"
-    run([os.environ.get("CXX", "g++"), "-std=c++17", "-O1", "-g", "-fsanitize=address,undefined",
-         "-fno-sanitize-recover=undefined", "-I", REPO / "reference-engine" / "src", FUZZ / "fuzz_segment.cpp",
-         FUZZ / "replay_main.cpp", REPO / "reference-engine" / "src" / "ipc" / "segment.cpp", "-o", binary])
+    run(
+        [
+            os.environ.get("CXX", "g++"),
+            "-std=c++17",
+            "-O1",
+            "-g",
+            "-fsanitize=address,undefined",
+            "-fno-sanitize-recover=undefined",
+            "-I",
+            REPO / "reference-engine" / "src",
+            FUZZ / "fuzz_segment.cpp",
+            FUZZ / "replay_main.cpp",
+            REPO / "reference-engine" / "src" / "ipc" / "segment.cpp",
+            "-o",
+            binary,
+        ]
+    )
     stream = tmp_path / "inputs"  # kept to replay a failure: fuzz_segment < inputs
     count = 0
     with open(stream, "wb") as out:

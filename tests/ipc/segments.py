@@ -1,6 +1,7 @@
 """Shared-memory segments for the transport tests: names unique to this test
 session, served and connected in this process, and peer processes that run
 a short script against a segment with a hard time limit."""
+
 import itertools
 import os
 import pathlib
@@ -49,9 +50,14 @@ class Peer:
     def __init__(self, script, name):
         prologue = "import os, sys, time, zlib\nimport _renderlib, renderlib\nname = %r\n" % name
         paths = [str(TESTS), str(TESTS / "ipc")] + [p for p in [os.environ.get("PYTHONPATH")] if p]
-        self.process = subprocess.Popen([sys.executable, "-u", "-c", prologue + textwrap.dedent(script)],
-                                        stdin=subprocess.PIPE, stdout=subprocess.PIPE, stderr=subprocess.PIPE,
-                                        text=True, env=dict(os.environ, PYTHONPATH=os.pathsep.join(paths)))
+        self.process = subprocess.Popen(
+            [sys.executable, "-u", "-c", prologue + textwrap.dedent(script)],
+            stdin=subprocess.PIPE,
+            stdout=subprocess.PIPE,
+            stderr=subprocess.PIPE,
+            text=True,
+            env=dict(os.environ, PYTHONPATH=os.pathsep.join(paths)),
+        )
 
     def line(self):
         """The next line the peer prints (empty when it ended)."""
@@ -68,7 +74,9 @@ class Peer:
             out, err = self.process.communicate(timeout=limit)
         except subprocess.TimeoutExpired as timeout:
             self.process.kill()
-            raise AssertionError("the peer did not end within %d s: %s" % (limit, self.process.communicate()[1])) from timeout
+            raise AssertionError(
+                "the peer did not end within %d s: %s" % (limit, self.process.communicate()[1])
+            ) from timeout
         assert self.process.returncode == 0, err
         return out
 

@@ -1,6 +1,7 @@
 """Ctrl-C during a transport call that waits for a peer that never answers:
 the interpreter raises KeyboardInterrupt at once, nothing is taken or sent,
 and the next call finds the queue as it was."""
+
 from isolated import run_cleanly
 from segments import fresh_name
 

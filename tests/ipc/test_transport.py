@@ -2,6 +2,7 @@
 the message header at its wire layout, views over the segment, the write
 functions' conversions, the error codes and the size and queue limits.
 (Every wrapper's argument errors and memory: tests/core.)"""
+
 import ctypes
 import os
 import random
@@ -61,12 +62,11 @@ def test_the_message_header_is_read_in_place_at_its_wire_layout():
     header = renderlib.MessageHeader_t()
     assert header.this.own() and ctypes.string_at(int(header.this), 64) == bytes(64)
     assert (header.id, header.size, header.desc, header.reserved) == (0, 0, "", "")
-    image = struct.pack("<II Q 24s 24s", 0xFFFFFFFF, 0xDEAD, 2 ** 64 - 1, b"d" * 24, b"\xe9t\xe9\0tail")
+    image = struct.pack("<II Q 24s 24s", 0xFFFFFFFF, 0xDEAD, 2**64 - 1, b"d" * 24, b"\xe9t\xe9\0tail")
     ctypes.memmove(int(header.this), image, 64)
     # Unsigned; a full text field has no terminator; up to the first NUL, with
     # bytes that are not UTF-8 as surrogate escapes.
-    assert (header.id, header.size, header.desc, header.reserved) == (2 ** 32 - 1, 2 ** 64 - 1, "d" * 24,
-                                                                       "\udce9t\udce9")
+    assert (header.id, header.size, header.desc, header.reserved) == (2**32 - 1, 2**64 - 1, "d" * 24, "\udce9t\udce9")
     ctypes.memmove(int(header.this) + 16, b"\0after", 6)
     assert header.desc == ""
     for field in ("id", "size", "desc", "reserved"):  # read only
@@ -139,15 +139,20 @@ def test_empty_and_text_messages(pair):
         server.write_string(b"bytes")  # text is str only
 
 
-@pytest.mark.parametrize("function, operation", [
-    (lambda t, m: t.write_pybuf(m), "write"),
-    (lambda t, m: t.try_write_pybuf(m), "try_write"),
-    (lambda t, m: t.timed_write_pybuf(m, 0.1), "timed_write"),
-])
+@pytest.mark.parametrize(
+    "function, operation",
+    [
+        (lambda t, m: t.write_pybuf(m), "write"),
+        (lambda t, m: t.try_write_pybuf(m), "try_write"),
+        (lambda t, m: t.timed_write_pybuf(m, 0.1), "timed_write"),
+    ],
+)
 def test_a_message_without_a_buffer(pair, function, operation):
     strided = numpy.zeros((4, 4), numpy.uint8)[:, ::2]
-    for message, text in [(5, "msg must support the buffer protocol"),
-                          (strided, "unable to get Py_buffer view; maybe has no size?")]:
+    for message, text in [
+        (5, "msg must support the buffer protocol"),
+        (strided, "unable to get Py_buffer view; maybe has no size?"),
+    ]:
         with pytest.raises(SystemError) as raised:
             function(pair[0], message)
         cause = raised.value.__cause__
@@ -207,7 +212,8 @@ def test_a_long_run_of_messages_arrives_whole_and_in_order(pair):
 
 def test_server_pid_handles_are_copies_freed_silently(name):
     calls = 1000 if "vgpreload" in os.environ.get("LD_PRELOAD", "") else 1000000
-    lines = run_cleanly("""
+    lines = run_cleanly(
+        """
         import sys, _renderlib, renderlib
         from process_memory import resident_kib
         server = _renderlib.ShmemManager_serve(sys.argv[1], 1 << 12, 1 << 12)
@@ -220,7 +226,10 @@ def test_server_pid_handles_are_copies_freed_silently(name):
             server.get_server_pid()
         print(resident_kib() - before)
         server.remove()
-    """, timeout=120, args=[name, calls]).splitlines()
+    """,
+        timeout=120,
+        args=[name, calls],
+    ).splitlines()
     assert lines[0] == "SwigPyObject True True True" and len(lines) == 2, lines[:5]  # nothing else printed
     if not UNDER_ADDRESS_SANITIZER:  # a pid_t kept per call would be some 32 MB
         assert int(lines[1]) < 1024, lines

@@ -1,6 +1,7 @@
 """Two processes on one segment: a writer blocked on a full queue, peers that
 die at the worst moments, and a segment that goes under its users. (Long
 traffic both ways between peers that die at random: tests/stress.)"""
+
 import time
 
 import pytest
@@ -14,14 +15,17 @@ QUEUE = 1 << 15
 
 def test_a_blocked_writer_resumes_when_the_reader_drains(name):
     server = serve(name, QUEUE, QUEUE)
-    peer = Peer("""
+    peer = Peer(
+        """
 transport = _renderlib.ShmemManager_connect(name)
 while transport.try_write_pybuf(bytes(1000)):
     pass
 print("full")
 start = time.monotonic()
 print(transport.write_pybuf(b"last".ljust(1000)), round(time.monotonic() - start, 2))
-""", name)
+""",
+        name,
+    )
     assert peer.line() == "full"
     time.sleep(0.3)
     count = 0
@@ -113,8 +117,9 @@ peer.reap()
 def test_a_dead_peer_ends_every_blocking_wait(name, side, reaped):
     out = run_cleanly(DEAD_PEER, timeout=30, args=[name, reaped, side]).splitlines()
     # Nothing read or sent, RETRY, within one wait slice (50 ms) and a margin.
-    assert out[:4] == ["%s False %d True" % (what, E.ShmemError_RETRY)
-                       for what in ("read", "timed read", "write", "reserve")]
+    assert out[:4] == [
+        "%s False %d True" % (what, E.ShmemError_RETRY) for what in ("read", "timed read", "write", "reserve")
+    ]
     assert out[4] == ("served again True" if side == "server" else "client alive False")
 
 
@@ -149,10 +154,16 @@ _renderlib.ShmemManager_reset(name, True)
 """ % {"queue": QUEUE}
 
 
-@pytest.mark.parametrize("how", ["0", "4096", "removed"], ids=["truncated to nothing", "truncated to its header",
-                                                               "removed"])
+@pytest.mark.parametrize(
+    "how", ["0", "4096", "removed"], ids=["truncated to nothing", "truncated to its header", "removed"]
+)
 def test_a_segment_truncated_or_removed_under_its_transports(name, how):
     out = run_cleanly(GONE, timeout=30, args=[name, how]).splitlines()
     invalid = E.ShmemError_INVALID_SEGMENT
-    assert out == ["valid False", "write False %d" % invalid, "read None %d" % invalid, "view True",
-                   "peer None %d False True" % invalid]
+    assert out == [
+        "valid False",
+        "write False %d" % invalid,
+        "read None %d" % invalid,
+        "view True",
+        "peer None %d False True" % invalid,
+    ]

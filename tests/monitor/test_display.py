@@ -1,4 +1,5 @@
 """Displays: connecting, their virtual operations, and their lifetime."""
+
 import pytest
 
 import _renderlib as rl
@@ -27,9 +28,15 @@ def test_each_function_calls_its_own_virtual_operation(display, probe):
     rl.EM_Display_disconnect(display, "dev")
     rl.EM_Display_disconnect(display, "preview")
     assert probe.calls_of(display) == [
-        "devices() -> 2", "device_modes(folder) -> 4", "connect(preview, 640x360p25) -> 0",
-        "get_width(preview) -> 640", "get_height(preview) -> 360", "display_frame(preview, null) -> 1",
-        "connect(dev, null) -> 2", "connect(preview, null) -> 0"]  # disconnect is connect with a null mode
+        "devices() -> 2",
+        "device_modes(folder) -> 4",
+        "connect(preview, 640x360p25) -> 0",
+        "get_width(preview) -> 640",
+        "get_height(preview) -> 360",
+        "display_frame(preview, null) -> 1",
+        "connect(dev, null) -> 2",
+        "connect(preview, null) -> 0",
+    ]  # disconnect is connect with a null mode
 
 
 def test_two_displays_are_independent(probe):
@@ -42,15 +49,18 @@ def test_two_displays_are_independent(probe):
     rl.release_external_monitor(second)
 
 
-@pytest.mark.parametrize("function, args, position, ctype", [
-    ("EM_Display_connect", ("D", "preview", "x"), 1, "EM_Display *"),
-    ("EM_Display_connect", (None, 2, "x"), 2, "char const *"),
-    ("EM_Display_connect", (None, "preview", b"x"), 3, "char const *"),
-    ("EM_Display_display_frame", (None, "preview", bytearray(4)), 3, "EM_XIImage const *"),
-    ("EM_Display_get_height", (None, []), 2, "char const *"),
-    ("EM_XIImage_removeRef", ("I",), 1, "EM_XIImage *"),
-    ("EM_XIImage_getRowBytes", ("I",), 1, "EM_XIImage const *"),
-])
+@pytest.mark.parametrize(
+    "function, args, position, ctype",
+    [
+        ("EM_Display_connect", ("D", "preview", "x"), 1, "EM_Display *"),
+        ("EM_Display_connect", (None, 2, "x"), 2, "char const *"),
+        ("EM_Display_connect", (None, "preview", b"x"), 3, "char const *"),
+        ("EM_Display_display_frame", (None, "preview", bytearray(4)), 3, "EM_XIImage const *"),
+        ("EM_Display_get_height", (None, []), 2, "char const *"),
+        ("EM_XIImage_removeRef", ("I",), 1, "EM_XIImage *"),
+        ("EM_XIImage_getRowBytes", ("I",), 1, "EM_XIImage const *"),
+    ],
+)
 def test_argument_errors_name_function_position_and_type(display, function, args, position, ctype):
     args = tuple(display if a is None and i == 0 else a for i, a in enumerate(args))
     with pytest.raises(TypeError) as raised:

@@ -1,4 +1,5 @@
 """Frames shown on the devices: pixels by address, converted exactly."""
+
 import ctypes
 
 import numpy as np
@@ -10,10 +11,22 @@ import _renderlib as rl
 WIDTH, HEIGHT = 640, 360
 
 
-def wrap(display, pixels, row_bytes=WIDTH * 4, name="frame", bottom_up=False, fmt=rl.EM_ImageFormat_32BitIntBGRA,
-         aspect=1.0, gamma=2.2, premultiplied=False, full_range=True, size=(WIDTH, HEIGHT)):
-    return rl.EM_Display_EM_XIImageWrapper(display, pixels, size[0], size[1], row_bytes, name, bottom_up, fmt,
-                                           aspect, gamma, premultiplied, full_range)
+def wrap(
+    display,
+    pixels,
+    row_bytes=WIDTH * 4,
+    name="frame",
+    bottom_up=False,
+    fmt=rl.EM_ImageFormat_32BitIntBGRA,
+    aspect=1.0,
+    gamma=2.2,
+    premultiplied=False,
+    full_range=True,
+    size=(WIDTH, HEIGHT),
+):
+    return rl.EM_Display_EM_XIImageWrapper(
+        display, pixels, size[0], size[1], row_bytes, name, bottom_up, fmt, aspect, gamma, premultiplied, full_range
+    )
 
 
 def random_frame(seed, row_pixels=WIDTH):
@@ -31,17 +44,20 @@ def preview(display):
     return display
 
 
-@pytest.mark.parametrize("fmt, bgra_order, bottom_up, padding", [
-    (rl.EM_ImageFormat_32BitIntBGRA, [0, 1, 2, 3], False, 0),
-    (rl.EM_ImageFormat_32BitIntARGB, [3, 2, 1, 0], False, 0),
-    (rl.EM_ImageFormat_32BitIntBGRA, [0, 1, 2, 3], True, 5),  # rows bottom up, 20 bytes of padding a row
-])
+@pytest.mark.parametrize(
+    "fmt, bgra_order, bottom_up, padding",
+    [
+        (rl.EM_ImageFormat_32BitIntBGRA, [0, 1, 2, 3], False, 0),
+        (rl.EM_ImageFormat_32BitIntARGB, [3, 2, 1, 0], False, 0),
+        (rl.EM_ImageFormat_32BitIntBGRA, [0, 1, 2, 3], True, 5),  # rows bottom up, 20 bytes of padding a row
+    ],
+)
 def test_a_frame_arrives_pixel_exact(preview, probe, fmt, bgra_order, bottom_up, padding):
     frame = random_frame(fmt + padding, row_pixels=WIDTH + padding)
     image = wrap(preview, frame, row_bytes=(WIDTH + padding) * 4, bottom_up=bottom_up, fmt=fmt, name="exact")
     assert rl.EM_Display_display_frame(preview, "preview", image) == rl.EM_errorNone
     pixels, frames, name = shown(probe, preview)
-    np.testing.assert_array_equal(pixels, frame[::-1 if bottom_up else 1, :WIDTH][:, :, bgra_order])
+    np.testing.assert_array_equal(pixels, frame[:: -1 if bottom_up else 1, :WIDTH][:, :, bgra_order])
     assert (frames, name) == (1, "exact")
 
 
@@ -63,8 +79,9 @@ def test_the_pixels_go_by_address_and_are_read_only_at_display_time(preview, pro
     probe.clear_calls()
     image = wrap(preview, frame)
     buffer_address = ctypes.addressof((ctypes.c_char * len(frame)).from_buffer(frame))
-    assert probe.calls_of(preview)[0].startswith("EM_XIImageWrapper(%#x, 640, 360, 2560, frame, 0, 0, 1, 2.2, 0, 1)"
-                                                  % buffer_address)
+    assert probe.calls_of(preview)[0].startswith(
+        "EM_XIImageWrapper(%#x, 640, 360, 2560, frame, 0, 0, 1, 2.2, 0, 1)" % buffer_address
+    )
     frame[:4] = b"\x01\x02\x03\x04"  # changed after wrapping, before showing: the device sees the change
     assert preview.display_frame("preview", image) == rl.EM_errorNone
     assert shown(probe, preview)[0][0, 0].tolist() == [1, 2, 3, 4]
@@ -76,12 +93,24 @@ def test_read_only_buffers_are_accepted(preview, probe):
     assert shown(probe, preview)[0].tobytes() == frame
 
 
-@pytest.mark.parametrize("position, bad, ctype", [
-    (2, 12, "(RawImage)"), (2, "pixels", "(RawImage)"), (2, None, "(RawImage)"),
-    (3, 1.5, "EM_SInt32"), (4, "w", "EM_SInt32"), (5, None, "EM_SInt32"), (6, 5, "char *"),
-    (7, 1, "bool"), (8, "BGRA", "EM_ImageFormat"), (9, "1", "double"), (10, None, "double"),
-    (11, 0, "bool"), (12, None, "bool"),
-])
+@pytest.mark.parametrize(
+    "position, bad, ctype",
+    [
+        (2, 12, "(RawImage)"),
+        (2, "pixels", "(RawImage)"),
+        (2, None, "(RawImage)"),
+        (3, 1.5, "EM_SInt32"),
+        (4, "w", "EM_SInt32"),
+        (5, None, "EM_SInt32"),
+        (6, 5, "char *"),
+        (7, 1, "bool"),
+        (8, "BGRA", "EM_ImageFormat"),
+        (9, "1", "double"),
+        (10, None, "double"),
+        (11, 0, "bool"),
+        (12, None, "bool"),
+    ],
+)
 def test_image_arguments_are_checked_in_order(preview, position, bad, ctype):
     args = [preview, bytearray(16), 2, 2, 8, "n", False, 0, 1.0, 0.0, False, True]
     args[position - 1] = bad
@@ -91,10 +120,17 @@ def test_image_arguments_are_checked_in_order(preview, position, bad, ctype):
     assert str(raised.value) == "in method 'EM_Display_EM_XIImageWrapper', argument %d of type '%s'" % (position, ctype)
 
 
-@pytest.mark.parametrize("change", [
-    dict(size=(0, 360)), dict(row_bytes=WIDTH * 4 - 1), dict(fmt=2), dict(aspect=0.0),
-    dict(aspect=float("nan")), dict(gamma=-1.0),
-])
+@pytest.mark.parametrize(
+    "change",
+    [
+        dict(size=(0, 360)),
+        dict(row_bytes=WIDTH * 4 - 1),
+        dict(fmt=2),
+        dict(aspect=0.0),
+        dict(aspect=float("nan")),
+        dict(gamma=-1.0),
+    ],
+)
 def test_values_the_library_cannot_read_make_no_image(preview, change):
     assert wrap(preview, bytearray(WIDTH * HEIGHT * 4), **change) is None
 

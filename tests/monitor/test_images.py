@@ -1,4 +1,5 @@
 """Image proxies: one reference each, given back exactly once."""
+
 import gc
 
 import pytest
@@ -8,8 +9,9 @@ from monitor_probe import address
 
 
 def make_image(display):
-    return rl.EM_Display_EM_XIImageWrapper(display, bytearray(8 * 4 * 4), 8, 4, 32, None, False, 0, 1.0, 0.0, False,
-                                           True)
+    return rl.EM_Display_EM_XIImageWrapper(
+        display, bytearray(8 * 4 * 4), 8, 4, 32, None, False, 0, 1.0, 0.0, False, True
+    )
 
 
 @pytest.mark.parametrize("deleted_first", [False, True])
@@ -34,8 +36,11 @@ def test_add_and_remove_pass_straight_through_to_the_last_reference(display, pro
     assert image.thisown and probe.image_refs(at) == 2
     assert (image.getWidth(), image.getHeight(), rl.EM_XIImage_getRowBytes(image)) == (8, 4, 32)
     assert image.removeRef() == 1 and image.removeRef() == 0  # the proxy's own reference given back by the caller
-    with pytest.raises(ValueError, match=r"^in method 'EM_XIImage_getWidth', argument 1 of type "
-                                         r"'EM_XIImage const \*': no image"):
+    with pytest.raises(
+        ValueError,
+        match=r"^in method 'EM_XIImage_getWidth', argument 1 of type "
+        r"'EM_XIImage const \*': no image",
+    ):
         image.getWidth()
     with pytest.raises(ValueError, match=r"argument 3 of type 'EM_XIImage const \*': its last reference"):
         display.display_frame("preview", image)

@@ -1,4 +1,5 @@
 """The companion layer's Monitor: whole frames of the mode's size, failures raised."""
+
 import numpy as np
 import pytest
 

@@ -1,4 +1,5 @@
 """Effect instances: creation, saved text, queries, freeing, threads."""
+
 import gc
 import json
 import threading
@@ -92,7 +93,7 @@ def test_shared_parameters(instance):
     slot_params = [p for p, g in shared if g == first and p not in first._get_params()]
     assert slot_params and all(p.flags.wenable_p for p in slot_params)
     published = [p for p in effect.effect_genotype._get_params() if not p.flags.dont_publish_p]
-    assert [p for p, _ in shared[:len(published)]] == published
+    assert [p for p, _ in shared[: len(published)]] == published
 
 
 def test_add_param_to_list_is_the_engines_collector(instance, shared_registry):

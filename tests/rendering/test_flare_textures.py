@@ -1,4 +1,5 @@
 """The engine's flare-texture store, and lens flares drawn with it."""
+
 import numpy
 import pytest
 
@@ -22,9 +23,13 @@ def test_registered_pixels_are_copied_and_read_back(store):
     out = bytearray(16)
     assert _renderlib.tarsel_get_texture_pixels(index, out) == 16
     assert out == bytearray(range(16))
-    with pytest.raises(TypeError, match=r"^in method 'tarsel_get_texture_pixels', argument 2 of type '\(TYPEMAP, SIZE\)'$"):
+    with pytest.raises(
+        TypeError, match=r"^in method 'tarsel_get_texture_pixels', argument 2 of type '\(TYPEMAP, SIZE\)'$"
+    ):
         _renderlib.tarsel_get_texture_pixels(index, 16)
-    with pytest.raises(TypeError, match=r"^in method 'tarsel_register_flare_texture', argument 5 of type '\(RawImage\)'$"):
+    with pytest.raises(
+        TypeError, match=r"^in method 'tarsel_register_flare_texture', argument 5 of type '\(RawImage\)'$"
+    ):
         _renderlib.tarsel_register_flare_texture(2, 2, 4, 1, "pixels")
     with pytest.raises(TypeError, match=r"^in method 'tarsel_register_flare_texture', argument 3 of type 'int'$"):
         _renderlib.tarsel_register_flare_texture(2, 2, 4.0, 1, pixels)
@@ -63,8 +68,27 @@ def test_freeing_the_store_forgets_every_texture(store):
 def render_flare(effect, width=64, height=64, brightness=1.0):
     info, dest = effects.raster(_renderlib.pixel_rgba8, width, height)
     ok = _renderlib.render_tarsel_lensflare_to_native_image(
-        effect, "", width / 2, height / 2, dest, 0, 0, 1, 1, [info], [None], brightness, 1, 1.0, 0, 0,
-        "linear", "srgb", "linear", False)
+        effect,
+        "",
+        width / 2,
+        height / 2,
+        dest,
+        0,
+        0,
+        1,
+        1,
+        [info],
+        [None],
+        brightness,
+        1,
+        1.0,
+        0,
+        0,
+        "linear",
+        "srgb",
+        "linear",
+        False,
+    )
     return ok, dest
 
 

@@ -7,6 +7,7 @@ person can look at it.
 After a deliberate change of a kernel, refresh the stored results with
     RENDERLIB_UPDATE_GOLDEN=1 .venv/bin/python -m pytest tests/rendering/test_golden_renders.py
 and look at the PNGs before committing golden_renders.json."""
+
 import array
 import hashlib
 import json
@@ -42,37 +43,56 @@ SETTINGS = {
 # The less common settings, each rendered once more over the coloured card:
 # (label, effect, settings, pixel type name). Integer and half-float frames
 # are compared byte for byte, float frames by float_signature.
-VARIANTS = [
-    ("T_Blur edges Repeat", "T_Blur", {"edges": "Repeat", "radius": "12"}, "rgbaf"),
-    ("T_Blur edges Mirror", "T_Blur", {"edges": "Mirror", "radius": "12"}, "rgbaf"),
-    ("T_Blur quality Draft", "T_Blur", {"quality": "Draft", "radius": "12"}, "rgbaf"),
-] + [("T_Transform edges %s filter %s" % (edges, f), "T_Transform",
-      dict(SETTINGS["T_Transform"], scale="0.4 0.4", edges=edges, filter=f), "rgbaf")
-     for edges, f in (("Repeat", "Nearest"), ("Mirror", "Bilinear"), ("Clamp", "Bicubic"))] + [
-] + [("T_Blur in %s" % kind, "T_Blur", {"radius": "6"}, kind)
-     for kind in ("rgba16", "bgra16", "argb8", "la8", "l16", "rgba16f", "argbf")]
+VARIANTS = (
+    [
+        ("T_Blur edges Repeat", "T_Blur", {"edges": "Repeat", "radius": "12"}, "rgbaf"),
+        ("T_Blur edges Mirror", "T_Blur", {"edges": "Mirror", "radius": "12"}, "rgbaf"),
+        ("T_Blur quality Draft", "T_Blur", {"quality": "Draft", "radius": "12"}, "rgbaf"),
+    ]
+    + [
+        (
+            "T_Transform edges %s filter %s" % (edges, f),
+            "T_Transform",
+            dict(SETTINGS["T_Transform"], scale="0.4 0.4", edges=edges, filter=f),
+            "rgbaf",
+        )
+        for edges, f in (("Repeat", "Nearest"), ("Mirror", "Bilinear"), ("Clamp", "Bicubic"))
+    ]
+    + []
+    + [
+        ("T_Blur in %s" % kind, "T_Blur", {"radius": "6"}, kind)
+        for kind in ("rgba16", "bgra16", "argb8", "la8", "l16", "rgba16f", "argbf")
+    ]
+)
 
 
 # The coloured card resized with each filter: (label, filter, width, height, sharpness).
 # (Enlarging, the box filter is the bilinear one: its window covers one sample.)
-RESIZES = [("resize %s to %dx%d sharpness %g" % (name, w, h, sharp), f, w, h, sharp)
-           for f, name in enumerate(("box", "bilinear", "bicubic")) for w, h in ((40, 23), (150, 80))
-           for sharp in ((0.0, 1.0) if name == "bicubic" else (0.0,)) if (name, w) != ("box", 150)]
+RESIZES = [
+    ("resize %s to %dx%d sharpness %g" % (name, w, h, sharp), f, w, h, sharp)
+    for f, name in enumerate(("box", "bilinear", "bicubic"))
+    for w, h in ((40, 23), (150, 80))
+    for sharp in ((0.0, 1.0) if name == "bicubic" else (0.0,))
+    if (name, w) != ("box", 150)
+]
 
 
 def resized(filter, width, height, sharpness):
     source = card(_renderlib.pixel_rgbaf, "linear", SETTINGS["T_Gradient"])
     info = renderlib.T_RasterInfo()
     dest = bytearray(_renderlib.tarsel_get_resized_image_size(source[0], width, height, 0, 0, 1.0, 0))
-    assert _renderlib.tarsel_resize_native_image(source[0], source[1], width, height, 0, 0, 1.0, info, dest,
-                                                 filter, 0.0, 0.0, sharpness) == [width, height]
+    assert _renderlib.tarsel_resize_native_image(
+        source[0], source[1], width, height, 0, 0, 1.0, info, dest, filter, 0.0, 0.0, sharpness
+    ) == [width, height]
     return dest
 
 
 def float_signature(frame):
     """SHA-256 of the float frame's values rounded to 1e-4: close settings
     (a blur's edge mode, a filter) often keep the channel sums."""
-    return {"rounded_sha256": hashlib.sha256(numpy.round(numpy.frombuffer(frame, numpy.float32), 4).tobytes()).hexdigest()}
+    return {
+        "rounded_sha256": hashlib.sha256(numpy.round(numpy.frombuffer(frame, numpy.float32), 4).tobytes()).hexdigest()
+    }
 
 
 def card(pixel_type, colorspace, changes):
@@ -107,8 +127,10 @@ def results():
         eight_bit = render_frame(name, builder, _renderlib.pixel_rgba8, "srgb")
         png.write_rgba8(PICTURES / ("%s.png" % name), eight_bit, WIDTH, HEIGHT)
         floats = array.array("f", render_frame(name, builder, _renderlib.pixel_rgbaf, "linear"))
-        found[name] = {"rgba8_sha256": hashlib.sha256(eight_bit).hexdigest(),
-                       "rgbaf_channel_sums": [round(sum(floats[c::4]), 2) for c in range(4)]}
+        found[name] = {
+            "rgba8_sha256": hashlib.sha256(eight_bit).hexdigest(),
+            "rgbaf_channel_sums": [round(sum(floats[c::4]), 2) for c in range(4)],
+        }
     for label, name, settings, kind in VARIANTS:
         frame = render_frame(name, False, getattr(_renderlib, "pixel_" + kind), "linear", settings)
         if kind.endswith("f") and not kind.endswith("16f"):

@@ -3,6 +3,7 @@ during a render, from the render's own frame request, from a drawing method
 of its own widget call, and behind the module's back by the engine's own
 free. The instance lives until the last call using it returns; a call made
 after the free is refused. Each case runs in a process of its own."""
+
 import pytest
 
 from isolated import run_cleanly

@@ -1,5 +1,6 @@
 """Raster and render descriptors made and edited from Python, against the
 record's raw bytes."""
+
 import ctypes
 import struct
 
@@ -9,10 +10,32 @@ import _renderlib
 import renderlib
 
 # The 26 words of a raster descriptor; None for words the module does not name.
-WORDS = ["ds_xsize", "ds_ysize", "x_origin", "y_origin", "world_xsize", "world_ysize", "pixel_type", None,
-         "bit_depth", "raster_type", "sizeof_pixel", "clamp_p", "res_factor", "downsample_offset",
-         "extra_line_stride_elts", None, None, None, None, None, "flip_y_p", "levels_601_p", "is_premultiplied",
-         None]
+WORDS = [
+    "ds_xsize",
+    "ds_ysize",
+    "x_origin",
+    "y_origin",
+    "world_xsize",
+    "world_ysize",
+    "pixel_type",
+    None,
+    "bit_depth",
+    "raster_type",
+    "sizeof_pixel",
+    "clamp_p",
+    "res_factor",
+    "downsample_offset",
+    "extra_line_stride_elts",
+    None,
+    None,
+    None,
+    None,
+    None,
+    "flip_y_p",
+    "levels_601_p",
+    "is_premultiplied",
+    None,
+]
 WRITABLE = [name for name in WORDS[:15] if name]
 READ_ONLY = ["background_pixel", "flip_y_p", "levels_601_p", "is_premultiplied", "x_origin_float", "y_origin_float"]
 
@@ -38,8 +61,10 @@ def test_enumerated_fields_take_any_int_and_read_only_fields_refuse():
     assert (info.pixel_type, info.raster_type) == (16, -5)
     with pytest.raises(TypeError, match=r"^in method 'T_RasterInfo_pixel_type_set', argument 2 of type 'T_PixelType'$"):
         info.pixel_type = "rgba8"
-    with pytest.raises(OverflowError, match=r"^in method 'T_RasterInfo_raster_type_set', argument 2 of type 'T_RasterType'$"):
-        info.raster_type = 2 ** 31
+    with pytest.raises(
+        OverflowError, match=r"^in method 'T_RasterInfo_raster_type_set', argument 2 of type 'T_RasterType'$"
+    ):
+        info.raster_type = 2**31
     for name in READ_ONLY:
         with pytest.raises(AttributeError):
             setattr(info, name, 1)

@@ -1,4 +1,5 @@
 """Raster descriptors as 104-byte images and base64 text."""
+
 import base64
 import struct
 
@@ -8,7 +9,7 @@ from hypothesis import given, settings, strategies as st
 import _renderlib
 import renderlib
 
-WORDS = st.lists(st.integers(-2 ** 31, 2 ** 31 - 1), min_size=26, max_size=26)
+WORDS = st.lists(st.integers(-(2**31), 2**31 - 1), min_size=26, max_size=26)
 
 
 def record_from_words(words):
@@ -53,9 +54,13 @@ def test_from_bits_copies_the_first_104_bytes_of_the_texts_encoding():
     assert bytes(_renderlib.raster_info_to_bytearray(info)) == b"A" * 104
     with pytest.raises(ValueError, match="a raster descriptor image is 104 bytes"):
         _renderlib.make_tarsel_raster_info_from_bits(info, "A" * 103)
-    with pytest.raises(TypeError, match=r"^in method 'make_tarsel_raster_info_from_bits', argument 2 of type 'char const \*'$"):
+    with pytest.raises(
+        TypeError, match=r"^in method 'make_tarsel_raster_info_from_bits', argument 2 of type 'char const \*'$"
+    ):
         _renderlib.make_tarsel_raster_info_from_bits(info, b"A" * 104)
-    with pytest.raises(TypeError, match=r"^in method 'make_tarsel_raster_info_from_base64', argument 2 of type 'char const \*'$"):
+    with pytest.raises(
+        TypeError, match=r"^in method 'make_tarsel_raster_info_from_base64', argument 2 of type 'char const \*'$"
+    ):
         _renderlib.make_tarsel_raster_info_from_base64(info, 5)
     assert bytes(_renderlib.raster_info_to_bytearray(info)) == b"A" * 104  # refused calls change nothing
 
@@ -85,13 +90,19 @@ def test_the_decoder_writes_into_the_callers_bytes(shared_registry):
         _renderlib.base64decode("QUJD", dest, 4)
 
 
-@pytest.mark.parametrize("call, position, ctype", [
-    (lambda: _renderlib.make_tarsel_raster_info_from_base64(None, "AAAA"), 1, "T_RasterInfo *"),
-    (lambda: _renderlib.make_tarsel_raster_info_from_base64(renderlib.T_RasterInfo(), None), 2, "char const *"),
-    (lambda: _renderlib.make_tarsel_raster_info_from_bits(None, "A" * 104), 1, "T_RasterInfo *"),
-    (lambda: _renderlib.raster_info_to_bytearray(None), 1, "T_RasterInfo *"),
-])
+@pytest.mark.parametrize(
+    "call, position, ctype",
+    [
+        (lambda: _renderlib.make_tarsel_raster_info_from_base64(None, "AAAA"), 1, "T_RasterInfo *"),
+        (lambda: _renderlib.make_tarsel_raster_info_from_base64(renderlib.T_RasterInfo(), None), 2, "char const *"),
+        (lambda: _renderlib.make_tarsel_raster_info_from_bits(None, "A" * 104), 1, "T_RasterInfo *"),
+        (lambda: _renderlib.raster_info_to_bytearray(None), 1, "T_RasterInfo *"),
+    ],
+)
 def test_none_for_a_record_or_text_is_refused(call, position, ctype):
-    with pytest.raises(ValueError, match=r"^invalid null reference in method '\w+', argument %d of type '%s'$"
-                       % (position, ctype.replace("*", r"\*"))):
+    with pytest.raises(
+        ValueError,
+        match=r"^invalid null reference in method '\w+', argument %d of type '%s'$"
+        % (position, ctype.replace("*", r"\*")),
+    ):
         call()

@@ -1,5 +1,6 @@
 """How the render calls convert their twenty arguments. The engine's render is
 switched to return at once, so only the binding is exercised."""
+
 import numpy
 import pytest
 
@@ -17,17 +18,53 @@ def quick(probe, instance):
 
 
 def effect_arguments(effect, dest=None, rasters=None, images=None):
-    return [effect, "", bytearray(16) if dest is None else dest, 0, 0, 1, 1,
-            [renderlib.T_RasterInfo()] if rasters is None else rasters,
-            [bytearray(16)] if images is None else images,
-            1.0, 1, 1.0, 0, 0, 0, 25, False, "linear", "linear", "linear"]
+    return [
+        effect,
+        "",
+        bytearray(16) if dest is None else dest,
+        0,
+        0,
+        1,
+        1,
+        [renderlib.T_RasterInfo()] if rasters is None else rasters,
+        [bytearray(16)] if images is None else images,
+        1.0,
+        1,
+        1.0,
+        0,
+        0,
+        0,
+        25,
+        False,
+        "linear",
+        "linear",
+        "linear",
+    ]
 
 
 def flare_arguments(effect, dest=None, rasters=None, images=None):
-    return [effect, "", 0.5, 0.5, bytearray(16) if dest is None else dest, 0, 0, 1, 1,
-            [renderlib.T_RasterInfo()] if rasters is None else rasters,
-            [bytearray(16)] if images is None else images,
-            1.0, 1, 1.0, 0, 0, "linear", "linear", "linear", False]
+    return [
+        effect,
+        "",
+        0.5,
+        0.5,
+        bytearray(16) if dest is None else dest,
+        0,
+        0,
+        1,
+        1,
+        [renderlib.T_RasterInfo()] if rasters is None else rasters,
+        [bytearray(16)] if images is None else images,
+        1.0,
+        1,
+        1.0,
+        0,
+        0,
+        "linear",
+        "linear",
+        "linear",
+        False,
+    ]
 
 
 CALLS = [(EFFECT, effect_arguments, 3, 8, 9), (FLARE, flare_arguments, 5, 10, 11)]
@@ -41,7 +78,7 @@ def test_lists_and_buffers(quick, probe, name, arguments, dest_at, rasters_at, i
         probe.clear_calls()
         call(*arguments(quick, rasters=rasters, images=images))
         logged = probe.calls()[-1]
-        passed = logged[logged.index("(") + 1:-1].split(", ")
+        passed = logged[logged.index("(") + 1 : -1].split(", ")
         # Empty lists pass null arrays; lists of None pass arrays of null entries.
         assert passed[rasters_at - 1].startswith(arrays) and passed[images_at - 1].startswith(arrays)
     assert call(*arguments(quick, dest=bytes(16))) is True  # the destination needs no writability
@@ -55,17 +92,38 @@ def test_lists_and_buffers(quick, probe, name, arguments, dest_at, rasters_at, i
 
     assert call(*arguments(quick, rasters=ListSubclass([renderlib.T_RasterInfo()]))) is True
     refusals = [
-        (dict(rasters=(renderlib.T_RasterInfo(),)), "in %s, arg %d of type T_RasterInfo **: expected list." % (name, rasters_at)),
+        (
+            dict(rasters=(renderlib.T_RasterInfo(),)),
+            "in %s, arg %d of type T_RasterInfo **: expected list." % (name, rasters_at),
+        ),
         (dict(images=(bytearray(4),)), "in %s, arg %d of type RawImage *: expected list." % (name, images_at)),
-        (dict(rasters=[renderlib.T_RenderInfo()]), "in %s, arg %d of type T_RasterInfo **, elts should be T_RasterInfo" % (name, rasters_at)),
+        (
+            dict(rasters=[renderlib.T_RenderInfo()]),
+            "in %s, arg %d of type T_RasterInfo **, elts should be T_RasterInfo" % (name, rasters_at),
+        ),
         # a subclass under another name, and a bare pointer object, are refused alike
-        (dict(rasters=[MyRaster()]), "in %s, arg %d of type T_RasterInfo **, elts should be T_RasterInfo" % (name, rasters_at)),
-        (dict(rasters=[renderlib.T_RasterInfo().this]), "in %s, arg %d of type T_RasterInfo **, elts should be T_RasterInfo" % (name, rasters_at)),
-        (dict(rasters=[type("T_RasterInfo", (), {})()]),
-         "in method '%s', argument %d of type 'T_RasterInfo **': cannot convert to T_RasterInfo" % (name, rasters_at)),
+        (
+            dict(rasters=[MyRaster()]),
+            "in %s, arg %d of type T_RasterInfo **, elts should be T_RasterInfo" % (name, rasters_at),
+        ),
+        (
+            dict(rasters=[renderlib.T_RasterInfo().this]),
+            "in %s, arg %d of type T_RasterInfo **, elts should be T_RasterInfo" % (name, rasters_at),
+        ),
+        (
+            dict(rasters=[type("T_RasterInfo", (), {})()]),
+            "in method '%s', argument %d of type 'T_RasterInfo **': cannot convert to T_RasterInfo"
+            % (name, rasters_at),
+        ),
         (dict(images=[bytes(4)]), "in %s, arg %d, cannot get Py_buffer view; maybe has no size?" % (name, images_at)),
-        (dict(images=[numpy.zeros((4, 4))[:, ::2]]), "in %s, arg %d, cannot get Py_buffer view; maybe has no size?" % (name, images_at)),
-        (dict(images=[5]), "in %s, arg %d, list must contain objects that support the buffer protocol" % (name, images_at)),
+        (
+            dict(images=[numpy.zeros((4, 4))[:, ::2]]),
+            "in %s, arg %d, cannot get Py_buffer view; maybe has no size?" % (name, images_at),
+        ),
+        (
+            dict(images=[5]),
+            "in %s, arg %d, list must contain objects that support the buffer protocol" % (name, images_at),
+        ),
         (dict(dest="pixels"), "in method '%s', argument %d of type '(RawImage)'" % (name, dest_at)),
         # the exporter raises ValueError for a strided array; the destination is refused as TypeError all the same
         (dict(dest=numpy.zeros((4, 4))[:, ::2]), "in method '%s', argument %d of type '(RawImage)'" % (name, dest_at)),
@@ -76,16 +134,52 @@ def test_lists_and_buffers(quick, probe, name, arguments, dest_at, rasters_at, i
         assert str(raised.value) == message
 
 
-SCALARS = {EFFECT: {1: "EffectGlobals_t *", 2: "char const *", 4: "int", 5: "int", 6: "int", 7: "int", 10: "float",
-                    11: "int", 12: "float", 13: "int", 14: "int", 15: "int", 16: "int", 17: "bool",
-                    18: "char const *", 19: "char const *", 20: "char const *"},
-           FLARE: {1: "EffectGlobals_t *", 2: "char const *", 3: "float", 4: "float", 6: "int", 7: "int", 8: "int",
-                   9: "int", 12: "float", 13: "int", 14: "float", 15: "int", 16: "int", 17: "char const *",
-                   18: "char const *", 19: "char const *", 20: "bool"}}
+SCALARS = {
+    EFFECT: {
+        1: "EffectGlobals_t *",
+        2: "char const *",
+        4: "int",
+        5: "int",
+        6: "int",
+        7: "int",
+        10: "float",
+        11: "int",
+        12: "float",
+        13: "int",
+        14: "int",
+        15: "int",
+        16: "int",
+        17: "bool",
+        18: "char const *",
+        19: "char const *",
+        20: "char const *",
+    },
+    FLARE: {
+        1: "EffectGlobals_t *",
+        2: "char const *",
+        3: "float",
+        4: "float",
+        6: "int",
+        7: "int",
+        8: "int",
+        9: "int",
+        12: "float",
+        13: "int",
+        14: "float",
+        15: "int",
+        16: "int",
+        17: "char const *",
+        18: "char const *",
+        19: "char const *",
+        20: "bool",
+    },
+}
 BAD = {"EffectGlobals_t *": renderlib.Genotype(), "char const *": b"x", "int": 1.5, "float": "1", "bool": 1}
 
 
-@pytest.mark.parametrize("name, arguments", [(EFFECT, effect_arguments), (FLARE, flare_arguments)], ids=["effect", "flare"])
+@pytest.mark.parametrize(
+    "name, arguments", [(EFFECT, effect_arguments), (FLARE, flare_arguments)], ids=["effect", "flare"]
+)
 def test_every_scalar_position_names_itself(quick, name, arguments):
     call = getattr(_renderlib, name)
     for position, type_name in SCALARS[name].items():

@@ -1,5 +1,6 @@
 """Renders run without the interpreter lock: aborts from another thread,
 renders side by side, and Python threads that keep running meanwhile."""
+
 import threading
 import time
 
@@ -42,7 +43,10 @@ def test_an_abort_from_another_thread_ends_a_4k_render_quickly(instance, probe):
     assert str(outcome.get("error")) == "Tarsel Abort", outcome
     assert outcome["ended"] - asked < 0.2  # the engine stops within 50 ms; the rest is thread hand-over
     # The same instance renders correctly again once the request is cleared.
-    small_dest, small_source = effects.raster(_renderlib.pixel_rgba8, 32, 32), effects.raster(_renderlib.pixel_rgba8, 32, 32)
+    small_dest, small_source = (
+        effects.raster(_renderlib.pixel_rgba8, 32, 32),
+        effects.raster(_renderlib.pixel_rgba8, 32, 32),
+    )
     small_source[1][:] = bytes([255, 0, 0, 255]) * (32 * 32)
     assert effects.render(effect, small_dest, [small_source])
     assert small_dest[1][:4] == bytes([255, 0, 0, 255])
@@ -83,8 +87,10 @@ def test_two_renders_at_once_while_python_keeps_running(instance):
 
     solo = solo_rate()
     results = []
-    renderers = [threading.Thread(target=lambda job=job: results.append(effects.render(job[0], job[1], [job[2]])))
-                 for job in jobs]
+    renderers = [
+        threading.Thread(target=lambda job=job: results.append(effects.render(job[0], job[1], [job[2]])))
+        for job in jobs
+    ]
     counted["n"] = 0
     counter = threading.Thread(target=count)
     counter.start()

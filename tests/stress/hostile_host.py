@@ -7,6 +7,7 @@ send engine messages and abort renders. Run by test_hostile_host.py:
 Without "steady" the interpreter ends after a random part of SECONDS with
 every worker busy; with it, the workers stop and everything is freed at the
 end. The last line of output is a JSON object of counts and faults."""
+
 import collections
 import gc
 import json
@@ -88,8 +89,15 @@ def renderer(local):
 
 
 def drawer(local):
-    if attempt(lambda: _renderlib.tarsel_widget_draw(widget[0], "", 480, 270, 0.0, 0.0, 0.25, 0.25,
-                                                     [1920, 1080, 0]) or True, "draws") is None:
+    if (
+        attempt(
+            lambda: (
+                _renderlib.tarsel_widget_draw(widget[0], "", 480, 270, 0.0, 0.0, 0.25, 0.25, [1920, 1080, 0]) or True
+            ),
+            "draws",
+        )
+        is None
+    ):
         time.sleep(0.001)  # until the remaker puts a new instance in place, or the abort is cleared
 
 
@@ -108,9 +116,11 @@ def remaker(local):
 
 
 HANDLERS = [lambda level, text: None, lambda level, text: 1 / 0]  # the second raises on engine threads
-SWAPS = [(_renderlib.set_load_frame_impl, stress_frames.SharedFrameSource, "sources swapped"),
-         (_renderlib.tarsel_set_gfx_impl, Drawing, "drawings swapped"),
-         (_renderlib.set_error_handler, lambda: rng.choice(HANDLERS), "handlers swapped")]
+SWAPS = [
+    (_renderlib.set_load_frame_impl, stress_frames.SharedFrameSource, "sources swapped"),
+    (_renderlib.tarsel_set_gfx_impl, Drawing, "drawings swapped"),
+    (_renderlib.set_error_handler, lambda: rng.choice(HANDLERS), "handlers swapped"),
+]
 
 
 def swapper(local):
@@ -144,11 +154,14 @@ def worker(step, seed):
                 step(local)
         except BaseException as error:  # noqa: B902 - anything that escapes is a fault
             faults.append("%s: %r" % (step.__name__, error))
+
     return threading.Thread(target=run, daemon=True)
 
 
-threads = [worker(step, SEED * 10 + i) for i, step in enumerate([renderer] * 3 + [drawer, remaker, swapper, aborter,
-                                                                                  messenger])]
+threads = [
+    worker(step, SEED * 10 + i)
+    for i, step in enumerate([renderer] * 3 + [drawer, remaker, swapper, aborter, messenger])
+]
 for thread in threads:
     thread.start()
 if not STEADY:
@@ -170,6 +183,15 @@ for instance in slots + widget:
         _renderlib.free_tarsel_effect(instance)
 installed.clear()
 gc.collect()
-print(json.dumps(dict(counts, faults=faults, hung=[thread.name for thread in threads if thread.is_alive()],
-                      instances_left=probe.live_instances() - instances_before,
-                      rss_growth_kib=resident_kib() - rss_warm)), flush=True)
+print(
+    json.dumps(
+        dict(
+            counts,
+            faults=faults,
+            hung=[thread.name for thread in threads if thread.is_alive()],
+            instances_left=probe.live_instances() - instances_before,
+            rss_growth_kib=resident_kib() - rss_warm,
+        )
+    ),
+    flush=True,
+)

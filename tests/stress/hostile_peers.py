@@ -5,6 +5,7 @@ each death as the end of its wait, and reaps the dead at once or leaves them
 zombies for a while. Prints a JSON object of counts last.
 
     python hostile_peers.py NAME SECONDS SEED"""
+
 import collections
 import json
 import os
@@ -66,8 +67,10 @@ for sequence in range(10 ** 9):
 
 def dead(process):
     """Whether the process has died, reaped or not (waitid leaves a zombie as it is)."""
-    return process.returncode is not None or os.waitid(os.P_PID, process.pid,
-                                                       os.WEXITED | os.WNOHANG | os.WNOWAIT) is not None
+    return (
+        process.returncode is not None
+        or os.waitid(os.P_PID, process.pid, os.WEXITED | os.WNOHANG | os.WNOWAIT) is not None
+    )
 
 
 def resources():
@@ -84,7 +87,7 @@ faults, zombies = [], []
 
 def serve_one_peer(number):
     ledger = ledgers / str(number)
-    peer = subprocess.Popen([sys.executable, "-c", PEER, NAME, str(number), str(rng.randrange(10 ** 9)), ledger])
+    peer = subprocess.Popen([sys.executable, "-c", PEER, NAME, str(number), str(rng.randrange(10**9)), ledger])
     received = 0
     while True:
         # Until the peer is connected a server waits for a client for ever:

@@ -4,6 +4,7 @@ thread of the modes named on the command line started first:
     messages  an engine worker sending messages to a Python handler
     widgets   a daemon Python thread drawing widgets through a Python drawing object
 Exits with status 0 when the interpreter's end is clean."""
+
 import ctypes
 import sys
 import threading
@@ -28,7 +29,7 @@ def frames():
     _renderlib.set_load_frame_impl(slow_frames)
     echo = effects.recreate(_renderlib.init_tarsel_effect("T_Echo", False), {"echoes": "8"})
     dest, source = effects.raster(_renderlib.pixel_rgbaf, 64, 36), effects.raster(_renderlib.pixel_rgbaf, 64, 36)
-    for frame in range(10 ** 9):
+    for frame in range(10**9):
         effects.render(echo, dest, [source], frame=frame)
 
 
@@ -40,6 +41,7 @@ def messages():
 
 def widgets():
     from renderlib.widgets import SvgDrawing
+
     drawing = SvgDrawing(char_width=4)
     _renderlib.tarsel_set_gfx_impl(drawing)
     flare = _renderlib.init_tarsel_effect("T_LensFlare", False)

@@ -3,6 +3,7 @@ then ending the interpreter at random moments: no crash or hang, every render
 gives the pixels it gives alone, the steady run leaves nothing behind.
 RENDERLIB_HOSTILE_SECONDS sets the steady run's length (16 by default; the
 others live a tenth of it), RENDERLIB_HOSTILE_ENDINGS their number (24)."""
+
 import collections
 import concurrent.futures
 import json
@@ -30,8 +31,17 @@ def test_a_steady_hostile_host_leaves_nothing_behind():
     counts = run(SECONDS, 1, "steady")
     print("\nsteady run:", json.dumps(counts))
     assert counts["hung"] == [] and counts["instances_left"] == 0, counts
-    for done in ("renders", "renders aborted", "renders refused", "draws", "instances remade", "sources swapped",
-                 "drawings swapped", "handlers swapped", "messages sent"):
+    for done in (
+        "renders",
+        "renders aborted",
+        "renders refused",
+        "draws",
+        "instances remade",
+        "sources swapped",
+        "drawings swapped",
+        "handlers swapped",
+        "messages sent",
+    ):
         assert counts[done] > 0, (done, counts)
     assert UNDER_ADDRESS_SANITIZER or counts["rss_growth_kib"] < 8 * 1024, counts
 

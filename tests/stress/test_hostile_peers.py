@@ -2,6 +2,7 @@
 its reads (hostile_peers.py): no message committed and lost, duplicated,
 reordered or changed, and the survivor's descriptors, mappings and memory
 stay flat. RENDERLIB_PEER_STRESS_SECONDS sets the length (12 by default)."""
+
 import json
 import os
 import pathlib
@@ -14,8 +15,9 @@ SECONDS = float(os.environ.get("RENDERLIB_PEER_STRESS_SECONDS", "12"))
 
 def test_peers_dying_at_random_lose_no_committed_message():
     name = "rltest-%d-peers" % os.getpid()
-    done = run_python(pathlib.Path(__file__).with_name("hostile_peers.py").read_text(), SECONDS + 60,
-                      [name, SECONDS, 7])
+    done = run_python(
+        pathlib.Path(__file__).with_name("hostile_peers.py").read_text(), SECONDS + 60, [name, SECONDS, 7]
+    )
     assert done.returncode == 0 and done.stdout.strip(), "%s\n%s" % (ending(done), done.stderr[-3000:])
     counts = json.loads(done.stdout.strip().splitlines()[-1])
     print("\nhostile peers:", json.dumps(counts))

@@ -2,6 +2,7 @@
 are inside host callbacks or a Python thread draws widgets, and a render on
 the thread that ends it, after the module's exit step, ends as an abort.
 RENDERLIB_SHUTDOWN_RUNS sets the number of runs (100; the audit runs 1,000)."""
+
 import concurrent.futures
 import os
 import pathlib
@@ -16,6 +17,7 @@ SCRIPT = pathlib.Path(__file__).with_name("shutdown_script.py").read_text()
 
 def check_endings(runs, modes):
     """Runs shutdown_script.py with modes(i), four at a time: each exits with 0 within 5 s."""
+
     def run(index):
         try:
             done = run_python(SCRIPT, timeout=5, args=modes(index))
@@ -29,7 +31,7 @@ def check_endings(runs, modes):
 
 
 def test_the_interpreter_ends_cleanly_with_engine_threads_in_callbacks():
-    check_endings(RUNS, lambda index: ["frames", "messages"][:1 + index % 2])
+    check_endings(RUNS, lambda index: ["frames", "messages"][: 1 + index % 2])
 
 
 def test_the_interpreter_ends_cleanly_with_a_thread_drawing_widgets():
@@ -62,11 +64,16 @@ ENDING_THREAD_SCENARIOS = {
     # an atexit function registered before the module's own exit step
     "atexit": ("import atexit\natexit.register(lambda: render_late())", ""),
     # a finalizer run by the interpreter's exit, registered before the module
-    "finalize": ("import weakref\nclass Anchor: pass\nanchor = Anchor()\nweakref.finalize(anchor, lambda: None)",
-                 "weakref.finalize(anchor, render_late)"),
+    "finalize": (
+        "import weakref\nclass Anchor: pass\nanchor = Anchor()\nweakref.finalize(anchor, lambda: None)",
+        "weakref.finalize(anchor, render_late)",
+    ),
     # a __del__ run while the interpreter tears its modules down
-    "del": ("", "class Late:\n    def __del__(self, render_late=render_late):\n        render_late()\n"
-                "late = Late()\nlate.cycle = late"),
+    "del": (
+        "",
+        "class Late:\n    def __del__(self, render_late=render_late):\n        render_late()\n"
+        "late = Late()\nlate.cycle = late",
+    ),
 }
 
 

@@ -1,4 +1,5 @@
 """``python -m renderlib``: the binding's command line."""
+
 import sys
 
 from renderlib.cli import main

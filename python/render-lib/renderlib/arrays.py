@@ -10,6 +10,7 @@ alpha, three RGB, four RGBA. A render into numpy arrays takes three lines::
     glow = _renderlib.init_tarsel_effect("T_Glow", False)
     effects.render(glow, described(out), [described(source)])
 """
+
 from __future__ import annotations
 
 from typing import TYPE_CHECKING, Any, TypeVar
@@ -29,18 +30,29 @@ DEFAULT_LAYOUTS = {1: "L", 2: "LA", 3: "RGB", 4: "RGBA"}
 # (layout, dtype) -> the engine's pixel type. 16-bit values are native byte
 # order; float16 is IEEE half precision.
 PIXEL_TYPES = {
-    ("L", "uint8"): _renderlib.pixel_l8, ("A", "uint8"): _renderlib.pixel_a8,
-    ("LA", "uint8"): _renderlib.pixel_la8, ("RGB", "uint8"): _renderlib.pixel_rgb8,
-    ("BGR", "uint8"): _renderlib.pixel_bgr8, ("RGBA", "uint8"): _renderlib.pixel_rgba8,
-    ("BGRA", "uint8"): _renderlib.pixel_bgra8, ("ARGB", "uint8"): _renderlib.pixel_argb8,
-    ("L", "uint16"): _renderlib.pixel_l16, ("A", "uint16"): _renderlib.pixel_a16,
-    ("LA", "uint16"): _renderlib.pixel_la16, ("RGB", "uint16"): _renderlib.pixel_rgb16,
-    ("RGBA", "uint16"): _renderlib.pixel_rgba16, ("BGRA", "uint16"): _renderlib.pixel_bgra16,
+    ("L", "uint8"): _renderlib.pixel_l8,
+    ("A", "uint8"): _renderlib.pixel_a8,
+    ("LA", "uint8"): _renderlib.pixel_la8,
+    ("RGB", "uint8"): _renderlib.pixel_rgb8,
+    ("BGR", "uint8"): _renderlib.pixel_bgr8,
+    ("RGBA", "uint8"): _renderlib.pixel_rgba8,
+    ("BGRA", "uint8"): _renderlib.pixel_bgra8,
+    ("ARGB", "uint8"): _renderlib.pixel_argb8,
+    ("L", "uint16"): _renderlib.pixel_l16,
+    ("A", "uint16"): _renderlib.pixel_a16,
+    ("LA", "uint16"): _renderlib.pixel_la16,
+    ("RGB", "uint16"): _renderlib.pixel_rgb16,
+    ("RGBA", "uint16"): _renderlib.pixel_rgba16,
+    ("BGRA", "uint16"): _renderlib.pixel_bgra16,
     ("ARGB", "uint16"): _renderlib.pixel_argb16,
-    ("L", "float32"): _renderlib.pixel_lf, ("A", "float32"): _renderlib.pixel_af,
-    ("LA", "float32"): _renderlib.pixel_laf, ("RGB", "float32"): _renderlib.pixel_rgbf,
-    ("RGBA", "float32"): _renderlib.pixel_rgbaf, ("ARGB", "float32"): _renderlib.pixel_argbf,
-    ("A", "float16"): _renderlib.pixel_a16f, ("RGB", "float16"): _renderlib.pixel_rgb16f,
+    ("L", "float32"): _renderlib.pixel_lf,
+    ("A", "float32"): _renderlib.pixel_af,
+    ("LA", "float32"): _renderlib.pixel_laf,
+    ("RGB", "float32"): _renderlib.pixel_rgbf,
+    ("RGBA", "float32"): _renderlib.pixel_rgbaf,
+    ("ARGB", "float32"): _renderlib.pixel_argbf,
+    ("A", "float16"): _renderlib.pixel_a16f,
+    ("RGB", "float16"): _renderlib.pixel_rgb16f,
     ("RGBA", "float16"): _renderlib.pixel_rgba16f,
 }
 LAYOUTS = {pixel_type: (layout, numpy.dtype(dtype)) for (layout, dtype), pixel_type in PIXEL_TYPES.items()}
@@ -67,8 +79,10 @@ def raster_info_for(array: NDArray[Any], layout: str | None = None) -> renderlib
     info.pixel_type = pixel_type
     size = _renderlib.make_tarsel_raster_info(info, width, height)
     if size != array.nbytes:
-        raise ValueError("the engine lays out %dx%d %s pixels of %s in %d bytes, the array has %d"
-                         % (width, height, layout, array.dtype.name, size, array.nbytes))
+        raise ValueError(
+            "the engine lays out %dx%d %s pixels of %s in %d bytes, the array has %d"
+            % (width, height, layout, array.dtype.name, size, array.nbytes)
+        )
     return info
 
 

@@ -6,6 +6,7 @@ Exit status: 0 done; 1 the engine did not render; 2 a usage error (unknown
 effect, parameter or value, bad option); 3 module and engine were built
 apart; 4 an image file could not be read or written; 5 a monitor device
 failed."""
+
 from __future__ import annotations
 
 import argparse
@@ -47,8 +48,9 @@ def user_identity() -> str | None:
     if hasattr(os, "geteuid"):
         return "S-1-22-1-%d" % os.geteuid()
     try:
-        out = subprocess.run(["whoami", "/user", "/fo", "csv", "/nh"],
-                             capture_output=True, text=True, check=True).stdout
+        out = subprocess.run(
+            ["whoami", "/user", "/fo", "csv", "/nh"], capture_output=True, text=True, check=True
+        ).stdout
     except (OSError, subprocess.CalledProcessError):
         return None
     return out.strip().split(",")[-1].strip('"') or None
@@ -83,6 +85,7 @@ def list_effects(_args: argparse.Namespace) -> int:
 def describe(args: argparse.Namespace) -> int:
     """An effect's inputs and parameters: type, default, limits, states, group."""
     from renderlib.rendering import effect_instance
+
     instance = effect_instance(args.effect)
     try:
         genotype = instance.effect_genotype
@@ -96,14 +99,24 @@ def describe(args: argparse.Namespace) -> int:
             if not name:
                 continue
             lower, upper, _, _ = param.get_limits()
-            limits = "" if param.ptype_name() in ("popup", "boolean", "push button") else \
-                "  [%s .. %s]" % (_number(lower), _number(upper))
+            limits = (
+                ""
+                if param.ptype_name() in ("popup", "boolean", "push button")
+                else "  [%s .. %s]" % (_number(lower), _number(upper))
+            )
             states = param.get_state_names()
             group = genotype.get_param_group_name(param)
-            print("  %-18s %-12s default %s%s%s%s" % (
-                name, param.ptype_name(), param.to_string(None) or '""', limits,
-                "  states: %s" % " | ".join(map(str, states)) if states else "",
-                "  group: %s" % group if group else ""))
+            print(
+                "  %-18s %-12s default %s%s%s%s"
+                % (
+                    name,
+                    param.ptype_name(),
+                    param.to_string(None) or '""',
+                    limits,
+                    "  states: %s" % " | ".join(map(str, states)) if states else "",
+                    "  group: %s" % group if group else "",
+                )
+            )
     finally:
         _renderlib.free_tarsel_effect(instance)
     return 0
@@ -144,7 +157,7 @@ def frame_path(pattern: str | os.PathLike[str], frame: int) -> str:
     pattern = str(pattern)
     hashes = re.search(r"#+", pattern)
     if hashes:
-        return pattern[:hashes.start()] + "%0*d" % (len(hashes.group()), frame) + pattern[hashes.end():]
+        return pattern[: hashes.start()] + "%0*d" % (len(hashes.group()), frame) + pattern[hashes.end() :]
     if re.search(r"%0?\d*d", pattern):
         return pattern % frame
     return pattern
@@ -157,6 +170,7 @@ def _is_sequence(pattern: str | os.PathLike[str]) -> bool:
 def _inputs(paths: Iterable[str]) -> list[Callable[..., NDArray[numpy.float32]]]:
     """One frame function per input file (a sequence pattern or a still)."""
     from renderlib.images import read_image
+
     sources = []
     for path in paths:
         if _is_sequence(path):
@@ -169,12 +183,14 @@ def _inputs(paths: Iterable[str]) -> list[Callable[..., NDArray[numpy.float32]]]
 
 def _renderer(args: argparse.Namespace, width: int, height: int) -> EffectRenderer:
     from renderlib.rendering import EffectRenderer, card_frame
+
     sources = _inputs(args.input)
     renderer = EffectRenderer(args.effect, dict(args.param), colorspace=args.colorspace)
     if len(sources) > renderer.n_inputs:
         renderer.close()
-        raise CommandError("%s takes %d input(s), %d given" % (args.effect, renderer.n_inputs, len(sources)),
-                           EXIT_USAGE)
+        raise CommandError(
+            "%s takes %d input(s), %d given" % (args.effect, renderer.n_inputs, len(sources)), EXIT_USAGE
+        )
     # Inputs not given see the test card, so every effect has something to work on.
     sources += [lambda frame: card_frame(width, height, frame)] * (renderer.n_inputs - len(sources))
     renderer.inputs = list(sources)
@@ -186,6 +202,7 @@ def _frame_size(args: argparse.Namespace) -> tuple[int, int]:
         return cast("tuple[int, int]", args.size)
     if args.input:
         from renderlib.images import read_image
+
         first = read_image(frame_path(args.input[0], args.frames[0]))
         return first.shape[1], first.shape[0]
     return 640, 360
@@ -193,17 +210,21 @@ def _frame_size(args: argparse.Namespace) -> tuple[int, int]:
 
 def _progress(frames: Iterable[_Item], args: argparse.Namespace, what: str) -> Iterable[_Item]:
     from tqdm import tqdm  # type: ignore[import-untyped,unused-ignore]
-    return cast("Iterable[_Item]", tqdm(frames, desc=what, unit="frame", disable=True if args.quiet else None,
-                                        file=sys.stderr))
+
+    return cast(
+        "Iterable[_Item]", tqdm(frames, desc=what, unit="frame", disable=True if args.quiet else None, file=sys.stderr)
+    )
 
 
 def render(args: argparse.Namespace) -> int:
     """Render frames of an effect to image files."""
     if len(args.frames) > 1 and not _is_sequence(args.output):
-        raise CommandError("rendering %d frames needs an output pattern such as out.####.png" % len(args.frames),
-                           EXIT_USAGE)
+        raise CommandError(
+            "rendering %d frames needs an output pattern such as out.####.png" % len(args.frames), EXIT_USAGE
+        )
     width, height = _frame_size(args)
     from renderlib.images import write_image
+
     with _renderer(args, width, height) as renderer:
         for frame in _progress(args.frames, args, args.effect):
             write_image(frame_path(args.output, frame), renderer.render(frame, width, height), args.depth)
@@ -215,12 +236,14 @@ def render(args: argparse.Namespace) -> int:
 def monitor(args: argparse.Namespace) -> int:
     """Show frames of an effect on a monitor device."""
     from renderlib.monitor import Monitor, devices
+
     if args.list or not args.effect:
         for device, modes in devices().items():
             print("%-10s %s" % (device, " ".join(modes)))
         return 0
     import numpy
     from renderlib.images import quantised
+
     with Monitor(args.device, args.mode) as output:
         with _renderer(args, output.width, output.height) as renderer:
             for frame in _progress(args.frames, args, "%s on %s" % (args.effect, args.device)):
@@ -235,9 +258,11 @@ def monitor(args: argparse.Namespace) -> int:
 def contact_sheet(args: argparse.Namespace) -> int:
     """Render every effect of both catalogues and a contact sheet of them all."""
     from renderlib.contact_sheet import make_contact_sheet
+
     folder = pathlib.Path(args.output)
-    sheet = make_contact_sheet(folder, args.size or (320, 180), args.frame,
-                               lambda items: _progress(items, args, "effects"))
+    sheet = make_contact_sheet(
+        folder, args.size or (320, 180), args.frame, lambda items: _progress(items, args, "effects")
+    )
     if not args.quiet:
         print("%s: every effect, and the contact sheet %s" % (folder, sheet))
     return 0
@@ -245,21 +270,37 @@ def contact_sheet(args: argparse.Namespace) -> int:
 
 def _add_render_options(command: argparse.ArgumentParser, output_required: bool) -> None:
     command.add_argument("effect", nargs=None if output_required else "?", help="plug-in name, such as T_Blur")
-    command.add_argument("-i", "--input", action="append", default=[], metavar="IMAGE",
-                         help="an input image, in input order; a pattern with #### is a sequence "
-                              "(inputs not given see a test card)")
-    command.add_argument("-p", "--param", action="append", default=[], type=parameter, metavar="NAME=VALUE",
-                         help="a parameter value in the engine's text form (repeatable)")
-    command.add_argument("-f", "--frames", type=frame_range, default=range(0, 1), metavar="FIRST-LAST",
-                         help="frames to render (0)")
+    command.add_argument(
+        "-i",
+        "--input",
+        action="append",
+        default=[],
+        metavar="IMAGE",
+        help="an input image, in input order; a pattern with #### is a sequence (inputs not given see a test card)",
+    )
+    command.add_argument(
+        "-p",
+        "--param",
+        action="append",
+        default=[],
+        type=parameter,
+        metavar="NAME=VALUE",
+        help="a parameter value in the engine's text form (repeatable)",
+    )
+    command.add_argument(
+        "-f", "--frames", type=frame_range, default=range(0, 1), metavar="FIRST-LAST", help="frames to render (0)"
+    )
     command.add_argument("--colorspace", default="srgb", help="output colour space (srgb)")
     command.add_argument("-q", "--quiet", action="store_true", help="no progress bar or summary")
 
 
 def parser() -> argparse.ArgumentParser:
-    parser = argparse.ArgumentParser(prog="renderlib", description=__doc__.split("\n\n")[0],
-                                     formatter_class=argparse.RawDescriptionHelpFormatter,
-                                     epilog=__doc__.split("\n\n")[1])
+    parser = argparse.ArgumentParser(
+        prog="renderlib",
+        description=__doc__.split("\n\n")[0],
+        formatter_class=argparse.RawDescriptionHelpFormatter,
+        epilog=__doc__.split("\n\n")[1],
+    )
     commands = parser.add_subparsers(dest="command", required=True, metavar="COMMAND")
     commands.add_parser("list", help=list_effects.__doc__).set_defaults(run=list_effects)
     info = commands.add_parser("info", help=describe.__doc__)
@@ -267,11 +308,17 @@ def parser() -> argparse.ArgumentParser:
     info.set_defaults(run=describe)
     render_command = commands.add_parser("render", help=render.__doc__)
     _add_render_options(render_command, True)
-    render_command.add_argument("-o", "--output", required=True, metavar="IMAGE",
-                                help="image file to write (.png, .tif, ...); out.####.png for a sequence")
+    render_command.add_argument(
+        "-o",
+        "--output",
+        required=True,
+        metavar="IMAGE",
+        help="image file to write (.png, .tif, ...); out.####.png for a sequence",
+    )
     render_command.add_argument("--size", type=size, help="WIDTHxHEIGHT (the first input's, or 640x360)")
-    render_command.add_argument("--depth", choices=("8", "16", "float"), default="8",
-                                help="bits a channel of TIFF output (8)")
+    render_command.add_argument(
+        "--depth", choices=("8", "16", "float"), default="8", help="bits a channel of TIFF output (8)"
+    )
     render_command.set_defaults(run=render)
     monitor_command = commands.add_parser("monitor", help=monitor.__doc__)
     _add_render_options(monitor_command, False)
@@ -294,6 +341,7 @@ def main(argv: Sequence[str] | None = None) -> int:
     from renderlib.images import ImageFileError
     from renderlib.monitor import MonitorError
     from renderlib.rendering import EffectError, RenderError
+
     try:
         return cast(int, args.run(args))
     except CommandError as error:

@@ -1,6 +1,7 @@
 """Every effect of both catalogues rendered over the test card, one image
 file each, laid out on one contact sheet; and the lens flare's on-screen
 widgets drawn over its render."""
+
 from __future__ import annotations
 
 import pathlib
@@ -49,14 +50,19 @@ def second_card(width: int, height: int, frame: int) -> NDArray[numpy.float32]:
     return card
 
 
-def render_every_effect(folder: pathlib.Path, size: tuple[int, int], frame: int,
-                        progress: _Progress = iter) -> list[tuple[str, NDArray[numpy.float32]]]:
+def render_every_effect(
+    folder: pathlib.Path, size: tuple[int, int], frame: int, progress: _Progress = iter
+) -> list[tuple[str, NDArray[numpy.float32]]]:
     """Renders each effect to <folder>/<plug-in>.png; [(name, rgba)]."""
     width, height = size
     inputs = [lambda f: card_frame(width, height, f), lambda f: second_card(width, height, f)]
     renders = []
-    names = [entry.plugin_name for builder in (False, True) for entry in effects.catalogue(builder)
-             if entry is not None and entry.plugin_name is not None]
+    names = [
+        entry.plugin_name
+        for builder in (False, True)
+        for entry in effects.catalogue(builder)
+        if entry is not None and entry.plugin_name is not None
+    ]
     for name in progress(names):
         with EffectRenderer(name, showcase_params(name, width, height), inputs) as renderer:
             rgba = renderer.render(frame, width, height)
@@ -68,6 +74,7 @@ def render_every_effect(folder: pathlib.Path, size: tuple[int, int], frame: int,
 def sheet_image(renders: Sequence[tuple[str, NDArray[Any]]]) -> Image.Image:
     """The renders in a grid, each labelled with its plug-in name."""
     from PIL import Image, ImageDraw
+
     height, width = renders[0][1].shape[:2]
     rows = (len(renders) + COLUMNS - 1) // COLUMNS
     sheet = Image.new("RGB", (COLUMNS * (width + 8) + 8, rows * (height + LABEL_HEIGHT + 8) + 8), (24, 24, 28))
@@ -83,6 +90,7 @@ def sheet_image(renders: Sequence[tuple[str, NDArray[Any]]]) -> Image.Image:
 def widget_overlay(size: tuple[int, int], frame: int) -> Image.Image:
     """The lens flare rendered, with its widgets drawn over it (Pillow image)."""
     from PIL import Image
+
     width, height = size
     with EffectRenderer("T_LensFlare", None, [lambda f: card_frame(width, height, f)]) as renderer:
         rgba = renderer.render(frame, width, height)
@@ -90,15 +98,17 @@ def widget_overlay(size: tuple[int, int], frame: int) -> Image.Image:
         _renderlib.tarsel_set_gfx_impl(drawing)
         try:
             # The viewer shows the whole frame at one screen pixel per frame pixel.
-            _renderlib.tarsel_widget_draw(renderer.instance, "", width, height, 0.0, 0.0, 1.0, 1.0,
-                                          [width, height, frame])
+            _renderlib.tarsel_widget_draw(
+                renderer.instance, "", width, height, 0.0, 0.0, 1.0, 1.0, [width, height, frame]
+            )
         finally:
             _renderlib.tarsel_set_gfx_impl(None)
     return drawing.paint(Image.fromarray(quantised(rgba, "8"), "RGBA").convert("RGB"))
 
 
-def make_contact_sheet(folder: StrPath, size: tuple[int, int] = (320, 180), frame: int = 12,
-                       progress: _Progress = iter) -> pathlib.Path:
+def make_contact_sheet(
+    folder: StrPath, size: tuple[int, int] = (320, 180), frame: int = 12, progress: _Progress = iter
+) -> pathlib.Path:
     """Writes every effect's render, contact-sheet.png and widgets.png into
     `folder`; returns the contact sheet's path."""
     folder = pathlib.Path(folder)

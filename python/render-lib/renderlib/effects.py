@@ -5,6 +5,7 @@ Saved text is what ``init_tarsel_effect_from_string`` takes: a JSON object
 ``{"effect": plug-in name, "builder": bool, "params": {canonical name: text}}``
 where each text is the parameter's ``to_string`` form. Changing values from
 Python goes through it: ``recreate(instance, {"radius": "12"})``."""
+
 from __future__ import annotations
 
 import json
@@ -53,12 +54,14 @@ def saved_text(instance: renderlib.EffectGlobals_t, changes: Mapping[str, str | 
         if name not in texts:
             raise KeyError("%s has no parameter %r" % (instance.plugin_name, name))
         texts[name] = text
-    return json.dumps({"effect": instance.plugin_name, "builder": is_builder_effect(instance.plugin_name),
-                       "params": texts})
+    return json.dumps(
+        {"effect": instance.plugin_name, "builder": is_builder_effect(instance.plugin_name), "params": texts}
+    )
 
 
-def recreate(instance: renderlib.EffectGlobals_t,
-             changes: Mapping[str, str | None] | None = None) -> renderlib.EffectGlobals_t | None:
+def recreate(
+    instance: renderlib.EffectGlobals_t, changes: Mapping[str, str | None] | None = None
+) -> renderlib.EffectGlobals_t | None:
     """A new instance of the same effect with the same values, `changes`
     applied; None when the engine refuses the saved text as a whole. A value
     text the engine cannot read is left at the effect's default with an
@@ -77,9 +80,14 @@ def raster(pixel_type: int, width: int, height: int) -> tuple[renderlib.T_Raster
     return info, bytearray(size)
 
 
-def render(instance: renderlib.EffectGlobals_t | None, dest: tuple[renderlib.T_RasterInfo | None, Buffer],
-           inputs: Sequence[tuple[renderlib.T_RasterInfo | None, Buffer | None] | None] = (),
-           previous: Buffer | None = None, frame: int = 0, colorspace: str | None = "linear") -> bool:
+def render(
+    instance: renderlib.EffectGlobals_t | None,
+    dest: tuple[renderlib.T_RasterInfo | None, Buffer],
+    inputs: Sequence[tuple[renderlib.T_RasterInfo | None, Buffer | None] | None] = (),
+    previous: Buffer | None = None,
+    frame: int = 0,
+    colorspace: str | None = "linear",
+) -> bool:
     """Renders one frame of `instance` into `dest`, a (T_RasterInfo, buffer)
     pair, from `inputs`, a sequence of such pairs or None for an unconnected
     input, with `previous` the previous output's buffer (or None). Returns the
@@ -87,5 +95,24 @@ def render(instance: renderlib.EffectGlobals_t | None, dest: tuple[renderlib.T_R
     rasters = [dest[0]] + [pair[0] if pair else None for pair in inputs]
     images = [previous] + [pair[1] if pair else None for pair in inputs]
     return _renderlib.render_tarsel_effect_to_native_image(
-        instance, "", dest[1], frame, 0, 1, 1, rasters, images, 1.0, len(rasters), 1.0, 0, 0, 0, 25, False,
-        colorspace, colorspace, "linear")
+        instance,
+        "",
+        dest[1],
+        frame,
+        0,
+        1,
+        1,
+        rasters,
+        images,
+        1.0,
+        len(rasters),
+        1.0,
+        0,
+        0,
+        0,
+        25,
+        False,
+        colorspace,
+        colorspace,
+        "linear",
+    )

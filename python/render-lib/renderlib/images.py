@@ -4,6 +4,7 @@ PNG and most other formats go through Pillow (8 bits a channel; 16-bit
 greyscale PNG is read at full depth). TIFF goes through tifffile: read at
 any of 8 bits, 16 bits or 32-bit float a channel, written at the depth asked.
 """
+
 from __future__ import annotations
 
 import pathlib
@@ -54,11 +55,13 @@ def read_image(path: StrPath) -> NDArray[numpy.float32]:
     try:
         if path.suffix.lower() in TIFF_SUFFIXES:
             import tifffile
+
             array = tifffile.imread(path)
             if array.ndim == 3 and array.shape[0] <= 4 < array.shape[2]:
                 array = numpy.moveaxis(array, 0, 2)  # planar channels
             return _as_rgba(array)
         from PIL import Image
+
         with Image.open(path) as image:
             if image.mode in ("I;16", "I;16B", "I;16L", "I"):
                 return _as_rgba(numpy.asarray(image).astype(numpy.uint16))
@@ -67,8 +70,7 @@ def read_image(path: StrPath) -> NDArray[numpy.float32]:
         raise ImageFileError("cannot read %s: %s" % (path, error)) from error
 
 
-def quantised(rgba: ArrayLike, depth: str
-              ) -> NDArray[numpy.uint8] | NDArray[numpy.uint16] | NDArray[numpy.float32]:
+def quantised(rgba: ArrayLike, depth: str) -> NDArray[numpy.uint8] | NDArray[numpy.uint16] | NDArray[numpy.float32]:
     """float RGBA as the array a file of `depth` ("8", "16", "float") stores."""
     if depth == "float":
         return numpy.ascontiguousarray(rgba, numpy.float32)
@@ -85,12 +87,15 @@ def write_image(path: StrPath, rgba: ArrayLike, depth: str = "8") -> None:
     try:
         if path.suffix.lower() in TIFF_SUFFIXES:
             import tifffile
-            tifffile.imwrite(path, quantised(rgba, depth), photometric="rgb", extrasamples=["unassalpha"],
-                             compression="zlib")
+
+            tifffile.imwrite(
+                path, quantised(rgba, depth), photometric="rgb", extrasamples=["unassalpha"], compression="zlib"
+            )
             return
         if depth != "8":
             raise ValueError("%s files are written at 8 bits a channel; use .tif for %s" % (path.suffix, depth))
         from PIL import Image
+
         image = Image.fromarray(quantised(rgba, "8"), "RGBA")
         if path.suffix.lower() in (".jpg", ".jpeg", ".bmp"):
             image = image.convert("RGB")

@@ -7,6 +7,7 @@ of that mode's size, with failures raised instead of returned.
 
 The flat functions (``EM_Display_connect`` and the rest) stay available for
 anything else; they return the library's status and check no sizes."""
+
 from __future__ import annotations
 
 from typing import TYPE_CHECKING
@@ -16,8 +17,17 @@ import _renderlib
 if TYPE_CHECKING:
     from typing_extensions import Buffer, Self
 
-STATUS_NAMES = {getattr(_renderlib, name): name for name in (
-    "EM_errorNone", "EM_errorParam", "EM_errorNotFound", "EM_errorAllocate", "EM_errorLast", "EM_errorDevice")}
+STATUS_NAMES = {
+    getattr(_renderlib, name): name
+    for name in (
+        "EM_errorNone",
+        "EM_errorParam",
+        "EM_errorNotFound",
+        "EM_errorAllocate",
+        "EM_errorLast",
+        "EM_errorDevice",
+    )
+}
 
 
 class MonitorError(RuntimeError):
@@ -36,8 +46,10 @@ def devices() -> dict[str, list[str]]:
     if display is None:
         raise MonitorError("EM_DisplayInit")
     try:
-        return {device: _renderlib.EM_Display_device_modes(display, device)
-                for device in _renderlib.EM_Display_devices(display)}
+        return {
+            device: _renderlib.EM_Display_device_modes(display, device)
+            for device in _renderlib.EM_Display_devices(display)
+        }
     finally:
         _renderlib.release_external_monitor(display)
 
@@ -59,9 +71,17 @@ class Monitor:
         self.width = _renderlib.EM_Display_get_width(self._display, device)
         self.height = _renderlib.EM_Display_get_height(self._display, device)
 
-    def show(self, pixels: Buffer, format: int = _renderlib.EM_ImageFormat_32BitIntBGRA, name: str | None = None,
-             bottom_up: bool = False, pixel_aspect: float = 1.0, gamma: float = 0.0, premultiplied: bool = False,
-             full_range: bool = True) -> None:
+    def show(
+        self,
+        pixels: Buffer,
+        format: int = _renderlib.EM_ImageFormat_32BitIntBGRA,
+        name: str | None = None,
+        bottom_up: bool = False,
+        pixel_aspect: float = 1.0,
+        gamma: float = 0.0,
+        premultiplied: bool = False,
+        full_range: bool = True,
+    ) -> None:
         """Shows one frame: `pixels` is any C-contiguous buffer of width x
         height 32-bit pixels in `format`, top row first unless `bottom_up`."""
         if self._display is None:
@@ -71,11 +91,24 @@ class Monitor:
             raise ValueError("the frame's pixels are not C-contiguous")
         size = view.nbytes
         if size < self.width * self.height * 4:
-            raise ValueError("a %dx%d frame needs %d bytes, the buffer has %d"
-                             % (self.width, self.height, self.width * self.height * 4, size))
+            raise ValueError(
+                "a %dx%d frame needs %d bytes, the buffer has %d"
+                % (self.width, self.height, self.width * self.height * 4, size)
+            )
         image = _renderlib.EM_Display_EM_XIImageWrapper(
-            self._display, pixels, self.width, self.height, self.width * 4, name, bottom_up, format,
-            pixel_aspect, gamma, premultiplied, full_range)
+            self._display,
+            pixels,
+            self.width,
+            self.height,
+            self.width * 4,
+            name,
+            bottom_up,
+            format,
+            pixel_aspect,
+            gamma,
+            premultiplied,
+            full_range,
+        )
         if image is None:
             raise MonitorError("describing the frame")
         status = _renderlib.EM_Display_display_frame(self._display, self.device, image)

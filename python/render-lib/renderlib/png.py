@@ -1,4 +1,5 @@
 """A minimal PNG writer for 8-bit RGBA frames (the standard library's zlib)."""
+
 from __future__ import annotations
 
 import struct
@@ -19,12 +20,13 @@ def encode_rgba8(pixels: bytes | bytearray | memoryview, width: int, height: int
     row = width * 4
     if len(pixels) < row * height:
         raise ValueError("%d bytes do not hold %dx%d RGBA pixels" % (len(pixels), width, height))
-    raw = b"".join(b"\0" + bytes(pixels[y * row:(y + 1) * row]) for y in range(height))
+    raw = b"".join(b"\0" + bytes(pixels[y * row : (y + 1) * row]) for y in range(height))
     header = struct.pack(">IIBBBBB", width, height, 8, 6, 0, 0, 0)
-    return b"\x89PNG\r\n\x1a\n" + _chunk(b"IHDR", header) + _chunk(b"IDAT", zlib.compress(raw, 6)) + _chunk(b"IEND", b"")
+    return (
+        b"\x89PNG\r\n\x1a\n" + _chunk(b"IHDR", header) + _chunk(b"IDAT", zlib.compress(raw, 6)) + _chunk(b"IEND", b"")
+    )
 
 
-def write_rgba8(path: FileDescriptorOrPath, pixels: bytes | bytearray | memoryview, width: int,
-                height: int) -> None:
+def write_rgba8(path: FileDescriptorOrPath, pixels: bytes | bytearray | memoryview, width: int, height: int) -> None:
     with open(path, "wb") as out:
         out.write(encode_rgba8(pixels, width, height))

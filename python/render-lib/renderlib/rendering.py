@@ -6,6 +6,7 @@ other frames served to the engine when an effect asks for them.
 
 An input is a function of the frame number giving a float32 RGBA array
 (height, width, 4), or None for an unconnected input."""
+
 from __future__ import annotations
 
 from typing import TYPE_CHECKING
@@ -47,11 +48,11 @@ def card_frame(width: int, height: int, frame: int = 0) -> NDArray[numpy.float32
     bars = [(1, 1, 1), (1, 1, 0), (0, 1, 1), (0, 1, 0), (1, 0, 1), (1, 0, 0), (0, 0, 1)]
     top = height - max(height // 6, 1)
     for i, colour in enumerate(bars):
-        card[top:, i * width // len(bars):(i + 1) * width // len(bars), :3] = colour
+        card[top:, i * width // len(bars) : (i + 1) * width // len(bars), :3] = colour
     side = max(height // 5, 1)
     left = (frame % 25) * (width - side) // 24
     upper = (top - side) // 2
-    card[upper:upper + side, left:left + side, :3] = 1
+    card[upper : upper + side, left : left + side, :3] = 1
     return card
 
 
@@ -66,8 +67,9 @@ def effect_instance(name: str | None, params: Mapping[str, str | None] | None = 
     if not params:
         return instance
     complaints = []
-    _renderlib.set_error_handler(lambda level, text: complaints.append(text)
-                                 if level >= _renderlib.Err_Warning else None)
+    _renderlib.set_error_handler(
+        lambda level, text: complaints.append(text) if level >= _renderlib.Err_Warning else None
+    )
     try:
         changed = effects.recreate(instance, params)
     except KeyError as error:
@@ -108,8 +110,13 @@ class EffectRenderer:
     """An effect instance with its inputs, rendering whole frames. Use it as
     a context manager (or call close) to free the instance."""
 
-    def __init__(self, name: str | None, params: Mapping[str, str | None] | None = None,
-                 inputs: Iterable[_FrameSource] = (), colorspace: str | None = "srgb") -> None:
+    def __init__(
+        self,
+        name: str | None,
+        params: Mapping[str, str | None] | None = None,
+        inputs: Iterable[_FrameSource] = (),
+        colorspace: str | None = "srgb",
+    ) -> None:
         self.instance: renderlib.EffectGlobals_t | None = effect_instance(name, params)
         self.name = name
         genotype = self.instance.effect_genotype
@@ -117,7 +124,7 @@ class EffectRenderer:
             self.close()
             raise EffectError("%s has no effect descriptor" % name)
         self.n_inputs = len(genotype._get_input_names())
-        self.inputs = list(inputs)[:self.n_inputs]
+        self.inputs = list(inputs)[: self.n_inputs]
         self.colorspace = colorspace
 
     def render(self, frame: int, width: int, height: int) -> NDArray[numpy.float32]:
@@ -125,8 +132,9 @@ class EffectRenderer:
         out = numpy.zeros((height, width, 4), numpy.float32)
         pairs = []
         for source in self.inputs + [None] * (self.n_inputs - len(self.inputs)):
-            pairs.append(None if source is None else arrays.described(
-                numpy.ascontiguousarray(source(frame), numpy.float32)))
+            pairs.append(
+                None if source is None else arrays.described(numpy.ascontiguousarray(source(frame), numpy.float32))
+            )
         messages = []
         frames = _InputFrames(self.inputs, width, height)
         _renderlib.set_error_handler(lambda level, text: messages.append(text))
@@ -137,8 +145,9 @@ class EffectRenderer:
             _renderlib.set_load_frame_impl(None)
             _renderlib.set_error_handler(None)
         if not ok:
-            raise RenderError("%s did not render frame %d: %s" % (self.name, frame, "; ".join(messages) or
-                                                                  "no message"))
+            raise RenderError(
+                "%s did not render frame %d: %s" % (self.name, frame, "; ".join(messages) or "no message")
+            )
         return out
 
     def close(self) -> None:

@@ -9,6 +9,7 @@ drawing call the engine made (``calls``) and can give them as SVG text::
     _renderlib.tarsel_widget_draw(instance, "", 960, 540, 0, 0, 0.5, 0.5, [1920, 1080])
     pathlib.Path("widgets.svg").write_text(drawing.svg(960, 540))
 """
+
 from __future__ import annotations
 
 from typing import TYPE_CHECKING, Any
@@ -39,25 +40,55 @@ class SvgDrawing(renderlib.GfxInterface):
 
     def set_graphics_context(self, context: _SwigPyObject | _Wrapped | None) -> None:
         self._record("set_graphics_context", context)
-    def start_drawing(self, mode: int) -> None: self._record("start_drawing", mode)
-    def end_drawing(self) -> None: self._record("end_drawing")
-    def begin_line(self) -> None: self._record("begin_line")
-    def end_line(self) -> None: self._record("end_line")
-    def line(self, x1: float, y1: float, x2: float, y2: float) -> None: self._record("line", x1, y1, x2, y2)
+
+    def start_drawing(self, mode: int) -> None:
+        self._record("start_drawing", mode)
+
+    def end_drawing(self) -> None:
+        self._record("end_drawing")
+
+    def begin_line(self) -> None:
+        self._record("begin_line")
+
+    def end_line(self) -> None:
+        self._record("end_line")
+
+    def line(self, x1: float, y1: float, x2: float, y2: float) -> None:
+        self._record("line", x1, y1, x2, y2)
+
     # The vectors are the engine's own, valid during the call only: copied.
     def lines(self, xs: renderlib.float_vector, ys: renderlib.float_vector) -> None:
         self._record("lines", tuple(xs), tuple(ys))
-    def color_3f(self, red: float, green: float, blue: float) -> None: self._record("color_3f", red, green, blue)
-    def stipple_on(self) -> None: self._record("stipple_on")
-    def stipple_off(self) -> None: self._record("stipple_off")
-    def stipple_pattern(self, pattern: int) -> None: self._record("stipple_pattern", pattern)
-    def line_width(self, width: float) -> None: self._record("line_width", width)
-    def flush(self) -> None: self._record("flush")
-    def circle(self, x: float, y: float, r: float) -> None: self._record("circle", x, y, r)
-    def dot(self, x: float, y: float, size: float) -> None: self._record("dot", x, y, size)
+
+    def color_3f(self, red: float, green: float, blue: float) -> None:
+        self._record("color_3f", red, green, blue)
+
+    def stipple_on(self) -> None:
+        self._record("stipple_on")
+
+    def stipple_off(self) -> None:
+        self._record("stipple_off")
+
+    def stipple_pattern(self, pattern: int) -> None:
+        self._record("stipple_pattern", pattern)
+
+    def line_width(self, width: float) -> None:
+        self._record("line_width", width)
+
+    def flush(self) -> None:
+        self._record("flush")
+
+    def circle(self, x: float, y: float, r: float) -> None:
+        self._record("circle", x, y, r)
+
+    def dot(self, x: float, y: float, size: float) -> None:
+        self._record("dot", x, y, size)
+
     def rect_filled(self, x1: float, y1: float, x2: float, y2: float) -> None:
         self._record("rect_filled", x1, y1, x2, y2)
-    def draw_text(self, text: str | None, x: float, y: float) -> None: self._record("draw_text", text, x, y)
+
+    def draw_text(self, text: str | None, x: float, y: float) -> None:
+        self._record("draw_text", text, x, y)
 
     def get_text_length_in_pixels(self, text: str | None) -> int:
         self._record("get_text_length_in_pixels", text)
@@ -74,6 +105,7 @@ class SvgDrawing(renderlib.GfxInterface):
     def paint(self, image: Image.Image) -> Image.Image:
         """Draws the recorded calls over a Pillow image (RGB or RGBA), in place."""
         from PIL import ImageDraw
+
         draw = ImageDraw.Draw(image)
         state = _Svg(self.char_width)
         for name, args in self.calls:
@@ -115,12 +147,13 @@ class _Svg:
             dash = ' stroke-dasharray="%d %d"' % (on, max(16 - on, 1))
         return 'fill="none" stroke="%s" stroke-width="%g"%s' % (self.colour, self.width, dash)
 
-    def document(self, calls: Iterable[tuple[str, tuple[Any, ...]]], width: float, height: float,
-                 backdrop: str) -> str:
+    def document(self, calls: Iterable[tuple[str, tuple[Any, ...]]], width: float, height: float, backdrop: str) -> str:
         shapes = [shape for name, args in calls for shape in [self.replay(name, args)] if shape]
-        return ('<svg xmlns="http://www.w3.org/2000/svg" width="%d" height="%d">\n'
-                '<rect width="100%%" height="100%%" fill="%s"/>\n%s\n</svg>\n'
-                % (width, height, backdrop, "\n".join(shapes)))
+        return (
+            '<svg xmlns="http://www.w3.org/2000/svg" width="%d" height="%d">\n'
+            '<rect width="100%%" height="100%%" fill="%s"/>\n%s\n</svg>\n'
+            % (width, height, backdrop, "\n".join(shapes))
+        )
 
     def replay(self, name: str, args: tuple[Any, ...]) -> str | None:
         if name == "color_3f":
@@ -141,10 +174,20 @@ class _Svg:
             return '<circle cx="%g" cy="%g" r="%g" fill="%s"/>' % (args[0], args[1], args[2] / 2, self.colour)
         elif name == "rect_filled":
             x1, y1, x2, y2 = args
-            return ('<rect x="%g" y="%g" width="%g" height="%g" fill="%s"/>'
-                    % (min(x1, x2), min(y1, y2), abs(x2 - x1), abs(y2 - y1), self.colour))
+            return '<rect x="%g" y="%g" width="%g" height="%g" fill="%s"/>' % (
+                min(x1, x2),
+                min(y1, y2),
+                abs(x2 - x1),
+                abs(y2 - y1),
+                self.colour,
+            )
         elif name == "draw_text":
             text, x, y = args
-            return ('<text x="%g" y="%g" fill="%s" font-family="monospace" font-size="%g">%s</text>'
-                    % (x, y, self.colour, self.char_width * 5 / 3, escape(text)))
+            return '<text x="%g" y="%g" fill="%s" font-family="monospace" font-size="%g">%s</text>' % (
+                x,
+                y,
+                self.colour,
+                self.char_width * 5 / 3,
+                escape(text),
+            )
         return None

@@ -9,6 +9,7 @@ every short run):
 Each case exits 0 only if the call now ends as it should. Before the fixes
 they read or wrote memory they must not without always crashing: the suite
 runs them under tools/sanitize.sh too, where such an access is reported."""
+
 import sys
 
 import _renderlib
@@ -25,12 +26,39 @@ def render_list_replaced():
     dest.pixel_type = _renderlib.pixel_rgba8
     pixels = bytearray(_renderlib.make_tarsel_raster_info(dest, 2, 2))
     rasters = [dest]
-    rasters.append(type("T_RasterInfo", (), {"__slots__": (), "this": property(
-        lambda self: rasters.__setitem__(0, None) or keep.this)})())
+    rasters.append(
+        type(
+            "T_RasterInfo",
+            (),
+            {"__slots__": (), "this": property(lambda self: rasters.__setitem__(0, None) or keep.this)},
+        )()
+    )
     blur = _renderlib.init_tarsel_effect("T_Blur", False)
-    assert _renderlib.render_tarsel_effect_to_native_image(
-        blur, "", pixels, 0, 0, 1, 1, rasters, [None, bytearray(16)], 1.0, 2, 1.0, 1, 0, 0, 25, False, "linear",
-        "linear", "linear") is False
+    assert (
+        _renderlib.render_tarsel_effect_to_native_image(
+            blur,
+            "",
+            pixels,
+            0,
+            0,
+            1,
+            1,
+            rasters,
+            [None, bytearray(16)],
+            1.0,
+            2,
+            1.0,
+            1,
+            0,
+            0,
+            25,
+            False,
+            "linear",
+            "linear",
+            "linear",
+        )
+        is False
+    )
 
 
 # Frame -2**31 (a valid int argument) rendered an echo of frame - 1: signed
@@ -38,7 +66,7 @@ def render_list_replaced():
 # before the first frame is a frame the host does not have.
 def echo_frame_overflow():
     echo = _renderlib.init_tarsel_effect("T_Echo", False)
-    assert effects.render(echo, effects.raster(4, 2, 2), [effects.raster(4, 2, 2)], None, -2 ** 31) is True
+    assert effects.render(echo, effects.raster(4, 2, 2), [effects.raster(4, 2, 2)], None, -(2**31)) is True
 
 
 # The same at the other end for the frames around the last one: the time
@@ -59,8 +87,8 @@ def time_blur_frame_overflow():
     source = Frames()
     _renderlib.set_load_frame_impl(source)
     blur = effects.recreate(_renderlib.init_tarsel_effect("T_TimeBlur", False), {"frames_after": "3"})
-    assert effects.render(blur, effects.raster(4, 2, 2), [effects.raster(4, 2, 2)], None, 2 ** 31 - 1) is True
-    assert sorted(source.asked) == [2 ** 31 - 3, 2 ** 31 - 2], source.asked  # the two before; none after the last
+    assert effects.render(blur, effects.raster(4, 2, 2), [effects.raster(4, 2, 2)], None, 2**31 - 1) is True
+    assert sorted(source.asked) == [2**31 - 3, 2**31 - 2], source.asked  # the two before; none after the last
     _renderlib.set_load_frame_impl(None)
 
 

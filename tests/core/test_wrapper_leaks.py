@@ -140,27 +140,21 @@ class Calls:
             return
         raise AssertionError("%s%r gave %r instead of raising %s" % (name, args, result, error))
 
-    # Each row is (want, name, *arguments), or a name alone for (ANY, name):
-    # `want` is the error the call raises, ANY, a test of its result, or the
-    # result itself (None, a bool and NotImplemented the very object).
+    # Each row is (want, name, *arguments), or text naming calls with no
+    # arguments, (ANY, name) for each name in it: `want` is the error the call
+    # raises, ANY, a test of its result, or the result itself (None, a bool and
+    # NotImplemented the very object).
     def rows(self, *rows):
-        for want, name, *args in ((ANY, row) if isinstance(row, str) else row for row in rows):
-            if all(
-                isinstance(w, type) and issubclass(w, BaseException)
-                for w in (want if isinstance(want, tuple) and want else (want,))
-            ):
+        for want, name, *args in spelled(rows):
+            wants = want if isinstance(want, tuple) and want else (want,)
+            if all(isinstance(w, type) and issubclass(w, BaseException) for w in wants):
                 self.fails(want, name, *args)
                 continue
             result = self(name, *args)
-            same = (
-                result is want if want is None or want is NotImplemented or isinstance(want, bool) else result == want
-            )
-            assert want is ANY or (want(result) if callable(want) else same), "%s%.200r gave %.200r, not %.200r" % (
-                name,
-                tuple(args),
-                result,
-                want,
-            )
+            by_identity = want is None or want is NotImplemented or isinstance(want, bool)
+            same = result is want if by_identity else result == want
+            wanted = want is ANY or (want(result) if callable(want) else same)
+            assert wanted, "%s%.200r gave %.200r, not %.200r" % (name, tuple(args), result, want)
             # The same call with a stranger in each later place is refused once
             # the arguments before it are converted (and must leak nothing).
             for at in range(1, len(args)):
@@ -176,12 +170,7 @@ class Calls:
 
     def on(self, prefix, obj, *rows):
         """rows(), each row (want, member, *arguments) a call of `<prefix>member` on `obj`."""
-        self.rows(
-            *[
-                (want, prefix + member, obj, *args)
-                for want, member, *args in ((ANY, row) if isinstance(row, str) else row for row in rows)
-            ]
-        )
+        self.rows(*[(want, prefix + member, obj, *args) for want, member, *args in spelled(rows)])
 
     def aborted(self, name, *args):
         """The engine fails the call: the probe makes its next entry throw."""
@@ -192,6 +181,11 @@ class Calls:
             armed = ENGINE.abort_armed()
             ENGINE.abort_next_call(False)
         assert not armed, "%s did not reach the engine" % name
+
+
+def spelled(rows):
+    """The rows with each text row written out as its calls."""
+    return [call for row in rows for call in ([(ANY, name) for name in row.split()] if isinstance(row, str) else [row])]
 
 
 def construct(call, cls, *args):
@@ -264,54 +258,16 @@ LINEAR = text("linear")
 VIEW = (96, 54, 0.0, 0.0, 0.5, 0.5)  # a widget's view: size, offset, centre
 
 
+# The input, output and working colour spaces of a render.
+SPACES = [LINEAR] * 3
+
+
 def render_arguments(effect, dest, rasters, images, frame=0):
-    return [
-        effect,
-        "",
-        dest,
-        frame,
-        0,
-        1,
-        1,
-        rasters,
-        images,
-        1.0,
-        len(rasters),
-        1.0,
-        0,
-        0,
-        0,
-        25,
-        False,
-        LINEAR,
-        LINEAR,
-        LINEAR,
-    ]
+    return [effect, "", dest, frame, 0, 1, 1, rasters, images, 1.0, len(rasters), 1.0, 0, 0, 0, 25, False, *SPACES]
 
 
 def flare_arguments(effect, dest, rasters, images):
-    return [
-        effect,
-        "",
-        4.0,
-        4.0,
-        dest,
-        0,
-        0,
-        1,
-        1,
-        rasters,
-        images,
-        1.0,
-        len(rasters),
-        1.0,
-        0,
-        0,
-        LINEAR,
-        LINEAR,
-        LINEAR,
-        False,
-    ]
+    return [effect, "", 4.0, 4.0, dest, 0, 0, 1, 1, rasters, images, 1.0, len(rasters), 1.0, 0, 0, *SPACES, False]
 
 
 def builder_effect_name():
@@ -387,10 +343,7 @@ def engine(call, helpers, tmp_path):
         call.rows(
             (None, "set_error_handler", None),
             (None, "tarsel_free_all_stamp_collections"),
-            "tarsel_shutdown_apps",
-            "get_tarsel_version_info",
-            "ext_build_id",
-            "get_tarsel_build_id",
+            "tarsel_shutdown_apps get_tarsel_version_info ext_build_id get_tarsel_build_id",
             (True, "check_build_id"),
             (ANY, "SWIG_PyInstanceMethod_New", draw_nothing),
         )
@@ -926,8 +879,7 @@ def shared_memory(call, helpers, tmp_path):
             (None, "try_reserve_pybuf", oversized),
             (operator.not_, "try_write_pybuf", bytes(oversized)),
             (bool, "client_pid_exists"),
-            "print_stats",
-            "get_server_pid",
+            "print_stats get_server_pid",
             # A message without the buffer protocol: a SystemError caused by the TypeError.
             (SystemError, "write_pybuf", STRANGER),
             (SystemError, "try_write_pybuf", 5),
@@ -1082,10 +1034,7 @@ def vector_calls(call, kind, first, second):
         (ANY, "append", second),
         (ANY, "append", first),
         (lambda n: n >= 3, "size"),
-        "back",
-        "front",
-        "pop",
-        "pop_back",
+        "back front pop pop_back",
         (ANY, "assign", 3, second),
         (ANY, "resize", 4),
         (ANY, "resize", 5, first),
@@ -1108,8 +1057,7 @@ def iterate(call, prefix, sequence):
     call.on(
         p,
         begin,
-        "value",
-        "incr",
+        "value incr",
         (ANY, "incr", 1),
         "decr",
         (ANY, "decr", 1),
@@ -1118,10 +1066,7 @@ def iterate(call, prefix, sequence):
         (True, "__eq__", also_begin),
         (False, "__ne__", also_begin),
         (NotImplemented, "__eq__", STRANGER),
-        "next",
-        "__next__",
-        "previous",
-        "decr",
+        "next __next__ previous decr",
     )
     copy = call(p + "copy", begin)
     call.rows((ANY, p + "value", copy), (ANY, p + "advance", begin, 1))
@@ -1136,9 +1081,7 @@ def iterate(call, prefix, sequence):
         p,
         closed,
         (StopIteration, "previous"),
-        "__next__",
-        "__next__",
-        "__next__",
+        "__next__ __next__ __next__",
         (StopIteration, "__next__"),
         (StopIteration, "__next__"),
         (StopIteration, "value"),
@@ -1198,16 +1141,7 @@ def containers(call, helpers, tmp_path):
             (False, "empty"),
             (ANY, "lower_bound", key),
             (ANY, "upper_bound", key),
-            "keys",
-            "values",
-            "items",
-            "asdict",
-            "end",
-            "key_iterator",
-            "value_iterator",
-            "rbegin",
-            "rend",
-            "get_allocator",
+            "keys values items asdict end key_iterator value_iterator rbegin rend get_allocator",
         )
         call(p + "erase", mapping, call(p + "find", mapping, key))
         call.on(p, mapping, (1, "erase", other_key), (IndexError, "__delitem__", missing), (ANY, "swap", copy))

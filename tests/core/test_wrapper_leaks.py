@@ -227,6 +227,11 @@ def members(call, prefix, obj, write=True, keep=()):
                 call.fails(OverflowError, setter, obj, BIG)
 
 
+def named(scope, names):
+    """The objects of those names in `scope`, a family's locals()."""
+    return [scope[name] for name in names.split()]
+
+
 def listener(heard):
     """A message handler that keeps what it hears in `heard`."""
     return lambda level, message: heard.append(message)
@@ -480,17 +485,12 @@ def renders(call, helpers, tmp_path):
         call("init_tarsel_effect", text(name), False) for name in ("T_Gradient", "T_Blur", "T_LensFlare")
     ]
     dest_info, dest = effects.raster(_renderlib.pixel_rgba8, 8, 8)
-    source_info, source = effects.raster(_renderlib.pixel_rgba8, 8, 8)
+    source_info, source_pixels = effects.raster(_renderlib.pixel_rgba8, 8, 8)
     float_info, _ = effects.raster(_renderlib.pixel_rgbaf, 8, 8)
     array = numpy.zeros((8, 8, 4), numpy.float32)
-    rasters, images, alone, nothing_in, floats = (
-        [dest_info, source_info],
-        [None, source],
-        [dest_info],
-        [None],
-        [float_info],
-    )
-    wrong_rasters, wrong_images, other_record = (dest_info, source_info), [None, 5], renderlib.T_RenderInfo()
+    rasters, images, alone, nothing_in = [dest_info, source_info], [None, source_pixels], [dest_info], [None]
+    floats, wrong_rasters, wrong_images = [float_info], (dest_info, source_info), [None, 5]
+    other_record = renderlib.T_RenderInfo()
     blurred = render_arguments(blur, dest, rasters, images)
     # An effect that asks the host for other frames, and the hosts' frame sources.
     frame, echo_dest, current = (effects.raster(_renderlib.pixel_rgbaf, 16, 8) for _ in range(3))
@@ -507,20 +507,14 @@ def renders(call, helpers, tmp_path):
             (OverflowError, RENDER, *render_arguments(blur, dest, rasters, images, frame=BIG)),
         )
         for name, arguments in ((RENDER, render_arguments), (FLARE, flare_arguments)):
-            for wrong in (
-                (dest, wrong_rasters, images),
-                (dest, rasters, wrong_images),
-                (dest, [other_record], nothing_in),
-            ):
-                call.fails(TypeError, name, *arguments(blur, *wrong))
+            for wrong in ((wrong_rasters, images), (rasters, wrong_images), ([other_record], nothing_in)):
+                call.fails(TypeError, name, *arguments(blur, dest, *wrong))
             call.aborted(name, *arguments(blur, dest, rasters, images))
         call.rows(
             (None, "tarsel_abort_render"),
             (RuntimeError, RENDER, *blurred),
             (None, "tarsel_clear_abort"),
             (True, RENDER, *blurred),
-        )
-        call.rows(
             (None, "set_load_frame_impl", source),
             (True, RENDER, *echoed),
             (None, "set_load_frame_impl", missing),
@@ -528,8 +522,8 @@ def renders(call, helpers, tmp_path):
             (None, "set_load_frame_impl", None),
             (ValueError, "LoadFrameInterface_load_frame", missing.this, 0, 0, 16, 8),
             (TypeError, "LoadFrameInterface_current_raster_info", not_a_descriptor.this, 0),
-            (RuntimeError, "LoadFrameInterface_load_frame", source, 0, 0, 0, 0),
-        )  # the abstract base's own
+            (RuntimeError, "LoadFrameInterface_load_frame", source, 0, 0, 0, 0),  # the abstract base's own
+        )
         call.on(
             "LoadFrameInterface_",
             source.this,
@@ -544,37 +538,9 @@ def renders(call, helpers, tmp_path):
         _renderlib.set_load_frame_impl(None)
         _renderlib.free_tarsel_effect(echo)
 
-    return (
-        step,
-        made_effects
-        + [
-            dest_info,
-            dest,
-            source_info,
-            source,
-            float_info,
-            array,
-            rasters,
-            images,
-            alone,
-            nothing_in,
-            floats,
-            wrong_rasters,
-            wrong_images,
-            other_record,
-            LINEAR,
-            frame,
-            *frame,
-            echo_dest[1],
-            current[1],
-            source,
-            missing,
-            not_a_descriptor,
-            echo,
-            *echoed,
-        ],
-        cleanup,
-    )
+    watched = named(locals(), "dest_info dest source_info source_pixels float_info array rasters images alone")
+    watched += named(locals(), "nothing_in floats wrong_rasters wrong_images other_record frame source missing")
+    return step, made_effects + watched + [not_a_descriptor, echo, LINEAR, *frame, current[1], *echoed], cleanup
 
 
 @family
@@ -626,13 +592,9 @@ def images(call, helpers, tmp_path):
             (OverflowError, three, decoded_at, BIG),
         )
         call.on(
-            "RenderContext_",
-            first,
-            (True, "__eq__", first),
-            (True, "__ne__", second),
-            (NotImplemented, "__eq__", 3),
-            "__hash__",
+            "RenderContext_", first, (True, "__eq__", first), (True, "__ne__", second), (NotImplemented, "__eq__", 3)
         )
+        call("RenderContext___hash__", first)
         call.rows(
             (size, *sized),
             ([8, 1], *resize),
@@ -670,35 +632,9 @@ def images(call, helpers, tmp_path):
         call("free_tarsel_effect", effect)
         _renderlib.tarsel_free_all_flare_textures()
 
-    return (
-        step,
-        [
-            source_info,
-            source,
-            dest_info,
-            dest,
-            shown,
-            effect,
-            lut_path,
-            missing,
-            messages,
-            handler,
-            bits,
-            short_bits,
-            encoded,
-            three,
-            decoded,
-            decoded_at,
-            *contexts,
-            pixels,
-            out,
-            wrong_out,
-            spot,
-            no_spot,
-            path,
-        ],
-        cleanup,
-    )
+    watched = named(locals(), "source_info source dest_info dest shown effect lut_path missing messages handler bits")
+    watched += named(locals(), "short_bits encoded three decoded decoded_at pixels out wrong_out spot no_spot path")
+    return step, watched + contexts, cleanup
 
 
 def director_lifetimes(call, cls, *args):
@@ -746,37 +682,29 @@ def drawing_callbacks(call, helpers, tmp_path):
     flare = call("init_tarsel_effect", text("T_LensFlare"), False)
     words, empty = text("abcd"), text("")
     values, short_values = renderlib.float_vector([96, 54, 0]), [96.0, 54.0]
-    calls = [
-        ("set_graphics_context", None),
-        ("set_graphics_context", xs),
-        ("start_drawing", 1),
-        ("end_drawing",),
-        ("begin_line",),
-        ("end_line",),
-        ("line", 1, 2, 3.5, 4),
-        ("lines", xs, ys),
-        ("color_3f", 1.0, 0.5, 0.0),
-        ("stipple_on",),
-        ("stipple_off",),
-        ("stipple_pattern", 0xF0F0),
-        ("line_width", 2.0),
-        ("flush",),
-        ("circle", 1, 2, 3),
-        ("dot", 1, 2, 3),
-        ("rect_filled", 1, 2, 3, 4),
-        ("draw_text", words, 5, 6),
-        ("get_text_length_in_pixels", words),
-    ]
-    draw, mouse = (
-        ["tarsel_widget_draw", flare, empty, *VIEW, values],
-        ["tarsel_widget_mouse_event", flare, empty, *VIEW, values, 10, 10, _renderlib.MouseEventType_PRESS],
-    )
+    draw = ["tarsel_widget_draw", flare, empty, *VIEW, values]
+    mouse = ["tarsel_widget_mouse_event", flare, empty, *VIEW, values, 10, 10, _renderlib.MouseEventType_PRESS]
 
     def step():
         call.on(
             "GfxInterface_",
             drawing.this,
-            *[(ANY, *each) for each in calls],
+            (ANY, "set_graphics_context", None),
+            (ANY, "set_graphics_context", xs),
+            (ANY, "start_drawing", 1),
+            "end_drawing begin_line end_line",
+            (ANY, "line", 1, 2, 3.5, 4),
+            (ANY, "lines", xs, ys),
+            (ANY, "color_3f", 1.0, 0.5, 0.0),
+            "stipple_on stipple_off",
+            (ANY, "stipple_pattern", 0xF0F0),
+            (ANY, "line_width", 2.0),
+            "flush",
+            (ANY, "circle", 1, 2, 3),
+            (ANY, "dot", 1, 2, 3),
+            (ANY, "rect_filled", 1, 2, 3, 4),
+            (ANY, "draw_text", words, 5, 6),
+            (ANY, "get_text_length_in_pixels", words),
             (OverflowError, "stipple_pattern", 65536),
             (ValueError, "lines", None, ys),
             (TypeError, "lines", [1.0], ys),
@@ -784,8 +712,8 @@ def drawing_callbacks(call, helpers, tmp_path):
         call.rows(
             (TypeError, "GfxInterface_get_text_length_in_pixels", wrong.this, words),
             (KeyError, "GfxInterface_circle", raising.this, 1, 2, 3),
-            (RuntimeError, "GfxInterface_line", drawing, 0, 0, 1, 1),
-        )  # the abstract base's own
+            (RuntimeError, "GfxInterface_line", drawing, 0, 0, 1, 1),  # the abstract base's own
+        )
         fresh = director_lifetimes(call, QuietDrawing)
         call("GfxInterface_flush", fresh.this)
         del fresh
@@ -803,11 +731,8 @@ def drawing_callbacks(call, helpers, tmp_path):
         _renderlib.tarsel_set_gfx_impl(None)
         call("free_tarsel_effect", flare)
 
-    return (
-        step,
-        [drawing, drawing.this, wrong, wrong.this, raising, raising.this, xs, ys, flare, words, values, short_values],
-        cleanup,
-    )
+    watched = [drawing, drawing.this, wrong, wrong.this, raising, raising.this, xs, ys, flare, words, values]
+    return step, watched + [short_values], cleanup
 
 
 class StillSource(renderlib.LoadFrameInterface):
@@ -915,24 +840,12 @@ def monitor(call, helpers, tmp_path):
     pixels, frame_name, frame = bytearray(8 * 4 * 4), text("leak check"), bytearray(640 * 360 * 4)
     none, not_found = _renderlib.EM_errorNone, _renderlib.EM_errorNotFound
     d = "EM_Display_"
+    # An image's format, pixel aspect, gamma, and whether premultiplied and of full range.
+    look = [_renderlib.EM_ImageFormat_32BitIntBGRA, 1.0, 2.2, False, True]
 
     def step():
         display = call("EM_DisplayInit")
-        wrap = [
-            d + "EM_XIImageWrapper",
-            display,
-            pixels,
-            8,
-            4,
-            32,
-            frame_name,
-            False,
-            _renderlib.EM_ImageFormat_32BitIntBGRA,
-            1.0,
-            2.2,
-            False,
-            True,
-        ]
+        wrap = [d + "EM_XIImageWrapper", display, pixels, 8, 4, 32, frame_name, False, *look]
         image = call(*wrap)
         call.on(
             d,
@@ -947,15 +860,8 @@ def monitor(call, helpers, tmp_path):
             (lambda error: error != none, "display_frame", preview, image),
             (not_found, "display_frame", nowhere, image),
         )
-        call.on(
-            "EM_XIImage_",
-            image,
-            (8, "getWidth"),
-            (4, "getHeight"),
-            (32, "getRowBytes"),
-            (2, "addRef"),
-            (1, "removeRef"),
-        )
+        call.on("EM_XIImage_", image, (8, "getWidth"), (4, "getHeight"), (32, "getRowBytes"))
+        call.on("EM_XIImage_", image, (2, "addRef"), (1, "removeRef"))  # its count of references
         whole = call(*wrap[:2], frame, 640, 360, 640 * 4, *wrap[6:])
         assert call(d + "display_frame", display, preview, whole) == none
         del whole
@@ -994,20 +900,15 @@ def monitor(call, helpers, tmp_path):
 def vector_calls(call, kind, first, second):
     """Every wrapper of one std::vector instance, with elements `first` and `second`."""
     cls, p = getattr(renderlib, kind), kind + "_"
-    vector, other, three = (
-        construct(call, cls, items) for items in ([first, second, first], [first, second], [first, second, first])
-    )
+    pair = [first, second]
+    vector, other, three = (construct(call, cls, items) for items in (pair + [first], pair, pair + [first]))
     for arguments in ((), (3,), (3, first), (vector,)):
         call("delete_" + kind, construct(call, cls, *arguments))
     call.rows((TypeError, "new_" + kind, STRANGER), ((OverflowError, TypeError), "new_" + kind, -1))
     call.on(
         p,
         vector,
-        (3, "__len__"),
-        (3, "size"),
-        (True, "__bool__"),
-        (True, "__nonzero__"),
-        (False, "empty"),
+        *sizes(3),
         "get_allocator",
         (ANY, "reserve", 8),
         (lambda n: n >= 8, "capacity"),
@@ -1048,6 +949,11 @@ def vector_calls(call, kind, first, second):
     call.on(p, vector, (None, "clear"), (IndexError, "pop"))
     for each in (three, other, vector):
         call("delete_" + kind, each)
+
+
+def sizes(n):
+    """The rows of a container's size queries, for one of `n` elements."""
+    return [(n, "__len__"), (n, "size"), (n > 0, "__bool__"), (n > 0, "__nonzero__"), (n == 0, "empty")]
 
 
 def iterate(call, prefix, sequence):
@@ -1134,11 +1040,7 @@ def containers(call, helpers, tmp_path):
             (True, "__contains__", key),
             (True, "has_key", key),
             (1, "count", key),
-            (2, "__len__"),
-            (2, "size"),
-            (True, "__bool__"),
-            (True, "__nonzero__"),
-            (False, "empty"),
+            *sizes(2),
             (ANY, "lower_bound", key),
             (ANY, "upper_bound", key),
             "keys values items asdict end key_iterator value_iterator rbegin rend get_allocator",
@@ -1162,14 +1064,9 @@ def containers(call, helpers, tmp_path):
             *[(TypeError, "new_" + kind, items) for kind, items in refused.items()],
         )
 
-    return (
-        step,
-        made_effects
-        + [param, key, other_key, missing, values, numbers, flare, empty, floats, kept]
-        + list(refused.values())
-        + [e for pair in elements.values() for e in pair],
-        lambda: free_all(call, made_effects + [flare]),
-    )
+    watched = made_effects + [param, key, other_key, missing, values, numbers, flare, empty, floats, kept]
+    watched += list(refused.values()) + [e for pair in elements.values() for e in pair]
+    return step, watched, lambda: free_all(call, made_effects + [flare])
 
 
 @family

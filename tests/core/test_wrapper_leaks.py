@@ -88,10 +88,8 @@ def module_functions():
 
 
 class MallInfo2(ctypes.Structure):
-    _fields_ = [
-        (name, ctypes.c_size_t)
-        for name in "arena ordblks smblks hblks hblkhd usmblks fsmblks uordblks fordblks keepcost".split()
-    ]
+    names = "arena ordblks smblks hblks hblkhd usmblks fsmblks uordblks fordblks keepcost"
+    _fields_ = [(name, ctypes.c_size_t) for name in names.split()]
 
 
 mallinfo2 = getattr(ctypes.CDLL(None), "mallinfo2", None)  # glibc 2.33 and later
@@ -203,21 +201,12 @@ def construct(call, cls, *args):
 def members(call, prefix, obj, write=True, keep=()):
     cls = getattr(renderlib, prefix[:-1])
     if hasattr(_renderlib, prefix + "__eq__"):
-        call.on(
-            prefix,
-            obj,
-            (True, "__eq__", obj),
-            (False, "__ne__", obj),
-            (NotImplemented, "__eq__", STRANGER),
-            (NotImplemented, "__ne__", STRANGER),
-        )
+        strange = [(NotImplemented, "__eq__", STRANGER), (NotImplemented, "__ne__", STRANGER)]
+        call.on(prefix, obj, (True, "__eq__", obj), (False, "__ne__", obj), *strange)
     for name in sorted(dir(_renderlib)):
-        if (
-            not name.startswith(prefix)
-            or name.endswith("_swigregister")
-            or arities()[name] != (1, 1)
-            or isinstance(inspect.getattr_static(cls, name[len(prefix) :], None), staticmethod)
-        ):
+        if not name.startswith(prefix) or name.endswith("_swigregister") or arities()[name] != (1, 1):
+            continue
+        if isinstance(inspect.getattr_static(cls, name[len(prefix) :], None), staticmethod):
             continue
         value = call(name, obj)
         setter = name[: -len("get")] + "set"
@@ -294,13 +283,10 @@ def records(call, helpers, tmp_path):
     # Every record a host can make on its own: made, each field read and
     # written back, deleted; then the engine's catalogue, walked.
     def step():
-        for cls in [
-            getattr(renderlib, name)
-            for name in "Plugin_Info Genotype ParamFlags T_RasterInfo T_RenderInfo MessageHeader_t ShmemManager".split()
-        ]:
-            record = construct(call, cls)
-            members(call, cls.__name__ + "_", record)
-            call("delete_" + cls.__name__, record)
+        for name in "Plugin_Info Genotype ParamFlags T_RasterInfo T_RenderInfo MessageHeader_t ShmemManager".split():
+            record = construct(call, getattr(renderlib, name))
+            members(call, name + "_", record)
+            call("delete_" + name, record)
         for count_of, entry in (
             ("get_n_tarsel_effects", "get_tarsel_plugin_info_i"),
             ("get_n_tarsel_builder_effects", "get_tarsel_builder_info_i"),
@@ -367,13 +353,8 @@ def engine(call, helpers, tmp_path):
 
 def sample_params(genotypes):
     """A parameter of every type, and of each kind of special one."""
-    return list(
-        {
-            (param.ptype, param.n_channels, bool(param.flags.fromfile_popup_p), param.is_point()): param
-            for genotype in genotypes
-            for param in genotype._get_params()
-        }.values()
-    )
+    params = [param for genotype in genotypes for param in genotype._get_params()]
+    return list({(p.ptype, p.n_channels, bool(p.flags.fromfile_popup_p), p.is_point()): p for p in params}.values())
 
 
 @family
@@ -1095,11 +1076,8 @@ def argument_errors(call, helpers, tmp_path):
             result = call(name, *arguments)
         except refused:
             return
-        assert anything or (name.endswith(operators) and result is NotImplemented), "%s%r gave %r" % (
-            name,
-            tuple(arguments),
-            result,
-        )
+        taken = anything or (name.endswith(operators) and result is NotImplemented)
+        assert taken, "%s%r gave %r" % (name, tuple(arguments), result)
 
     def step():
         for name in functions:
@@ -1127,12 +1105,8 @@ def argument_errors(call, helpers, tmp_path):
 
 def shared_constant(item):
     """Objects the interpreter itself keeps and counts references to."""
-    return (
-        item is None
-        or isinstance(item, bool)
-        or (type(item) is int and -5 <= item <= 256)
-        or (type(item) is str and len(item) < 2)
-    )
+    small = (type(item) is int and -5 <= item <= 256) or (type(item) is str and len(item) < 2)
+    return item is None or isinstance(item, bool) or small
 
 
 # Interpreter blocks, C heap bytes and resident KiB in use. A full collection
@@ -1171,28 +1145,19 @@ def check_flat(name, make, helpers, tmp_path):
         start, middle, end = memory(), run(ROUNDS), run(ROUNDS)
         after = [sys.getrefcount(item) for item in watched]
         moved = [
-            "%s %.60r: %+d" % (type(item).__name__, item, now - then)
-            for item, then, now in zip(watched, references, after)
-            if now != then
+            "%s %.60r: %+d" % (type(x).__name__, x, b - a) for x, a, b in zip(watched, references, after) if b != a
         ]
         assert moved == [], "%s: references gained or lost over %d rounds: %s" % (name, 2 * ROUNDS, moved)
         assert live_objects() == live, "%s: engine or monitor objects left alive" % name
-        (blocks, heap, rss), (more_blocks, more_heap, more_rss) = [
-            [b - a for a, b in zip(earlier, later)] for earlier, later in ((start, middle), (middle, end))
-        ]
+        growth = [[b - a for a, b in zip(earlier, later)] for earlier, later in ((start, middle), (middle, end))]
+        (blocks, heap, rss), (more_blocks, more_heap, more_rss) = growth
+        grew = "%s: %s grew by %d and %d in the two stretches of %d rounds"
         # A leak of one object, or of one small block of the C heap (32 bytes),
         # a round shows as ROUNDS blocks or ROUNDS * 32 bytes a stretch.
-        assert not MEASURE_MEMORY or min(blocks, more_blocks) < ROUNDS // 2, (
-            "%s: %d and %d interpreter blocks more in %d rounds" % (name, blocks, more_blocks, ROUNDS)
-        )
-        assert not MEASURE_MEMORY or min(heap, more_heap) < ROUNDS * 16, (
-            "%s: the C heap grew by %d and %d bytes in %d rounds" % (name, heap, more_heap, ROUNDS)
-        )
-        assert not MEASURE_MEMORY or rss + more_rss < 1024, "%s: resident memory grew by %d KiB in %d rounds" % (
-            name,
-            rss + more_rss,
-            2 * ROUNDS,
-        )
+        if MEASURE_MEMORY:
+            assert min(blocks, more_blocks) < ROUNDS // 2, grew % (name, "Python's blocks", blocks, more_blocks, ROUNDS)
+            assert min(heap, more_heap) < ROUNDS * 16, grew % (name, "the C heap (bytes)", heap, more_heap, ROUNDS)
+            assert rss + more_rss < 1024, grew % (name, "resident memory (KiB)", rss, more_rss, ROUNDS)
     finally:
         cleanup()
         MONITOR.qrv_probe_set_init_fails(0)

@@ -38,14 +38,10 @@ ROUNDS = 3 if UNDER_VALGRIND else 200  # each of the two measured stretches
 WARM_UP = 1 if UNDER_VALGRIND else 50  # rounds that fill the caches and pools first
 MEASURE_MEMORY = not (UNDER_ADDRESS_SANITIZER or UNDER_VALGRIND)
 
-# Functions of the module no case calls, and why: SWIG's registration of
-# each proxy class (<Class>_swigregister), run once as renderlib is imported;
-# calling it again would re-register the class.
-NOT_EXERCISED = {
-    name: "SWIG's registration of the proxy class %s" % name[: -len("_swigregister")]
-    for name in dir(_renderlib)
-    if name.endswith("_swigregister")
-}
+# Functions of the module no case calls: SWIG's registration of each proxy
+# class (<Class>_swigregister), run once as renderlib is imported; calling it
+# again would re-register the class.
+NOT_EXERCISED = [name for name in dir(_renderlib) if name.endswith("_swigregister")]
 
 
 STRANGER = type("Stranger", (), {"__doc__": "An argument no wrapper takes."})()
@@ -60,10 +56,8 @@ def text(value):
 
 
 def stub_text():
-    """The extension module's type stubs, which give each function's arity."""
-    return (
-        pathlib.Path(_renderlib.__file__).parent / "_renderlib-stubs" / "__init__.pyi"
-    ).read_text()  # installed by the build
+    """The extension module's type stubs (installed by the build), which give each function's arity."""
+    return (pathlib.Path(_renderlib.__file__).parent / "_renderlib-stubs" / "__init__.pyi").read_text()
 
 
 @functools.lru_cache(maxsize=None)
@@ -74,9 +68,8 @@ def arities():
         if isinstance(node, ast.FunctionDef):
             positional = node.args.posonlyargs + node.args.args
             low, high = len(positional) - len(node.args.defaults), len(positional)
-            if node.name in counts:  # an overload
-                low, high = min(low, counts[node.name][0]), max(high, counts[node.name][1])
-            counts[node.name] = (low, high)
+            fewest, most = counts.get(node.name, (low, high))  # another overload's, if any
+            counts[node.name] = (min(low, fewest), max(high, most))
     return counts
 
 
@@ -395,15 +388,10 @@ def parameters(call, helpers, tmp_path):
             )
         param = params[1]
         # Each Param keeps only its latest cJSON tree: the one before is freed.
-        call.on(
-            "Param_",
-            param,
-            (bool, "to_json", None),
-            (ANY, "to_json", None, True),
-            (TypeError, "to_string_const", None, 1),
-            (TypeError, "maybe_set_to_old_default", None, 1.0, -1),
-        )
+        call.on("Param_", param, (bool, "to_json", None), (ANY, "to_json", None, True))
         call.rows(
+            (TypeError, "Param_to_string_const", param, None, 1),
+            (TypeError, "Param_maybe_set_to_old_default", param, None, 1.0, -1),
             (OverflowError, "tarsel_get_param_title", param, 0, title, -1),
             (TypeError, "tarsel_get_fromfile_popup_names", param, []),
             (TypeError, "new_Param", label, 1.0),
@@ -636,18 +624,9 @@ def draw_nothing(self, *args):
 
 # A graphics object that draws nothing and keeps nothing: every method of the
 # interface is its own.
-QuietDrawing = type(
-    "QuietDrawing",
-    (renderlib.GfxInterface,),
-    dict(
-        {
-            name: draw_nothing
-            for name, value in vars(renderlib.GfxInterface).items()
-            if callable(value) and not name.startswith("_")
-        },
-        get_text_length_in_pixels=lambda self, text: 6 * len(text),
-    ),
-)
+DRAWING = [name for name, value in vars(renderlib.GfxInterface).items() if callable(value) and not name.startswith("_")]
+QuietDrawing = type("QuietDrawing", (renderlib.GfxInterface,), dict.fromkeys(DRAWING, draw_nothing))
+QuietDrawing.get_text_length_in_pixels = lambda self, text: 6 * len(text)
 
 
 def raise_key_error(self, *args):
@@ -681,8 +660,7 @@ def drawing_callbacks(call, helpers, tmp_path):
             (ANY, "stipple_pattern", 0xF0F0),
             (ANY, "line_width", 2.0),
             "flush",
-            (ANY, "circle", 1, 2, 3),
-            (ANY, "dot", 1, 2, 3),
+            *[(ANY, name, 1, 2, 3) for name in ("circle", "dot")],
             (ANY, "rect_filled", 1, 2, 3, 4),
             (ANY, "draw_text", words, 5, 6),
             (ANY, "get_text_length_in_pixels", words),
@@ -828,19 +806,11 @@ def monitor(call, helpers, tmp_path):
         display = call("EM_DisplayInit")
         wrap = [d + "EM_XIImageWrapper", display, pixels, 8, 4, 32, frame_name, False, *look]
         image = call(*wrap)
-        call.on(
-            d,
-            display,
-            (bool, "devices"),
-            (bool, "device_modes", preview),
-            ([], "device_modes", nowhere),
-            (none, "connect", preview, mode),
-            (640, "get_width", preview),
-            (360, "get_height", preview),
-            # A frame not of the connected mode's size is refused.
-            (lambda error: error != none, "display_frame", preview, image),
-            (not_found, "display_frame", nowhere, image),
-        )
+        call.on(d, display, (bool, "devices"), (bool, "device_modes", preview), ([], "device_modes", nowhere))
+        call.on(d, display, (none, "connect", preview, mode), (640, "get_width", preview), (360, "get_height", preview))
+        # A frame not of the connected mode's size is refused.
+        wrong_size = (lambda error: error != none, "display_frame", preview, image)
+        call.on(d, display, wrong_size, (not_found, "display_frame", nowhere, image))
         call.on("EM_XIImage_", image, (8, "getWidth"), (4, "getHeight"), (32, "getRowBytes"))
         call.on("EM_XIImage_", image, (2, "addRef"), (1, "removeRef"))  # its count of references
         whole = call(*wrap[:2], frame, 640, 360, 640 * 4, *wrap[6:])
@@ -855,14 +825,8 @@ def monitor(call, helpers, tmp_path):
             (OverflowError, *changed(wrap, 3, BIG)),
             (TypeError, "EM_XIImage_addRef", display),
         )
-        call.on(
-            d,
-            display,
-            (_renderlib.EM_errorParam, "connect", None, mode),
-            (not_found, "connect", nowhere, mode),
-            (none, "disconnect", preview),
-            (0, "get_width", preview),
-        )
+        call.on(d, display, (_renderlib.EM_errorParam, "connect", None, mode), (not_found, "connect", nowhere, mode))
+        call.on(d, display, (none, "disconnect", preview), (0, "get_width", preview))
         call.each("release_external_monitor", (None, display), (ValueError, display))  # the second: released already
         call.fails(ValueError, d + "devices", display)
         # The library's fault switches: its start fails; it finds no device.
@@ -895,16 +859,13 @@ def vector_calls(call, kind, first, second):
         (lambda n: n >= 8, "capacity"),
         (ANY, "append", second),
         (ANY, "push_back", first),
-        (ANY, "__getitem__", 0),
-        (ANY, "__getitem__", -1),
-        (ANY, "__getitem__", slice(0, 2)),
+        *[(ANY, "__getitem__", at) for at in (0, -1, slice(0, 2))],
         (IndexError, "__getitem__", 99),
         (ANY, "__setitem__", 0, second),
         (ANY, "__setitem__", slice(0, 1), [first]),
         (ANY, "__setitem__", slice(4, 5)),
         (ValueError, "__setitem__", slice(0, 4, 2), [first]),
-        (ANY, "__delitem__", 0),
-        (ANY, "__delitem__", slice(0, 1)),
+        *[(ANY, "__delitem__", at) for at in (0, slice(0, 1))],
         (IndexError, "__delitem__", 99),
         (ANY, "__getslice__", 0, 2),
         (ANY, "__setslice__", 0, 1, [second]),
@@ -912,9 +873,7 @@ def vector_calls(call, kind, first, second):
         (ANY, "__delslice__", 0, 1),
         # back, front and pop_back are only ever called on a vector that
         # has elements: on an empty one they read or free what is not there.
-        (ANY, "append", first),
-        (ANY, "append", second),
-        (ANY, "append", first),
+        *[(ANY, "append", each) for each in (first, second, first)],
         (lambda n: n >= 3, "size"),
         "back front pop pop_back",
         (ANY, "assign", 3, second),
@@ -969,9 +928,7 @@ def iterate(call, prefix, sequence):
         closed,
         (StopIteration, "previous"),
         "__next__ __next__ __next__",
-        (StopIteration, "__next__"),
-        (StopIteration, "__next__"),
-        (StopIteration, "value"),
+        *[(StopIteration, name) for name in ("__next__", "__next__", "value")],
     )
     call("delete_SwigPyIterator", copy)
 
@@ -1061,11 +1018,8 @@ def argument_errors(call, helpers, tmp_path):
     # Functions that take any object first, or whose None is not refused
     # (the two record writers, which the images family leaves out too).
     takes_anything = {"SWIG_PyInstanceMethod_New", "new_GfxInterface", "new_LoadFrameInterface"}
-    unsafe_with_none = {
-        "make_tarsel_raster_info_from_base64",
-        "make_tarsel_raster_info_from_bits",
-        "raster_info_to_bytearray",
-    }
+    record_writers = {"make_tarsel_raster_info_from_base64", "make_tarsel_raster_info_from_bits"}
+    unsafe_with_none = record_writers | {"raster_info_to_bytearray"}
     # SWIG's overload dispatch of this operator answers three arguments with
     # NotImplemented while leaving its TypeError set (a SystemError results).
     no_extra_argument = {"SwigPyIterator___sub__"}
@@ -1141,12 +1095,10 @@ def check_flat(name, make, helpers, tmp_path):
 
     try:
         run(WARM_UP)
-        references, live = [sys.getrefcount(item) for item in watched], live_objects()
+        counts, live = [sys.getrefcount(item) for item in watched], live_objects()
         start, middle, end = memory(), run(ROUNDS), run(ROUNDS)
         after = [sys.getrefcount(item) for item in watched]
-        moved = [
-            "%s %.60r: %+d" % (type(x).__name__, x, b - a) for x, a, b in zip(watched, references, after) if b != a
-        ]
+        moved = ["%s %.60r: %+d" % (type(x).__name__, x, b - a) for x, a, b in zip(watched, counts, after) if b != a]
         assert moved == [], "%s: references gained or lost over %d rounds: %s" % (name, 2 * ROUNDS, moved)
         assert live_objects() == live, "%s: engine or monitor objects left alive" % name
         growth = [[b - a for a, b in zip(earlier, later)] for earlier, later in ((start, middle), (middle, end))]
@@ -1199,7 +1151,6 @@ def test_every_wrapper_is_exercised(shared_registry, tmp_path):
             finally:
                 cleanup()
             exercised |= call.names
-    assert NOT_EXERCISED and all(
-        isinstance(getattr(renderlib, name[: -len("_swigregister")], None), type) for name in NOT_EXERCISED
-    )
+    registered = [name[: -len("_swigregister")] for name in NOT_EXERCISED]
+    assert registered and all(isinstance(getattr(renderlib, cls, None), type) for cls in registered)
     assert sorted(set(module_functions()) ^ exercised) == sorted(NOT_EXERCISED)

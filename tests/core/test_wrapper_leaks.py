@@ -690,8 +690,8 @@ def drawing_callbacks(call, helpers, tmp_path):
         _renderlib.tarsel_set_gfx_impl(None)
         call("free_tarsel_effect", flare)
 
-    watched = [drawing, drawing.this, wrong, wrong.this, raising, raising.this, xs, ys, flare, words, values]
-    return step, watched + [short_values], cleanup
+    watched = named(locals(), "drawing wrong raising xs ys flare words values short_values")
+    return step, watched + [drawing.this, wrong.this, raising.this], cleanup
 
 
 class StillSource(renderlib.LoadFrameInterface):

@@ -121,16 +121,9 @@ def test_param_members_at_their_offsets():
         poke(param, offset, struct.pack(fmt, value))
         assert getattr(param, name) == value, name
         poke(param, offset, saved)
-    floats = [
-        ("min_bound", 80),
-        ("max_bound", 84),
-        ("step", 88),
-        ("normalize_scale", 92),
-        ("slider_min", 192),
-        ("slider_max", 196),
-        ("big_slider_min", 200),
-        ("big_slider_max", 204),
-    ]
+    # Two runs of floats: from byte 80 and from byte 192.
+    floats = list(zip("min_bound max_bound step normalize_scale".split(), range(80, 96, 4)))
+    floats += zip("slider_min slider_max big_slider_min big_slider_max".split(), range(192, 208, 4))
     for i, (_, offset) in enumerate(floats):
         poke(param, offset, struct.pack("<f", 0.5 + i))
     assert [getattr(param, name) for name, _ in floats] == [0.5 + i for i in range(len(floats))]
@@ -161,14 +154,8 @@ def test_genotype_members_at_their_offsets():
     assert peek(genotype, 0, 1336) == bytes(1336)
     poke(genotype, 0, b"N" * 32 + b"overflow")  # 32 bytes, no terminator
     assert genotype.name == "N" * 32
-    ints = [
-        ("disable_gpu", 392),
-        ("force_gpu_enable", 396),
-        ("force_gpu_disable", 400),
-        ("gpu_disable_reason", 404),
-        ("rgba_mode", 1224),
-        ("transform_with_warp", 1232),
-    ]
+    ints = list(zip("disable_gpu force_gpu_enable force_gpu_disable gpu_disable_reason".split(), range(392, 408, 4)))
+    ints += [("rgba_mode", 1224), ("transform_with_warp", 1232)]
     for i, (_, offset) in enumerate(ints):
         poke(genotype, offset, struct.pack("<i", -100 - i))
     assert [getattr(genotype, name) for name, _ in ints] == [-100 - i for i in range(len(ints))]

@@ -43,27 +43,19 @@ SETTINGS = {
 # The less common settings, each rendered once more over the coloured card:
 # (label, effect, settings, pixel type name). Integer and half-float frames
 # are compared byte for byte, float frames by float_signature.
-VARIANTS = (
-    [
-        ("T_Blur edges Repeat", "T_Blur", {"edges": "Repeat", "radius": "12"}, "rgbaf"),
-        ("T_Blur edges Mirror", "T_Blur", {"edges": "Mirror", "radius": "12"}, "rgbaf"),
-        ("T_Blur quality Draft", "T_Blur", {"quality": "Draft", "radius": "12"}, "rgbaf"),
-    ]
-    + [
-        (
-            "T_Transform edges %s filter %s" % (edges, f),
-            "T_Transform",
-            dict(SETTINGS["T_Transform"], scale="0.4 0.4", edges=edges, filter=f),
-            "rgbaf",
-        )
-        for edges, f in (("Repeat", "Nearest"), ("Mirror", "Bilinear"), ("Clamp", "Bicubic"))
-    ]
-    + []
-    + [
-        ("T_Blur in %s" % kind, "T_Blur", {"radius": "6"}, kind)
-        for kind in ("rgba16", "bgra16", "argb8", "la8", "l16", "rgba16f", "argbf")
-    ]
-)
+VARIANTS = [
+    ("T_Blur %s %s" % (key, value), "T_Blur", {key: value, "radius": "12"}, "rgbaf")
+    for key, value in (("edges", "Repeat"), ("edges", "Mirror"), ("quality", "Draft"))
+]
+SMALLER = dict(SETTINGS["T_Transform"], scale="0.4 0.4")  # the card's edges inside the frame
+VARIANTS += [
+    ("T_Transform edges %s filter %s" % (edges, f), "T_Transform", dict(SMALLER, edges=edges, filter=f), "rgbaf")
+    for edges, f in (("Repeat", "Nearest"), ("Mirror", "Bilinear"), ("Clamp", "Bicubic"))
+]
+VARIANTS += [
+    ("T_Blur in %s" % kind, "T_Blur", {"radius": "6"}, kind)
+    for kind in "rgba16 bgra16 argb8 la8 l16 rgba16f argbf".split()
+]
 
 
 # The coloured card resized with each filter: (label, filter, width, height, sharpness).

@@ -4,7 +4,6 @@ renders side by side, and Python threads that keep running meanwhile."""
 import threading
 import time
 
-import numpy
 import pytest
 
 import _renderlib
@@ -97,20 +96,6 @@ def test_two_renders_at_once_while_python_keeps_running(instance):
     assert results == [True, True]
     # While both renders ran, the Python counter was not starved (the lock was free).
     assert rendering > 0.2 * solo, (rendering, solo)
-
-
-def test_numpy_arrays_and_bytearrays_render_alike(instance):
-    effect = instance("T_Gradient")
-    info, buffer = effects.raster(_renderlib.pixel_rgbaf, 40, 30)
-    as_array = numpy.zeros((30, 40, 4), numpy.float32)
-    assert effects.render(effect, (info, buffer))
-    assert effects.render(effect, (info, as_array))
-    assert as_array.tobytes() == bytes(buffer)
-    blur = instance("T_Blur")
-    out_a, out_b = numpy.zeros_like(as_array), effects.raster(_renderlib.pixel_rgbaf, 40, 30)
-    assert effects.render(blur, (info, out_a), [(info, as_array)])
-    assert effects.render(blur, out_b, [(info, buffer)])
-    assert out_a.tobytes() == bytes(out_b[1])
 
 
 def test_a_resize_runs_without_the_lock():

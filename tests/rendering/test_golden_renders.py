@@ -74,7 +74,7 @@ def resized(filter, width, height, sharpness):
     info = renderlib.T_RasterInfo()
     dest = bytearray(_renderlib.tarsel_get_resized_image_size(source[0], width, height, 0, 0, 1.0, 0))
     assert _renderlib.tarsel_resize_native_image(
-        source[0], source[1], width, height, 0, 0, 1.0, info, dest, filter, 0.0, 0.0, sharpness
+        *source, width, height, 0, 0, 1.0, info, dest, filter, 0.0, 0.0, sharpness
     ) == [width, height]
     return dest
 
@@ -82,9 +82,8 @@ def resized(filter, width, height, sharpness):
 def float_signature(frame):
     """SHA-256 of the float frame's values rounded to 1e-4: close settings
     (a blur's edge mode, a filter) often keep the channel sums."""
-    return {
-        "rounded_sha256": hashlib.sha256(numpy.round(numpy.frombuffer(frame, numpy.float32), 4).tobytes()).hexdigest()
-    }
+    rounded = numpy.round(numpy.frombuffer(frame, numpy.float32), 4)
+    return {"rounded_sha256": hashlib.sha256(rounded.tobytes()).hexdigest()}
 
 
 def card(pixel_type, colorspace, changes):
@@ -125,10 +124,8 @@ def results():
         }
     for label, name, settings, kind in VARIANTS:
         frame = render_frame(name, False, getattr(_renderlib, "pixel_" + kind), "linear", settings)
-        if kind.endswith("f") and not kind.endswith("16f"):
-            found[label] = float_signature(frame)
-        else:
-            found[label] = {"sha256": hashlib.sha256(frame).hexdigest()}
+        floats = kind.endswith("f") and not kind.endswith("16f")
+        found[label] = float_signature(frame) if floats else {"sha256": hashlib.sha256(frame).hexdigest()}
     for label, *resize in RESIZES:
         found[label] = float_signature(resized(*resize))
     return found

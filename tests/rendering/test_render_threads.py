@@ -4,7 +4,6 @@ renders side by side, and Python threads that keep running meanwhile."""
 import threading
 import time
 
-import pytest
 
 import _renderlib
 import renderlib
@@ -63,18 +62,6 @@ def test_an_abort_from_another_thread_ends_a_4k_render_quickly(instance, probe):
     assert effects.render(effect, small_dest, [small_source])
     assert small_dest[1][:4] == bytes([255, 0, 0, 255])
     _renderlib.free_tarsel_effect(effect)
-
-
-def test_a_request_made_before_the_render_aborts_it_until_cleared(instance):
-    effect = instance("T_Gradient")
-    dest = effects.raster(_renderlib.pixel_rgba8, 64, 64)
-    _renderlib.tarsel_abort_render()
-    try:
-        with pytest.raises(RuntimeError, match="^Tarsel Abort$"):
-            effects.render(effect, dest)
-    finally:
-        _renderlib.tarsel_clear_abort()
-    assert effects.render(effect, dest)
 
 
 def test_two_renders_at_once_while_python_keeps_running(instance):

@@ -43,18 +43,14 @@ def test_lists_and_buffers(quick, probe, name):
         assert passed[rasters_at - 1].startswith(arrays) and passed[images_at - 1].startswith(arrays)
     assert call(*arguments(name, quick, dest=bytes(16))) is True  # the destination needs no writability
     assert call(*arguments(name, quick, dest=numpy.zeros((4, 4), numpy.float32), images=[numpy.zeros(8)])) is True
-
-    class ListSubclass(list):
-        pass
-
-    class MyRaster(renderlib.T_RasterInfo):
-        pass
-
+    ListSubclass, MyRaster = type("ListSubclass", (list,), {}), type("MyRaster", (renderlib.T_RasterInfo,), {})
     assert call(*arguments(name, quick, rasters=ListSubclass([renderlib.T_RasterInfo()]))) is True
     not_a_list = "in %s, arg %d of type %s: expected list."
     not_a_raster = "in %s, arg %d of type T_RasterInfo **, elts should be T_RasterInfo" % (name, rasters_at)
     no_view = "in %s, arg %d, cannot get Py_buffer view; maybe has no size?" % (name, images_at)
     not_pixels = "in method '%s', argument %d of type '(RawImage)'" % (name, dest_at)
+    foreign = "in method '%s', argument %d of type 'T_RasterInfo **': cannot convert to T_RasterInfo"
+    no_buffers = "in %s, arg %d, list must contain objects that support the buffer protocol" % (name, images_at)
     refusals = [
         (dict(rasters=(renderlib.T_RasterInfo(),)), not_a_list % (name, rasters_at, "T_RasterInfo **")),
         (dict(images=(bytearray(4),)), not_a_list % (name, images_at, "RawImage *")),
@@ -62,17 +58,10 @@ def test_lists_and_buffers(quick, probe, name):
         # a subclass under another name, and a bare pointer object, are refused alike
         (dict(rasters=[MyRaster()]), not_a_raster),
         (dict(rasters=[renderlib.T_RasterInfo().this]), not_a_raster),
-        (
-            dict(rasters=[type("T_RasterInfo", (), {})()]),
-            "in method '%s', argument %d of type 'T_RasterInfo **': cannot convert to T_RasterInfo"
-            % (name, rasters_at),
-        ),
+        (dict(rasters=[type("T_RasterInfo", (), {})()]), foreign % (name, rasters_at)),  # a class of the same name
         (dict(images=[bytes(4)]), no_view),
         (dict(images=[numpy.zeros((4, 4))[:, ::2]]), no_view),
-        (
-            dict(images=[5]),
-            "in %s, arg %d, list must contain objects that support the buffer protocol" % (name, images_at),
-        ),
+        (dict(images=[5]), no_buffers),
         (dict(dest="pixels"), not_pixels),
         # the exporter raises ValueError for a strided array; the destination is refused as TypeError all the same
         (dict(dest=numpy.zeros((4, 4))[:, ::2]), not_pixels),

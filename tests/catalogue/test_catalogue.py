@@ -4,7 +4,6 @@ effect created, read and freed."""
 import pytest
 
 import _renderlib
-import renderlib
 from effect_helpers import all_entries, all_params
 from renderlib import effects
 
@@ -88,10 +87,3 @@ def test_indices_reach_the_engine_unchecked_and_null_becomes_none(probe, lookup,
     for index in (n, -1, 2147483647):
         assert getattr(_renderlib, lookup)(index) is None  # the reference engine returns null
     assert probe.calls() == ["%s(%d)" % (lookup, i) for i in (n, -1, 2147483647)]
-
-
-def test_a_record_made_from_python_is_read_only_and_owned():
-    info = renderlib.Plugin_Info()
-    assert info.plugin_name is None and info.this.own()
-    with pytest.raises(AttributeError):
-        info.plugin_name = "T_Blur"

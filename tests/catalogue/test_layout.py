@@ -203,10 +203,12 @@ def test_genotype_input_names_and_count():
     assert genotype._get_canonical_input_names() == ("front", "back")
 
 
-def test_plugin_info_fields_at_their_offsets():
+def test_plugin_info_fields_at_their_offsets_and_read_only():
     info = renderlib.Plugin_Info()
-    assert peek(info, 0, 120) == bytes(120)
+    assert peek(info, 0, 120) == bytes(120) and info.plugin_name is None and info.this.own()
     poke(info, 68, bytes([1, 255]))
     assert (info.use_prev_dest_p, info.dynamic_genotype_p) == (1, 255)
     with StringSlot(info, 0, b"T_Example"), StringSlot(info, 32, b"Tests"):
         assert (info.plugin_name, info._category) == ("T_Example", "Tests")
+    with pytest.raises(AttributeError):
+        info.plugin_name = "T_Blur"

@@ -73,14 +73,9 @@ def test_every_parameter_type_is_in_the_catalogue(instance):
     assert {3, 4} <= {param.n_channels for param in params if param.ptype == _renderlib.ptype_color}
 
 
-@pytest.mark.parametrize(
-    "lookup, count",
-    [
-        ("get_tarsel_plugin_info_i", "get_n_tarsel_effects"),
-        ("get_tarsel_builder_info_i", "get_n_tarsel_builder_effects"),
-    ],
-)
+@pytest.mark.parametrize("lookup, count", [("plugin", "effects"), ("builder", "builder_effects")])
 def test_indices_reach_the_engine_unchecked_and_null_becomes_none(probe, lookup, count):
+    lookup, count = "get_tarsel_%s_info_i" % lookup, "get_n_tarsel_%s" % count
     n = getattr(_renderlib, count)()
     assert probe.calls() == ["%s()" % count]
     probe.clear_calls()

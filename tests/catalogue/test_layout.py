@@ -40,32 +40,40 @@ FLAG_BITS = [
 ]
 FLAG_SHORTS = [("needs_input_n", 10), ("auto_animation_type", 16)]
 ALL_FLAG_FIELDS = [f[0] for f in FLAG_BITS] + [f[0] for f in FLAG_SHORTS]
+# Genotype's one-bit flags: (field, byte, bit)
+GENOTYPE_BITS = [
+    ("need_other_frames_p", 1240, 1),
+    ("use_prev_dest_p", 1240, 2),
+    ("mask_color_p", 1241, 6),
+    ("transition_p", 1243, 2),
+    ("use_reduce_p", 1244, 0),
+]
+# Both records' bit fields: (record, field, byte, first bit, width), with the record's size and its other fields.
+BIT_FIELDS = [(renderlib.ParamFlags, *f) for f in FLAG_BITS] + [(renderlib.Genotype, *g, 1) for g in GENOTYPE_BITS]
+SIZES = {renderlib.ParamFlags: 36, renderlib.Genotype: 1336}
+SIBLINGS = {renderlib.ParamFlags: ALL_FLAG_FIELDS, renderlib.Genotype: [g[0] for g in GENOTYPE_BITS]}
 
 
-def flag_record(bits):
-    """36 bytes with the given (byte, bit) pairs set."""
-    record = bytearray(36)
+def bits_record(size, bits):
+    """`size` bytes with the given (byte, bit) pairs set."""
+    record = bytearray(size)
     for byte, bit in bits:
         record[byte + bit // 8] |= 1 << (bit % 8)
     return bytes(record)
 
 
-def field_bits(byte, first, width):
-    return [(byte, first + i) for i in range(width)]
-
-
-@pytest.mark.parametrize("name, byte, first, width", FLAG_BITS, ids=[f[0] for f in FLAG_BITS])
-def test_flag_field_reads_exactly_its_bits(name, byte, first, width):
-    flags = renderlib.ParamFlags()
-    poke(flags, 0, flag_record(field_bits(byte, first, width)))
-    assert getattr(flags, name) == (1 << width) - 1
-    assert all(getattr(flags, other) == 0 for other in ALL_FLAG_FIELDS if other != name)
+@pytest.mark.parametrize("record, name, byte, first, width", BIT_FIELDS, ids=[f[1] for f in BIT_FIELDS])
+def test_a_bit_field_reads_exactly_its_bits(record, name, byte, first, width):
+    proxy, size = record(), SIZES[record]
+    poke(proxy, 0, bits_record(size, [(byte, first + i) for i in range(width)]))
+    assert getattr(proxy, name) == (1 << width) - 1
+    assert all(getattr(proxy, other) == 0 for other in SIBLINGS[record] if other != name)
     # Both neighbours of the field set, the field itself clear.
-    poke(flags, 0, flag_record([(byte, first - 1), (byte, first + width)] if first else [(byte, first + width)]))
-    assert getattr(flags, name) == 0
+    poke(proxy, 0, bits_record(size, [(byte, first - 1), (byte, first + width)] if first else [(byte, first + width)]))
+    assert getattr(proxy, name) == 0
     # The lowest bit alone reads as 1: the field is not shifted.
-    poke(flags, 0, flag_record([(byte, first)]))
-    assert getattr(flags, name) == 1
+    poke(proxy, 0, bits_record(size, [(byte, first)]))
+    assert getattr(proxy, name) == 1
 
 
 @pytest.mark.parametrize("name, offset", FLAG_SHORTS)
@@ -171,26 +179,6 @@ def test_genotype_members_at_their_offsets():
     assert struct.unpack("<i", peek(genotype, 392, 4))[0] == 7
     with StringSlot(genotype, 1304, b"Menu name"):
         assert genotype.effect_popup_name == "Menu name"
-
-
-GENOTYPE_BITS = [
-    ("need_other_frames_p", 1240, 1),
-    ("use_prev_dest_p", 1240, 2),
-    ("mask_color_p", 1241, 6),
-    ("transition_p", 1243, 2),
-    ("use_reduce_p", 1244, 0),
-]
-
-
-@pytest.mark.parametrize("name, byte, bit", GENOTYPE_BITS, ids=[g[0] for g in GENOTYPE_BITS])
-def test_genotype_flag_bits(name, byte, bit):
-    genotype = renderlib.Genotype()
-    poke(genotype, byte, bytes([1 << bit]))
-    assert getattr(genotype, name) == 1
-    assert all(getattr(genotype, other) == 0 for other, _, _ in GENOTYPE_BITS if other != name)
-    neighbours = (1 << (bit - 1) if bit else 0) | (1 << (bit + 1) if bit < 7 else 0)
-    poke(genotype, byte, bytes([neighbours]))
-    assert getattr(genotype, name) == 0
 
 
 def test_genotype_input_names_and_count():

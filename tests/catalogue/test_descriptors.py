@@ -57,8 +57,7 @@ def test_group_names_follow_group_flags(instance):
     params = genotype._get_params()
     opening = next(p for p in params if p.flags.group_start_p)
     assert opening.param_group >= 0 and genotype.get_param_group_name(opening)
-    ungrouped = [p for p in params if p.param_group < 0]
-    assert all(genotype.get_param_group_name(p) == "" for p in ungrouped)
+    assert all(genotype.get_param_group_name(p) == "" for p in params if p.param_group < 0)
     assert any(p.flags.group_end_p for p in params)
     # A parameter that only documents its group (and opens none) names no group, though it has one.
     doc_only = lambda p: p.flags.doc_group_p and not p.flags.group_start_p and p.param_group >= 0  # noqa: E731
@@ -92,9 +91,7 @@ def test_limits_and_unlimited_bounds(instance):
 
 
 def test_old_defaults_apply_below_their_version_limit(instance):
-    params = [p for p in catalogue_params(instance) if p.use_old_default_p and p.ptype == _renderlib.ptype_float]
-    assert params
-    param = params[0]
+    param = next(p for p in catalogue_params(instance) if p.use_old_default_p and p.ptype == _renderlib.ptype_float)
     limit = param.old_default_version_limit
     assert param.needs_old_default(limit - 1) is True and param.needs_old_default(limit) is False
     assert param.maybe_set_to_old_default(None, limit) is False

@@ -78,13 +78,8 @@ KINDS = {
     FLARE: "instance text float float - int int int int - - float int float int int text text text bool".split(),
 }
 # Each kind's C type, as a refusal names it, and a value it refuses.
-REFUSED = {
-    "instance": ("EffectGlobals_t *", renderlib.Genotype()),
-    "text": ("char const *", b"x"),
-    "int": ("int", 1.5),
-    "float": ("float", "1"),
-    "bool": ("bool", 1),
-}
+C_TYPES = {"instance": "EffectGlobals_t *", "text": "char const *", "int": "int", "float": "float", "bool": "bool"}
+REFUSED = {"instance": renderlib.Genotype(), "text": b"x", "int": 1.5, "float": "1", "bool": 1}
 
 
 @pytest.mark.parametrize("name", [EFFECT, FLARE], ids=["effect", "flare"])
@@ -93,12 +88,11 @@ def test_every_scalar_position_names_itself(quick, name):
     for position, kind in enumerate(KINDS[name], start=1):
         if kind == "-":
             continue
-        type_name, bad = REFUSED[kind]
         args = arguments(name, quick)
-        args[position - 1] = bad
+        args[position - 1] = REFUSED[kind]
         with pytest.raises(TypeError) as raised:
             call(*args)
-        assert str(raised.value) == "in method '%s', argument %d of type '%s'" % (name, position, type_name)
+        assert str(raised.value) == "in method '%s', argument %d of type '%s'" % (name, position, C_TYPES[kind])
     for count in (19, 21):
         with pytest.raises(TypeError, match="^%s expected 20 arguments, got %d$" % (name, count)):
             call(*(arguments(name, quick) + [0])[:count])

@@ -4,65 +4,22 @@ effect created, read and freed."""
 import pytest
 
 import _renderlib
-import renderlib
 from effect_helpers import all_entries, all_params
 from renderlib import effects
 
-PARAM_ATTRIBUTES = [
-    "ptype",
-    "name",
-    "canonical_name",
-    "n_channels",
-    "n_channels_c1",
-    "use_old_default_p",
-    "old_default_version_limit",
-    "min_bound",
-    "max_bound",
-    "step",
-    "normalize_scale",
-    "slider_min",
-    "slider_max",
-    "big_slider_min",
-    "big_slider_max",
-    "param_group",
-    "flags_string",
-]
-FLAG_ATTRIBUTES = [
-    "wenable_p",
-    "fromfile_popup_p",
-    "screen_mode",
-    "autotrans_type",
-    "hidden_p",
-    "group_start_p",
-    "group_start_open_p",
-    "group_end_p",
-    "doc_group_p",
-    "needs_input_n",
-    "auto_animation_type",
-    "dont_publish_p",
-    "builder_disable_p",
-    "builder_disable_one_p",
-]
-GENOTYPE_ATTRIBUTES = [
-    "name",
-    "flare_param",
-    "disable_gpu",
-    "force_gpu_enable",
-    "force_gpu_disable",
-    "gpu_disable_reason",
-    "rgba_mode",
-    "rgba_ok_for_inputs",
-    "transform_with_warp",
-    "alpha_z_source_input",
-    "need_other_frames_p",
-    "use_prev_dest_p",
-    "mask_color_p",
-    "transition_p",
-    "use_reduce_p",
-    "effect_popup_name",
-    "old_default_effect",
-    "old_default_version_limit",
-]
+PARAM_ATTRIBUTES = (
+    "ptype name canonical_name n_channels n_channels_c1 use_old_default_p old_default_version_limit min_bound max_bound"
+    " step normalize_scale slider_min slider_max big_slider_min big_slider_max param_group flags_string"
+).split()
+FLAG_ATTRIBUTES = (
+    "wenable_p fromfile_popup_p screen_mode autotrans_type hidden_p group_start_p group_start_open_p group_end_p"
+    " doc_group_p needs_input_n auto_animation_type dont_publish_p builder_disable_p builder_disable_one_p"
+).split()
+GENOTYPE_ATTRIBUTES = (
+    "name flare_param disable_gpu force_gpu_enable force_gpu_disable gpu_disable_reason rgba_mode rgba_ok_for_inputs"
+    " transform_with_warp alpha_z_source_input need_other_frames_p use_prev_dest_p mask_color_p transition_p"
+    " use_reduce_p effect_popup_name old_default_effect old_default_version_limit"
+).split()
 
 
 def test_catalogues_hold_named_categorised_effects():
@@ -110,45 +67,18 @@ def test_every_effect_is_created_read_completely_and_freed(probe):
 
 
 def test_every_parameter_type_is_in_the_catalogue(instance):
-    types = set()
-    colour_channels = set()
-    for name, builder in all_entries():
-        for param in all_params(instance(name, builder)):
-            types.add(param.ptype)
-            if param.ptype == _renderlib.ptype_color:
-                colour_channels.add(param.n_channels)
-    assert {
-        _renderlib.ptype_float,
-        _renderlib.ptype_int,
-        _renderlib.ptype_color,
-        _renderlib.ptype_popup,
-        _renderlib.ptype_boolean,
-        _renderlib.ptype_pushbutton,
-        _renderlib.ptype_string,
-        _renderlib.ptype_label,
-        _renderlib.ptype_flare,
-    } <= types
-    assert {3, 4} <= colour_channels
+    params = [param for name, builder in all_entries() for param in all_params(instance(name, builder))]
+    names = "float int color popup boolean pushbutton string label flare".split()
+    assert {getattr(_renderlib, "ptype_" + name) for name in names} <= {param.ptype for param in params}
+    assert {3, 4} <= {param.n_channels for param in params if param.ptype == _renderlib.ptype_color}
 
 
-@pytest.mark.parametrize(
-    "lookup, count",
-    [
-        ("get_tarsel_plugin_info_i", "get_n_tarsel_effects"),
-        ("get_tarsel_builder_info_i", "get_n_tarsel_builder_effects"),
-    ],
-)
+@pytest.mark.parametrize("lookup, count", [("plugin", "effects"), ("builder", "builder_effects")])
 def test_indices_reach_the_engine_unchecked_and_null_becomes_none(probe, lookup, count):
+    lookup, count = "get_tarsel_%s_info_i" % lookup, "get_n_tarsel_%s" % count
     n = getattr(_renderlib, count)()
     assert probe.calls() == ["%s()" % count]
     probe.clear_calls()
     for index in (n, -1, 2147483647):
         assert getattr(_renderlib, lookup)(index) is None  # the reference engine returns null
     assert probe.calls() == ["%s(%d)" % (lookup, i) for i in (n, -1, 2147483647)]
-
-
-def test_a_record_made_from_python_is_read_only_and_owned():
-    info = renderlib.Plugin_Info()
-    assert info.plugin_name is None and info.this.own()
-    with pytest.raises(AttributeError):
-        info.plugin_name = "T_Blur"

@@ -60,20 +60,11 @@ def test_value_map_rules():
         del values["radius"]
 
 
-@pytest.mark.parametrize(
-    "vector",
-    [
-        renderlib.bool_vector,
-        renderlib.string_vector,
-        renderlib.float_vector,
-        renderlib.genotype_vector,
-        renderlib.param_vector,
-    ],
-)
+@pytest.mark.parametrize("vector", "bool_vector string_vector float_vector genotype_vector param_vector".split())
 def test_an_empty_vector_has_no_front_back_or_last_element_to_pop(vector):
-    empty = vector()
+    empty = getattr(renderlib, vector)()
     for method in ("front", "back", "pop_back"):
-        with pytest.raises(IndexError, match="in method '%s_%s': the vector is empty" % (vector.__name__, method)):
+        with pytest.raises(IndexError, match="in method '%s_%s': the vector is empty" % (vector, method)):
             getattr(empty, method)()
     assert len(empty) == 0
 

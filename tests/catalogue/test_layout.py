@@ -40,32 +40,40 @@ FLAG_BITS = [
 ]
 FLAG_SHORTS = [("needs_input_n", 10), ("auto_animation_type", 16)]
 ALL_FLAG_FIELDS = [f[0] for f in FLAG_BITS] + [f[0] for f in FLAG_SHORTS]
+# Genotype's one-bit flags: (field, byte, bit)
+GENOTYPE_BITS = [
+    ("need_other_frames_p", 1240, 1),
+    ("use_prev_dest_p", 1240, 2),
+    ("mask_color_p", 1241, 6),
+    ("transition_p", 1243, 2),
+    ("use_reduce_p", 1244, 0),
+]
+# Both records' bit fields: (record, field, byte, first bit, width), with the record's size and its other fields.
+BIT_FIELDS = [(renderlib.ParamFlags, *f) for f in FLAG_BITS] + [(renderlib.Genotype, *g, 1) for g in GENOTYPE_BITS]
+SIZES = {renderlib.ParamFlags: 36, renderlib.Genotype: 1336}
+SIBLINGS = {renderlib.ParamFlags: ALL_FLAG_FIELDS, renderlib.Genotype: [g[0] for g in GENOTYPE_BITS]}
 
 
-def flag_record(bits):
-    """36 bytes with the given (byte, bit) pairs set."""
-    record = bytearray(36)
+def bits_record(size, bits):
+    """`size` bytes with the given (byte, bit) pairs set."""
+    record = bytearray(size)
     for byte, bit in bits:
         record[byte + bit // 8] |= 1 << (bit % 8)
     return bytes(record)
 
 
-def field_bits(byte, first, width):
-    return [(byte, first + i) for i in range(width)]
-
-
-@pytest.mark.parametrize("name, byte, first, width", FLAG_BITS, ids=[f[0] for f in FLAG_BITS])
-def test_flag_field_reads_exactly_its_bits(name, byte, first, width):
-    flags = renderlib.ParamFlags()
-    poke(flags, 0, flag_record(field_bits(byte, first, width)))
-    assert getattr(flags, name) == (1 << width) - 1
-    assert all(getattr(flags, other) == 0 for other in ALL_FLAG_FIELDS if other != name)
+@pytest.mark.parametrize("record, name, byte, first, width", BIT_FIELDS, ids=[f[1] for f in BIT_FIELDS])
+def test_a_bit_field_reads_exactly_its_bits(record, name, byte, first, width):
+    proxy, size = record(), SIZES[record]
+    poke(proxy, 0, bits_record(size, [(byte, first + i) for i in range(width)]))
+    assert getattr(proxy, name) == (1 << width) - 1
+    assert all(getattr(proxy, other) == 0 for other in SIBLINGS[record] if other != name)
     # Both neighbours of the field set, the field itself clear.
-    poke(flags, 0, flag_record([(byte, first - 1), (byte, first + width)] if first else [(byte, first + width)]))
-    assert getattr(flags, name) == 0
+    poke(proxy, 0, bits_record(size, [(byte, first - 1), (byte, first + width)] if first else [(byte, first + width)]))
+    assert getattr(proxy, name) == 0
     # The lowest bit alone reads as 1: the field is not shifted.
-    poke(flags, 0, flag_record([(byte, first)]))
-    assert getattr(flags, name) == 1
+    poke(proxy, 0, bits_record(size, [(byte, first)]))
+    assert getattr(proxy, name) == 1
 
 
 @pytest.mark.parametrize("name, offset", FLAG_SHORTS)
@@ -121,16 +129,9 @@ def test_param_members_at_their_offsets():
         poke(param, offset, struct.pack(fmt, value))
         assert getattr(param, name) == value, name
         poke(param, offset, saved)
-    floats = [
-        ("min_bound", 80),
-        ("max_bound", 84),
-        ("step", 88),
-        ("normalize_scale", 92),
-        ("slider_min", 192),
-        ("slider_max", 196),
-        ("big_slider_min", 200),
-        ("big_slider_max", 204),
-    ]
+    # Two runs of floats: from byte 80 and from byte 192.
+    floats = list(zip("min_bound max_bound step normalize_scale".split(), range(80, 96, 4)))
+    floats += zip("slider_min slider_max big_slider_min big_slider_max".split(), range(192, 208, 4))
     for i, (_, offset) in enumerate(floats):
         poke(param, offset, struct.pack("<f", 0.5 + i))
     assert [getattr(param, name) for name, _ in floats] == [0.5 + i for i in range(len(floats))]
@@ -161,14 +162,8 @@ def test_genotype_members_at_their_offsets():
     assert peek(genotype, 0, 1336) == bytes(1336)
     poke(genotype, 0, b"N" * 32 + b"overflow")  # 32 bytes, no terminator
     assert genotype.name == "N" * 32
-    ints = [
-        ("disable_gpu", 392),
-        ("force_gpu_enable", 396),
-        ("force_gpu_disable", 400),
-        ("gpu_disable_reason", 404),
-        ("rgba_mode", 1224),
-        ("transform_with_warp", 1232),
-    ]
+    ints = list(zip("disable_gpu force_gpu_enable force_gpu_disable gpu_disable_reason".split(), range(392, 408, 4)))
+    ints += [("rgba_mode", 1224), ("transform_with_warp", 1232)]
     for i, (_, offset) in enumerate(ints):
         poke(genotype, offset, struct.pack("<i", -100 - i))
     assert [getattr(genotype, name) for name, _ in ints] == [-100 - i for i in range(len(ints))]
@@ -186,26 +181,6 @@ def test_genotype_members_at_their_offsets():
         assert genotype.effect_popup_name == "Menu name"
 
 
-GENOTYPE_BITS = [
-    ("need_other_frames_p", 1240, 1),
-    ("use_prev_dest_p", 1240, 2),
-    ("mask_color_p", 1241, 6),
-    ("transition_p", 1243, 2),
-    ("use_reduce_p", 1244, 0),
-]
-
-
-@pytest.mark.parametrize("name, byte, bit", GENOTYPE_BITS, ids=[g[0] for g in GENOTYPE_BITS])
-def test_genotype_flag_bits(name, byte, bit):
-    genotype = renderlib.Genotype()
-    poke(genotype, byte, bytes([1 << bit]))
-    assert getattr(genotype, name) == 1
-    assert all(getattr(genotype, other) == 0 for other, _, _ in GENOTYPE_BITS if other != name)
-    neighbours = (1 << (bit - 1) if bit else 0) | (1 << (bit + 1) if bit < 7 else 0)
-    poke(genotype, byte, bytes([neighbours]))
-    assert getattr(genotype, name) == 0
-
-
 def test_genotype_input_names_and_count():
     genotype = renderlib.Genotype()
     poke(genotype, 32, b"Front".ljust(12, b"\0") + b"Background12")  # the second fills its slot
@@ -216,10 +191,12 @@ def test_genotype_input_names_and_count():
     assert genotype._get_canonical_input_names() == ("front", "back")
 
 
-def test_plugin_info_fields_at_their_offsets():
+def test_plugin_info_fields_at_their_offsets_and_read_only():
     info = renderlib.Plugin_Info()
-    assert peek(info, 0, 120) == bytes(120)
+    assert peek(info, 0, 120) == bytes(120) and info.plugin_name is None and info.this.own()
     poke(info, 68, bytes([1, 255]))
     assert (info.use_prev_dest_p, info.dynamic_genotype_p) == (1, 255)
     with StringSlot(info, 0, b"T_Example"), StringSlot(info, 32, b"Tests"):
         assert (info.plugin_name, info._category) == ("T_Example", "Tests")
+    with pytest.raises(AttributeError):
+        info.plugin_name = "T_Blur"

@@ -1,7 +1,5 @@
 """The engine's free parameter queries, called with pointer proxies."""
 
-import pytest
-
 import _renderlib
 import renderlib
 from effect_helpers import all_entries, all_params
@@ -21,8 +19,6 @@ def test_title_with_the_callers_buffer_matches_get_titles(instance):
     assert len(titles) == colour.n_channels_c1
     for channel, title in enumerate(titles):
         assert _renderlib.tarsel_get_param_title(colour, channel, " " * 255, 256) == title
-    with pytest.raises(OverflowError, match=r"^in method 'tarsel_get_param_title', argument 4 of type 'size_t'$"):
-        _renderlib.tarsel_get_param_title(colour, 0, " " * 255, -1)
 
 
 def test_bounds_through_float_pointers(instance):
@@ -31,8 +27,6 @@ def test_bounds_through_float_pointers(instance):
     assert _renderlib.tarsel_get_param_bounds2(param, 1.0, 0, *[o.data for o in outputs], 0) is None
     lower, upper, third, fourth = param.get_limits()
     assert [o[0] for o in outputs] == [lower, upper if upper is not None else 1000000.0, third, fourth]
-    with pytest.raises(TypeError, match=r"^tarsel_get_param_bounds2 expected 8 arguments, got 7$"):
-        _renderlib.tarsel_get_param_bounds2(param, 1.0, 0, *[o.data for o in outputs])
 
 
 def test_node_flags_and_text(instance):
@@ -44,8 +38,4 @@ def test_node_flags_and_text(instance):
 
 def test_popup_names_through_a_pointer(instance):
     param = a_param(instance, lambda p: p.flags.fromfile_popup_p)
-    with pytest.raises(
-        TypeError, match=r"^in method 'tarsel_get_fromfile_popup_names', argument 2 of type 'char \*\*\*'$"
-    ):
-        _renderlib.tarsel_get_fromfile_popup_names(param, [])
     assert _renderlib.tarsel_get_fromfile_popup_names(param, None) == len(param.get_fromfile_popup_names())

@@ -26,8 +26,7 @@ def test_every_value_survives_the_saved_text(instance):
         original = instance(name, builder)
         texts = effects.parameter_texts(original)
         copy = effects.recreate(original)
-        assert copy is not None, name
-        assert copy.plugin_name == name
+        assert copy is not None and copy.plugin_name == name, name
         assert effects.parameter_texts(copy) == texts, name
         _renderlib.free_tarsel_effect(copy)
 
@@ -68,19 +67,14 @@ def test_freeing_disowns_the_proxy(probe):
     dropped = _renderlib.init_tarsel_effect("T_Glow", False)
     del dropped  # the owning proxy frees the instance
     assert probe.live_instances() == live
-    with pytest.raises(TypeError, match=r"^in method 'free_tarsel_effect', argument 1 of type 'EffectGlobals_t \*'$"):
-        _renderlib.free_tarsel_effect(renderlib.Genotype())
 
 
 def test_instance_queries(instance):
     blur, echo = instance("T_Blur"), instance("T_Echo")
-    status = _renderlib.tarsel_get_gpu_status(blur)
-    assert "CPU" in status
+    assert "CPU" in _renderlib.tarsel_get_gpu_status(blur)
     assert _renderlib.tarsel_effect_is_time_varying(echo, "", 0) == 1
     assert _renderlib.tarsel_effect_is_time_varying(blur, "", 0) == 0
     assert _renderlib.tarsel_effect_is_time_varying(blur, "no_such_parameter", 0) == -1
-    with pytest.raises(TypeError, match=r"^in method 'tarsel_effect_is_time_varying', argument 3 of type 'int'$"):
-        _renderlib.tarsel_effect_is_time_varying(blur, "", 1.5)
     assert repr(blur) == 'Globals("T_Blur" @0x%x)' % int(blur.this)
     assert blur != echo and blur == blur
 
@@ -103,8 +97,6 @@ def test_add_param_to_list_is_the_engines_collector(instance, shared_registry):
     assert collected == [(genotype._get_params()[0], genotype)]
     assert _renderlib.add_param_to_list(genotype, 10_000, shared_registry.object_address(collected)) == 0
     assert collected[1] == (None, genotype)  # an index outside the table reads nothing
-    with pytest.raises(TypeError, match=r"^in method 'add_param_to_list', argument 3 of type 'void \*'$"):
-        _renderlib.add_param_to_list(genotype, 0, collected)
 
 
 def test_engine_controls(probe, tmp_path, error_handler_removed):
@@ -115,25 +107,12 @@ def test_engine_controls(probe, tmp_path, error_handler_removed):
     _renderlib.set_tarsel_luts(str(lut), "", 1.0)
     _renderlib.set_tarsel_luts(str(tmp_path / "missing.lut"), "", 1.0)
     assert messages  # the missing file was reported
-    with pytest.raises(TypeError, match=r"^in method 'set_tarsel_luts', argument 3 of type 'float'$"):
-        _renderlib.set_tarsel_luts("", "", "1")
     _renderlib.tarsel_free_all_stamp_collections()
     assert probe.stamp_count() == 0
     _renderlib.tarsel_shutdown_apps()
     effect = _renderlib.init_tarsel_effect("T_Blur", False)  # usable again after shutdown
     assert effect is not None
     _renderlib.free_tarsel_effect(effect)
-    for control in (_renderlib.tarsel_free_all_stamp_collections, _renderlib.tarsel_shutdown_apps):
-        with pytest.raises(TypeError, match="takes no arguments"):
-            control(1)
-
-
-def test_an_abort_during_creation_gives_tarsel_abort_and_no_instance(probe):
-    live = probe.live_instances()
-    probe.abort_next_call()
-    with pytest.raises(RuntimeError, match="^Tarsel Abort$"):
-        _renderlib.init_tarsel_effect("T_Blur", False)
-    assert probe.live_instances() == live
 
 
 def test_creation_and_freeing_from_four_threads(probe):

@@ -31,8 +31,6 @@ def test_registered_pixels_are_copied_and_read_back(store):
         TypeError, match=r"^in method 'tarsel_register_flare_texture', argument 5 of type '\(RawImage\)'$"
     ):
         _renderlib.tarsel_register_flare_texture(2, 2, 4, 1, "pixels")
-    with pytest.raises(TypeError, match=r"^in method 'tarsel_register_flare_texture', argument 3 of type 'int'$"):
-        _renderlib.tarsel_register_flare_texture(2, 2, 4.0, 1, pixels)
 
 
 def test_textures_load_from_png_files(store, tmp_path):
@@ -50,8 +48,6 @@ def test_textures_load_from_png_files(store, tmp_path):
         assert bytes(out) == rgba.tobytes()
     missing = _renderlib.tarsel_load_flare_texture(str(tmp_path / "missing.png"))
     assert missing < 0 and "missing.png" in _renderlib.tarsel_get_flare_texture_error()
-    with pytest.raises(TypeError, match=r"^in method 'tarsel_load_flare_texture', argument 1 of type 'char const \*'$"):
-        _renderlib.tarsel_load_flare_texture(path)  # a str, not a path object
 
 
 def test_freeing_the_store_forgets_every_texture(store):
@@ -60,36 +56,16 @@ def test_freeing_the_store_forgets_every_texture(store):
     status, *sizes = _renderlib.tarsel_get_texture_info(index)
     assert status != 0 and sizes == [0, 0, 0, 0, 0]
     assert _renderlib.tarsel_get_texture_pixels(index, bytearray(1)) < 0
-    for call in (_renderlib.tarsel_free_all_flare_textures, _renderlib.tarsel_get_flare_texture_error):
-        with pytest.raises(TypeError, match="takes no arguments"):
-            call(0)
+
+
+COLOURS = ("linear", "srgb", "linear")  # the colour spaces of the background, the result and the drawing
 
 
 def render_flare(effect, width=64, height=64, brightness=1.0):
     info, dest = effects.raster(_renderlib.pixel_rgba8, width, height)
-    ok = _renderlib.render_tarsel_lensflare_to_native_image(
-        effect,
-        "",
-        width / 2,
-        height / 2,
-        dest,
-        0,
-        0,
-        1,
-        1,
-        [info],
-        [None],
-        brightness,
-        1,
-        1.0,
-        0,
-        0,
-        "linear",
-        "srgb",
-        "linear",
-        False,
-    )
-    return ok, dest
+    return _renderlib.render_tarsel_lensflare_to_native_image(
+        effect, "", width / 2, height / 2, dest, 0, 0, 1, 1, [info], [None], brightness, 1, 1.0, 0, 0, *COLOURS, False
+    ), dest
 
 
 def test_a_lens_flare_draws_and_a_texture_element_uses_the_store(store, instance):

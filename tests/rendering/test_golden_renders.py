@@ -43,27 +43,19 @@ SETTINGS = {
 # The less common settings, each rendered once more over the coloured card:
 # (label, effect, settings, pixel type name). Integer and half-float frames
 # are compared byte for byte, float frames by float_signature.
-VARIANTS = (
-    [
-        ("T_Blur edges Repeat", "T_Blur", {"edges": "Repeat", "radius": "12"}, "rgbaf"),
-        ("T_Blur edges Mirror", "T_Blur", {"edges": "Mirror", "radius": "12"}, "rgbaf"),
-        ("T_Blur quality Draft", "T_Blur", {"quality": "Draft", "radius": "12"}, "rgbaf"),
-    ]
-    + [
-        (
-            "T_Transform edges %s filter %s" % (edges, f),
-            "T_Transform",
-            dict(SETTINGS["T_Transform"], scale="0.4 0.4", edges=edges, filter=f),
-            "rgbaf",
-        )
-        for edges, f in (("Repeat", "Nearest"), ("Mirror", "Bilinear"), ("Clamp", "Bicubic"))
-    ]
-    + []
-    + [
-        ("T_Blur in %s" % kind, "T_Blur", {"radius": "6"}, kind)
-        for kind in ("rgba16", "bgra16", "argb8", "la8", "l16", "rgba16f", "argbf")
-    ]
-)
+VARIANTS = [
+    ("T_Blur %s %s" % (key, value), "T_Blur", {key: value, "radius": "12"}, "rgbaf")
+    for key, value in (("edges", "Repeat"), ("edges", "Mirror"), ("quality", "Draft"))
+]
+SMALLER = dict(SETTINGS["T_Transform"], scale="0.4 0.4")  # the card's edges inside the frame
+VARIANTS += [
+    ("T_Transform edges %s filter %s" % (edges, f), "T_Transform", dict(SMALLER, edges=edges, filter=f), "rgbaf")
+    for edges, f in (("Repeat", "Nearest"), ("Mirror", "Bilinear"), ("Clamp", "Bicubic"))
+]
+VARIANTS += [
+    ("T_Blur in %s" % kind, "T_Blur", {"radius": "6"}, kind)
+    for kind in "rgba16 bgra16 argb8 la8 l16 rgba16f argbf".split()
+]
 
 
 # The coloured card resized with each filter: (label, filter, width, height, sharpness).
@@ -82,7 +74,7 @@ def resized(filter, width, height, sharpness):
     info = renderlib.T_RasterInfo()
     dest = bytearray(_renderlib.tarsel_get_resized_image_size(source[0], width, height, 0, 0, 1.0, 0))
     assert _renderlib.tarsel_resize_native_image(
-        source[0], source[1], width, height, 0, 0, 1.0, info, dest, filter, 0.0, 0.0, sharpness
+        *source, width, height, 0, 0, 1.0, info, dest, filter, 0.0, 0.0, sharpness
     ) == [width, height]
     return dest
 
@@ -90,9 +82,8 @@ def resized(filter, width, height, sharpness):
 def float_signature(frame):
     """SHA-256 of the float frame's values rounded to 1e-4: close settings
     (a blur's edge mode, a filter) often keep the channel sums."""
-    return {
-        "rounded_sha256": hashlib.sha256(numpy.round(numpy.frombuffer(frame, numpy.float32), 4).tobytes()).hexdigest()
-    }
+    rounded = numpy.round(numpy.frombuffer(frame, numpy.float32), 4)
+    return {"rounded_sha256": hashlib.sha256(rounded.tobytes()).hexdigest()}
 
 
 def card(pixel_type, colorspace, changes):
@@ -133,10 +124,8 @@ def results():
         }
     for label, name, settings, kind in VARIANTS:
         frame = render_frame(name, False, getattr(_renderlib, "pixel_" + kind), "linear", settings)
-        if kind.endswith("f") and not kind.endswith("16f"):
-            found[label] = float_signature(frame)
-        else:
-            found[label] = {"sha256": hashlib.sha256(frame).hexdigest()}
+        floats = kind.endswith("f") and not kind.endswith("16f")
+        found[label] = float_signature(frame) if floats else {"sha256": hashlib.sha256(frame).hexdigest()}
     for label, *resize in RESIZES:
         found[label] = float_signature(resized(*resize))
     return found

@@ -111,16 +111,12 @@ def test_every_call_refuses_a_freed_instance():
             "tarsel_widget_draw": (effect, "") + view,
             "tarsel_widget_mouse_event": (effect, "") + view + (0, 0, 0),
             "tarsel_effect_is_time_varying": (effect, "", 0),
-            "tarsel_get_gpu_status": (effect,),
             "tarsel_convert_to_bgra_8": (effect, info, pixels, bytearray(64), 0, 0, 0, "", ""),
-            "free_tarsel_effect": (effect,),
-            "delete_EffectGlobals_t": (effect,),
-            "EffectGlobals_t_plugin_name_get": (effect,),
-            "EffectGlobals_t_n_effects_get": (effect,),
-            "EffectGlobals_t_effect_genotype_get": (effect,),
-            "EffectGlobals_t__get_genotypes": (effect,),
-            "EffectGlobals_t__get_shared_params": (effect,),
         }
+        for name in ("tarsel_get_gpu_status free_tarsel_effect delete_EffectGlobals_t EffectGlobals_t_plugin_name_get "
+                     "EffectGlobals_t_n_effects_get EffectGlobals_t_effect_genotype_get EffectGlobals_t__get_genotypes "
+                     "EffectGlobals_t__get_shared_params").split():
+            calls[name] = (effect,)
         for name, args in calls.items():
             try:
                 getattr(_renderlib, name)(*args)

@@ -9,41 +9,19 @@ import pytest
 import _renderlib
 import renderlib
 
-# The 26 words of a raster descriptor; None for words the module does not name.
-WORDS = [
-    "ds_xsize",
-    "ds_ysize",
-    "x_origin",
-    "y_origin",
-    "world_xsize",
-    "world_ysize",
-    "pixel_type",
-    None,
-    "bit_depth",
-    "raster_type",
-    "sizeof_pixel",
-    "clamp_p",
-    "res_factor",
-    "downsample_offset",
-    "extra_line_stride_elts",
-    None,
-    None,
-    None,
-    None,
-    None,
-    "flip_y_p",
-    "levels_601_p",
-    "is_premultiplied",
-    None,
-]
-WRITABLE = [name for name in WORDS[:15] if name]
+# The first 24 words of a raster descriptor (two floats follow); "-" for words the module does not name.
+WORDS = (
+    "ds_xsize ds_ysize x_origin y_origin world_xsize world_ysize pixel_type - bit_depth raster_type sizeof_pixel"
+    " clamp_p res_factor downsample_offset extra_line_stride_elts - - - - - flip_y_p levels_601_p is_premultiplied -"
+).split()
+WRITABLE = [name for name in WORDS[:15] if name != "-"]
 READ_ONLY = ["background_pixel", "flip_y_p", "levels_601_p", "is_premultiplied", "x_origin_float", "y_origin_float"]
 
 
 def test_raster_descriptor_fields_read_and_write_their_own_words():
     info = renderlib.T_RasterInfo()
     ctypes.memmove(int(info.this), struct.pack("<24i", *range(1, 25)) + struct.pack("<ff", 0.25, -4.5), 104)
-    assert [getattr(info, name) for name in WORDS if name] == [i + 1 for i, name in enumerate(WORDS) if name]
+    assert [getattr(info, name) for name in WORDS if name != "-"] == [i + 1 for i, n in enumerate(WORDS) if n != "-"]
     assert (info.x_origin_float, info.y_origin_float) == (0.25, -4.5)
     info = renderlib.T_RasterInfo()
     for value, name in enumerate(WRITABLE, start=1):
@@ -59,12 +37,6 @@ def test_enumerated_fields_take_any_int_and_read_only_fields_refuse():
     info = renderlib.T_RasterInfo()
     info.pixel_type, info.raster_type = 16, -5  # 16: an engine format with no name here
     assert (info.pixel_type, info.raster_type) == (16, -5)
-    with pytest.raises(TypeError, match=r"^in method 'T_RasterInfo_pixel_type_set', argument 2 of type 'T_PixelType'$"):
-        info.pixel_type = "rgba8"
-    with pytest.raises(
-        OverflowError, match=r"^in method 'T_RasterInfo_raster_type_set', argument 2 of type 'T_RasterType'$"
-    ):
-        info.raster_type = 2**31
     for name in READ_ONLY:
         with pytest.raises(AttributeError):
             setattr(info, name, 1)

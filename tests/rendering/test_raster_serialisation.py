@@ -31,21 +31,17 @@ def test_base64_text_from_a_standard_encoder_restores_every_byte(words, padded):
     assert info.ds_xsize == words[0] and info.extra_line_stride_elts == words[14]
 
 
-def test_text_stopping_at_an_equals_sign_decodes_only_what_precedes_it():
-    raw = bytes(range(1, 105))
-    text = base64.b64encode(raw).decode()
-    info = record_from_words([7] * 26)
-    _renderlib.make_tarsel_raster_info_from_base64(info, text[:40] + "=" + text[41:])
-    image = bytes(_renderlib.raster_info_to_bytearray(info))
-    assert image[:30] == raw[:30] and image[30:] == bytes(74)
-
-
-def test_a_short_text_leaves_the_tail_zero():
+@pytest.mark.parametrize(
+    "cut, kept",
+    [(lambda text: text[:40] + "=" + text[41:], 30), (lambda text: text[:120], 90)],
+    ids=["stopping at an equals sign", "short"],
+)
+def test_a_cut_text_decodes_what_precedes_the_cut_and_leaves_the_tail_zero(cut, kept):
     raw = bytes(range(100, 204))
     info = record_from_words([-1] * 26)
-    _renderlib.make_tarsel_raster_info_from_base64(info, base64.b64encode(raw).decode()[:120])
+    _renderlib.make_tarsel_raster_info_from_base64(info, cut(base64.b64encode(raw).decode()))
     image = bytes(_renderlib.raster_info_to_bytearray(info))
-    assert image[:90] == raw[:90] and image[90:] == bytes(14)
+    assert image[:kept] == raw[:kept] and image[kept:] == bytes(104 - kept)
 
 
 def test_from_bits_copies_the_first_104_bytes_of_the_texts_encoding():
@@ -58,10 +54,6 @@ def test_from_bits_copies_the_first_104_bytes_of_the_texts_encoding():
         TypeError, match=r"^in method 'make_tarsel_raster_info_from_bits', argument 2 of type 'char const \*'$"
     ):
         _renderlib.make_tarsel_raster_info_from_bits(info, b"A" * 104)
-    with pytest.raises(
-        TypeError, match=r"^in method 'make_tarsel_raster_info_from_base64', argument 2 of type 'char const \*'$"
-    ):
-        _renderlib.make_tarsel_raster_info_from_base64(info, 5)
     assert bytes(_renderlib.raster_info_to_bytearray(info)) == b"A" * 104  # refused calls change nothing
 
 
@@ -86,8 +78,6 @@ def test_the_decoder_writes_into_the_callers_bytes(shared_registry):
     untouched = bytearray(b"\xee" * 4)
     _renderlib.base64decode("QUJD", shared_registry.byte_address(untouched, 0), 0)
     assert untouched == bytearray(b"\xee" * 4)  # a length of 0 touches nothing
-    with pytest.raises(TypeError, match=r"^in method 'base64decode', argument 2 of type 'uchar_t \*'$"):
-        _renderlib.base64decode("QUJD", dest, 4)
 
 
 @pytest.mark.parametrize(

@@ -17,7 +17,6 @@ import pytest
 import _renderlib as E
 import renderlib
 from isolated import run_cleanly
-from process_memory import UNDER_ADDRESS_SANITIZER
 from segments import connect, segment_file, serve
 
 QUEUE = 1 << 16
@@ -200,27 +199,18 @@ def test_a_long_run_of_messages_arrives_whole_and_in_order(pair):
         received += 1
 
 
-# Makes a server's pid handle, then as many as asked (after a tenth of that to
-# warm up), and prints the growth of the process's resident memory.
+# A server's pid handle: a new one each time, owning its copy, freed without a
+# word (the binding generator warns on standard output of a pointer it cannot
+# free). That many calls leave memory flat: tests/core/test_wrapper_leaks.py.
 PID_HANDLES = """
 import sys, _renderlib, renderlib
-from process_memory import resident_kib
 server = _renderlib.ShmemManager_serve(sys.argv[1], 1 << 12, 1 << 12)
-pid = server.get_server_pid()  # a new handle each time, owning its copy
+pid = server.get_server_pid()
 print(type(pid).__name__, "pid_t *" in repr(pid), pid.own(), pid != server.get_server_pid())
-for _ in range(int(sys.argv[2]) // 10):
-    server.get_server_pid()
-before = resident_kib()
-for _ in range(int(sys.argv[2])):
-    server.get_server_pid()
-print(resident_kib() - before)
+del pid
 server.remove()
 """
 
 
 def test_server_pid_handles_are_copies_freed_silently(name):
-    calls = 1000 if "vgpreload" in os.environ.get("LD_PRELOAD", "") else 1000000
-    lines = run_cleanly(PID_HANDLES, timeout=120, args=[name, calls]).splitlines()
-    assert lines[0] == "SwigPyObject True True True" and len(lines) == 2, lines[:5]  # nothing else printed
-    if not UNDER_ADDRESS_SANITIZER:  # a pid_t kept per call would be some 32 MB
-        assert int(lines[1]) < 1024, lines
+    assert run_cleanly(PID_HANDLES, args=[name]) == "SwigPyObject True True True\n"

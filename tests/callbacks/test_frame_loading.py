@@ -23,7 +23,7 @@ def colour(input, frame):
     return (frame / 100.0, 0.1 + input / 10.0, 0.5, 1.0)
 
 
-def solid_frame(colour, width, height):
+def solid_frame(colour, width=WIDTH, height=HEIGHT):
     """A (T_RasterInfo, bytearray) pair of straight rgbaf pixels of one colour."""
     info, pixels = effects.raster(_renderlib.pixel_rgbaf, width, height)
     numpy.frombuffer(pixels, numpy.float32).reshape(-1, 4)[:] = colour
@@ -71,15 +71,11 @@ def effect(instance):
 def render(effect, inputs=None):
     """The rendered frame (from the current frame of input 0 unless `inputs`
     are given), premultiplied: the render writes straight colour."""
-    dest = solid_frame((0, 0, 0, 0), WIDTH, HEIGHT)
-    assert effects.render(effect, dest, inputs or [source_frame()], frame=FRAME)
+    dest = solid_frame((0, 0, 0, 0))
+    assert effects.render(effect, dest, inputs or [solid_frame(colour(0, FRAME))], frame=FRAME)
     result = numpy.frombuffer(dest[1], numpy.float32).reshape(HEIGHT, WIDTH, 4).copy()
     result[..., :3] *= result[..., 3:]
     return result
-
-
-def source_frame(input=0, frame=FRAME):
-    return solid_frame(colour(input, frame), WIDTH, HEIGHT)
 
 
 @pytest.mark.parametrize("size", [None, (4, 2)], ids=["frames as asked", "smaller frames"])
@@ -110,7 +106,7 @@ def test_the_inputs_and_frames_an_effect_asks_for(effect, name, changes, asked):
     source = FrameSource(lambda input, frame: colour(0, frame) if input == 0 else (1, 1, 1, 1))
     _renderlib.set_load_frame_impl(source)
     blur = effect(name, **changes)
-    inputs = [source_frame(), solid_frame((1, 1, 1, 1), WIDTH, HEIGHT)][: len(blur.effect_genotype._get_input_names())]
+    inputs = [solid_frame(colour(0, FRAME)), solid_frame((1, 1, 1, 1))][: len(blur.effect_genotype._get_input_names())]
     result = render(blur, inputs)
     assert sorted((input, frame) for input, frame, _, _ in source.requests) == asked
     if name == "T_TimeBlur":

@@ -1,5 +1,7 @@
-"""The engine drawing effect widgets through a Python drawing object, and mouse
-events dragging them."""
+"""Python drawing objects: called through the module's method wrappers,
+handed over to the native side, and drawing effect widgets for the engine;
+mouse events dragging the widgets. (Every wrapper's failure paths, the
+abstract bases' included, and reference counts: tests/core.)"""
 
 import gc
 import weakref
@@ -55,13 +57,54 @@ def swatch(colour, top, label):
     ]
 
 
+def test_the_method_wrappers_dispatch_to_the_python_override():
+    # The bare pointer object is not the bound instance, so the wrapper calls
+    # the native method, which the director forwards to the subclass. (The
+    # director holds no reference: the instance must stay referenced.)
+    class Doubling(SvgDrawing):
+        def lines(self, xs, ys):  # the vectors are the caller's own, live
+            super().lines(xs, ys)
+            for i in range(len(xs)):
+                xs[i] *= 2
+
+    drawing = Doubling()
+    _renderlib.GfxInterface_line(drawing.this, 1, 2, 3.5, 4)
+    _renderlib.GfxInterface_stipple_pattern(drawing.this, 0xF0F0)
+    _renderlib.GfxInterface_draw_text(drawing.this, "caf\xe9", 5, 6)
+    assert _renderlib.GfxInterface_get_text_length_in_pixels(drawing.this, "abcd") == 24
+    xs, ys = renderlib.float_vector([1, 2]), renderlib.float_vector([3, 4])
+    _renderlib.GfxInterface_lines(drawing.this, xs, ys)
+    assert drawing.calls == [
+        ("line", (1.0, 2.0, 3.5, 4.0)),
+        ("stipple_pattern", (0xF0F0,)),
+        ("draw_text", ("caf\xe9", 5.0, 6.0)),
+        ("get_text_length_in_pixels", ("abcd",)),
+        ("lines", ((1.0, 2.0), (3.0, 4.0))),
+    ]
+    assert list(xs) == [2, 4] and list(ys) == [3, 4]
+
+
+def test_a_disowned_callback_object_belongs_to_the_native_side():
+    # (Until then the native object holds no reference: see the tests of a
+    # source or drawing object that goes away.)
+    drawing = SvgDrawing()
+    assert isinstance(drawing.__disown__(), weakref.ProxyType)
+    alive = weakref.ref(drawing)
+    _renderlib.disown_GfxInterface(drawing)  # a second hand-over changes nothing
+    del drawing
+    gc.collect()
+    # The native side now owns it, and it owns its Python instance.
+    assert alive() is not None
+    _renderlib.GfxInterface_flush(alive().this)
+    assert alive().calls == [("flush", ())]
+
+
 def test_one_draw_in_order(instance, drawing):
     draw(instance("T_Gradient"))
     name, (context,) = drawing.calls[0]
     assert name == "set_graphics_context" and context is not None
-    assert drawing.calls[1:] == [("start_drawing", (3,))] + swatch((0.0, 0.0, 0.0), 10.0, "Start Color") + swatch(
-        (1.0, 1.0, 1.0), 34.0, "End Color"
-    ) + [
+    swatches = swatch((0.0, 0.0, 0.0), 10.0, "Start Color") + swatch((1.0, 1.0, 1.0), 34.0, "End Color")
+    assert drawing.calls[1:] == [("start_drawing", (3,))] + swatches + [
         # The centre's handle, its name centred under it by its measured width.
         ("color_3f", (1.0, 1.0, 0.0)),
         ("line_width", (1.0,)),
@@ -133,6 +176,7 @@ def test_events_that_touch_nothing(instance, drawing):
         ("get_text_length_in_pixels", TypeError, "^SWIG director type mismatch in output value of type 'long'$"),
     ],
 )
+@pytest.mark.usefixtures("drawing")  # taken out again afterwards
 def test_a_failed_drawing_call_aborts_the_draw_with_it_as_cause(instance, probe, operation, cause, message):
     class Failing(SvgDrawing):
         def _record(self, name, *args):
@@ -147,16 +191,13 @@ def test_a_failed_drawing_call_aborts_the_draw_with_it_as_cause(instance, probe,
     effect = instance("T_Gradient")
     failing = Failing()
     _renderlib.tarsel_set_gfx_impl(failing)
-    try:
-        with pytest.raises(RuntimeError, match="^Tarsel Abort$") as raised:
-            draw(effect)
-        with pytest.raises(cause, match=message):
-            raise raised.value.__cause__
-        # Nothing was drawn after the failure, and the abort was that call's alone.
-        assert failing.operations()[-1] == operation
-        assert not probe.abort_requested()
-    finally:
-        _renderlib.tarsel_set_gfx_impl(None)
+    with pytest.raises(RuntimeError, match="^Tarsel Abort$") as raised:
+        draw(effect)
+    with pytest.raises(cause, match=message):
+        raise raised.value.__cause__
+    # Nothing was drawn after the failure, and the abort was that call's alone.
+    assert failing.operations()[-1] == operation
+    assert not probe.abort_requested()
 
 
 def test_a_drawing_object_that_goes_away_is_taken_back(instance, error_handler_removed):

@@ -8,6 +8,7 @@ import pathlib
 import subprocess
 import sys
 import textwrap
+from subprocess import PIPE
 
 import _renderlib
 import renderlib  # noqa: F401  (registers the proxy classes)
@@ -50,14 +51,9 @@ class Peer:
     def __init__(self, script, name):
         prologue = "import os, sys, time, zlib\nimport _renderlib, renderlib\nname = %r\n" % name
         paths = [str(TESTS), str(TESTS / "ipc")] + [p for p in [os.environ.get("PYTHONPATH")] if p]
-        self.process = subprocess.Popen(
-            [sys.executable, "-u", "-c", prologue + textwrap.dedent(script)],
-            stdin=subprocess.PIPE,
-            stdout=subprocess.PIPE,
-            stderr=subprocess.PIPE,
-            text=True,
-            env=dict(os.environ, PYTHONPATH=os.pathsep.join(paths)),
-        )
+        command = [sys.executable, "-u", "-c", prologue + textwrap.dedent(script)]
+        env = dict(os.environ, PYTHONPATH=os.pathsep.join(paths))
+        self.process = subprocess.Popen(command, stdin=PIPE, stdout=PIPE, stderr=PIPE, text=True, env=env)
 
     def line(self):
         """The next line the peer prints (empty when it ended)."""

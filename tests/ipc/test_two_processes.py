@@ -13,19 +13,20 @@ from segments import Peer, serve
 QUEUE = 1 << 15
 
 
-def test_a_blocked_writer_resumes_when_the_reader_drains(name):
-    server = serve(name, QUEUE, QUEUE)
-    peer = Peer(
-        """
+# The peer fills the queue, then blocks writing one more message.
+BLOCKED = """
 transport = _renderlib.ShmemManager_connect(name)
 while transport.try_write_pybuf(bytes(1000)):
     pass
 print("full")
 start = time.monotonic()
 print(transport.write_pybuf(b"last".ljust(1000)), round(time.monotonic() - start, 2))
-""",
-        name,
-    )
+"""
+
+
+def test_a_blocked_writer_resumes_when_the_reader_drains(name):
+    server = serve(name, QUEUE, QUEUE)
+    peer = Peer(BLOCKED, name)
     assert peer.line() == "full"
     time.sleep(0.3)
     count = 0
@@ -117,10 +118,8 @@ peer.reap()
 def test_a_dead_peer_ends_every_blocking_wait(name, side, reaped):
     out = run_cleanly(DEAD_PEER, timeout=30, args=[name, reaped, side]).splitlines()
     # Nothing read or sent, RETRY, within one wait slice (50 ms) and a margin.
-    assert out[:4] == [
-        "%s False %d True" % (what, E.ShmemError_RETRY) for what in ("read", "timed read", "write", "reserve")
-    ]
-    assert out[4] == ("served again True" if side == "server" else "client alive False")
+    waits = ["%s False %d True" % (what, E.ShmemError_RETRY) for what in ("read", "timed read", "write", "reserve")]
+    assert out == waits + ["served again True" if side == "server" else "client alive False"]
 
 
 # Any process of the same user can shrink a segment's object under the
@@ -159,11 +158,5 @@ _renderlib.ShmemManager_reset(name, True)
 )
 def test_a_segment_truncated_or_removed_under_its_transports(name, how):
     out = run_cleanly(GONE, timeout=30, args=[name, how]).splitlines()
-    invalid = E.ShmemError_INVALID_SEGMENT
-    assert out == [
-        "valid False",
-        "write False %d" % invalid,
-        "read None %d" % invalid,
-        "view True",
-        "peer None %d False True" % invalid,
-    ]
+    lines = "valid False|write False {0}|read None {0}|view True|peer None {0} False True"
+    assert out == lines.format(E.ShmemError_INVALID_SEGMENT).split("|")

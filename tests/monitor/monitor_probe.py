@@ -1,9 +1,25 @@
-"""The reference monitor library's test probe, reached through ctypes."""
+"""The reference monitor library's test probe, reached through ctypes, and
+images made for its displays."""
 
+import collections
 import ctypes
+from ctypes import POINTER, byref, c_char_p, c_int, c_longlong, c_void_p
 
-import _renderlib  # noqa: F401  (loads the monitor library)
+import _renderlib  # loads the monitor library
 from engine_probe import loaded_library_path
+
+WIDTH, HEIGHT = 640, 360
+# The image wrapper's arguments after the pixels; FRAME describes a whole
+# 640x360 frame of straight full-range 8-bit BGRA, top row first.
+Image = collections.namedtuple(
+    "Image", "width height row_bytes name bottom_up fmt aspect gamma premultiplied full_range"
+)
+FRAME = Image(WIDTH, HEIGHT, WIDTH * 4, "frame", False, _renderlib.EM_ImageFormat_32BitIntBGRA, 1.0, 2.2, False, True)
+
+
+def wrap(display, pixels, **changes):
+    """The display's image of `pixels`, described by FRAME with `changes`."""
+    return _renderlib.EM_Display_EM_XIImageWrapper(display, pixels, *FRAME._replace(**changes))
 
 
 def address(proxy):
@@ -13,22 +29,13 @@ def address(proxy):
 
 class MonitorProbe:
     def __init__(self):
-        lib = ctypes.CDLL(loaded_library_path("QRVExternalMonitor"))
-        self.lib = lib
-        lib.qrv_probe_call.restype = ctypes.c_char_p
-        lib.qrv_probe_call.argtypes = [ctypes.c_int]
-        lib.qrv_probe_image_refs.argtypes = [ctypes.c_void_p]
-        lib.qrv_probe_object_number.argtypes = [ctypes.c_void_p]
-        lib.qrv_probe_preview_frame.argtypes = [
-            ctypes.c_void_p,
-            ctypes.c_void_p,
-            ctypes.c_int,
-            ctypes.POINTER(ctypes.c_int),
-            ctypes.POINTER(ctypes.c_int),
-            ctypes.POINTER(ctypes.c_longlong),
-            ctypes.c_char_p,
-            ctypes.c_int,
-        ]
+        self.lib = lib = ctypes.CDLL(loaded_library_path("QRVExternalMonitor"))
+        lib.qrv_probe_call.restype = c_char_p
+        lib.qrv_probe_call.argtypes = [c_int]
+        lib.qrv_probe_image_refs.argtypes = lib.qrv_probe_object_number.argtypes = [c_void_p]
+        # display, pixels and their size, width, height, frames, name and its size
+        frame_args = [c_void_p, c_void_p, c_int, POINTER(c_int), POINTER(c_int), POINTER(c_longlong), c_char_p, c_int]
+        lib.qrv_probe_preview_frame.argtypes = frame_args
 
     def calls(self):
         """The call log, oldest first."""
@@ -57,17 +64,10 @@ class MonitorProbe:
     def preview_frame(self, display):
         """(bgra bytes, width, height, frames shown since connect, image name)
         of the preview device's last frame (at most 1920x1080)."""
-        width, height, frames = ctypes.c_int(), ctypes.c_int(), ctypes.c_longlong()
+        width, height, frames = c_int(), c_int(), c_longlong()
         pixels, name = ctypes.create_string_buffer(1920 * 1080 * 4), ctypes.create_string_buffer(256)
         size = self.lib.qrv_probe_preview_frame(
-            address(display),
-            pixels,
-            len(pixels),
-            ctypes.byref(width),
-            ctypes.byref(height),
-            ctypes.byref(frames),
-            name,
-            len(name),
+            address(display), pixels, len(pixels), byref(width), byref(height), byref(frames), name, len(name)
         )
         assert size >= 0, "no live display"
         return pixels.raw[:size], width.value, height.value, frames.value, name.value.decode()

@@ -1,8 +1,12 @@
-"""Displays: connecting, their virtual operations, and their lifetime."""
+"""Displays: connecting, their virtual operations, and their lifetime; image
+proxies: one reference each, given back exactly once."""
+
+import gc
 
 import pytest
 
 import _renderlib as rl
+from monitor_probe import address, wrap
 
 
 def test_connect_answers_with_the_status_and_sets_the_frame_size(display, tmp_path, monkeypatch):
@@ -49,20 +53,38 @@ def test_two_displays_are_independent(probe):
     rl.release_external_monitor(second)
 
 
-@pytest.mark.parametrize(
-    "function, args, position, ctype",
-    [
-        ("EM_Display_connect", ("D", "preview", "x"), 1, "EM_Display *"),
-        ("EM_Display_connect", (None, 2, "x"), 2, "char const *"),
-        ("EM_Display_connect", (None, "preview", b"x"), 3, "char const *"),
-        ("EM_Display_display_frame", (None, "preview", bytearray(4)), 3, "EM_XIImage const *"),
-        ("EM_Display_get_height", (None, []), 2, "char const *"),
-        ("EM_XIImage_removeRef", ("I",), 1, "EM_XIImage *"),
-        ("EM_XIImage_getRowBytes", ("I",), 1, "EM_XIImage const *"),
-    ],
-)
-def test_argument_errors_name_function_position_and_type(display, function, args, position, ctype):
-    args = tuple(display if a is None and i == 0 else a for i, a in enumerate(args))
-    with pytest.raises(TypeError) as raised:
-        getattr(rl, function)(*args)
-    assert str(raised.value) == "in method '%s', argument %d of type '%s'" % (function, position, ctype)
+def make_image(display):
+    return wrap(display, bytearray(8 * 4 * 4), width=8, height=4, row_bytes=32, name=None, gamma=0.0)
+
+
+@pytest.mark.parametrize("deleted_first", [False, True])
+def test_the_image_proxy_gives_its_reference_back_once(display, probe, deleted_first):
+    image = make_image(display)
+    number, at = probe.number(image), address(image)
+    assert probe.image_refs(at) == 1
+    probe.clear_calls()
+    if deleted_first:
+        rl.delete_EM_XIImage(image)
+        assert not image.thisown
+    del image
+    gc.collect()
+    assert probe.calls() == ["image%d.removeRef() -> 0" % number]
+    assert probe.image_refs(at) == -1
+
+
+def test_image_add_and_remove_pass_straight_through_to_the_last_reference(display, probe):
+    image = make_image(display)
+    at = address(image)
+    assert (rl.EM_XIImage_addRef(image), image.addRef(), rl.EM_XIImage_removeRef(image)) == (2, 3, 2)
+    assert image.thisown and probe.image_refs(at) == 2
+    assert (image.getWidth(), image.getHeight(), rl.EM_XIImage_getRowBytes(image)) == (8, 4, 32)
+    assert image.removeRef() == 1 and image.removeRef() == 0  # the proxy's own reference given back by the caller
+    no_image = r"^in method 'EM_XIImage_getWidth', argument 1 of type 'EM_XIImage const \*': no image"
+    with pytest.raises(ValueError, match=no_image):
+        image.getWidth()
+    with pytest.raises(ValueError, match=r"argument 3 of type 'EM_XIImage const \*': its last reference"):
+        display.display_frame("preview", image)
+    with pytest.raises(ValueError, match="^in method 'delete_EM_XIImage'"):
+        rl.delete_EM_XIImage(image)
+    del image  # disowned by the refused delete: nothing more happens
+    assert probe.image_refs(at) == -1

@@ -58,6 +58,10 @@ def look_alike(this=None, slots=False, raising=False, on_this=None):
     return type("T_RasterInfo", (), {"__slots__": (), "this": property(get_this)})()
 
 
+def bare_pointer():  # the pointer object of a record
+    return renderlib.T_RasterInfo().this
+
+
 def released_view():
     view = memoryview(bytearray(8))
     view.release()
@@ -78,18 +82,25 @@ BUFFER_KINDS = [
     lambda n: memoryview(bytearray(n)),
     lambda n: numpy.zeros(n // 4, numpy.float32) if n % 4 == 0 else bytearray(n),
 ]
+
+
+def made(item):
+    """The tables below hold constants, and makers of the objects made anew for each call."""
+    return item() if callable(item) else item
+
+
 # Destinations whose buffer cannot be had (TypeError, whatever the exporter
 # raised), and objects that have none.
 UNVIEWABLE = [lambda: numpy.zeros((4, 4), numpy.float32)[:, ::2], lambda: memoryview(bytearray(16))[::2], released_view]
-NOT_BUFFERS = [lambda: "pixels", lambda: 16, lambda: None, lambda: [bytearray(4)], renderlib.T_RasterInfo]
-# Items of the rasters list other than a record or None: (maker, refused).
+NOT_BUFFERS = ["pixels", 16, None, lambda: [bytearray(4)], renderlib.T_RasterInfo]
+# Items of the rasters list other than a record or None: (item, refused).
 WRONG_RASTERS = [
     (renderlib.T_RenderInfo, True),
-    (lambda: 7, True),
-    (lambda: "raster", True),
+    (7, True),
+    ("raster", True),
     (lambda: bytearray(104), True),
     (NamedRaster, True),
-    (lambda: renderlib.T_RasterInfo().this, True),
+    (bare_pointer, True),
     (look_alike, True),
     (lambda: look_alike(this=5), True),
     (lambda: look_alike(slots=True, raising=True), True),
@@ -98,23 +109,10 @@ WRONG_RASTERS = [
     (lambda: look_alike(slots=True, this=renderlib.T_RasterInfo().this), False),
     (lambda: look_alike(this=renderlib.T_RasterInfo()), False),
 ]
-WRONG_INSTANCES = [
-    renderlib.T_RasterInfo,
-    lambda: instances[0][0].effect_genotype,
-    lambda: 3,
-    lambda: "T_Blur",
-    lambda: renderlib.T_RasterInfo().this,
-]
-WRONG_IMAGES = [
-    lambda: bytes(8),
-    lambda: readonly_array(4),
-    lambda: memoryview(b"abc"),
-    released_view,
-    lambda: numpy.zeros((4, 4), numpy.uint8)[:, ::2],
-    lambda: "pixels",
-    lambda: 8,
-    renderlib.T_RasterInfo,
-]
+WRONG_INSTANCES = [renderlib.T_RasterInfo, lambda: instances[0][0].effect_genotype, 3, "T_Blur", bare_pointer]
+# Items of the images list that are refused: read-only, without a view, not a buffer.
+WRONG_IMAGES = [lambda: bytes(8), lambda: readonly_array(4), lambda: memoryview(b"abc")]
+WRONG_IMAGES += [released_view, lambda: numpy.zeros((4, 4), numpy.uint8)[:, ::2], "pixels", 8, renderlib.T_RasterInfo]
 
 
 def writable_buffer(r, size):  # writable, contiguous, exactly `size` bytes
@@ -160,10 +158,10 @@ def list_argument(r, kind, wrong):
         choice = r.int_in(0, 15 if kind == "rasters" else 11) if wrong else r.int_in(0, 9 if kind == "rasters" else 7)
         refusal = False
         if kind == "rasters" and choice >= 10:
-            make, refusal = r.pick(WRONG_RASTERS)
-            items.append(make())
+            item, refusal = r.pick(WRONG_RASTERS)
+            items.append(made(item))
         elif kind == "images" and choice >= 8:
-            items.append(r.pick(WRONG_IMAGES)())
+            items.append(made(r.pick(WRONG_IMAGES)))
             refusal = True
         elif choice < (8 if kind == "rasters" else 6):
             items.append(renderlib.T_RasterInfo() if kind == "rasters" else writable_buffer(r, r.int_in(0, 64)))
@@ -207,7 +205,7 @@ def conversion_case(r):
         error = None
         if kind == "instance":
             if wrong:
-                value, error = r.pick(WRONG_INSTANCES)(), TypeError
+                value, error = made(r.pick(WRONG_INSTANCES)), TypeError
             else:
                 value = chosen_instance = r.pick([None, dead_instance] + [i for i, _ in instances] * 3)
         elif kind == "dest":
@@ -219,7 +217,7 @@ def conversion_case(r):
                     [lambda: bytes(r.int_in(0, 32)), lambda: memoryview(b"pixels"), lambda: readonly_array(8)]
                 )()
             else:
-                value, error = (r.pick(NOT_BUFFERS) if choice == 9 else UNVIEWABLE[choice - 6])(), TypeError
+                value, error = made(r.pick(NOT_BUFFERS) if choice == 9 else UNVIEWABLE[choice - 6]), TypeError
         elif kind in ("rasters", "images"):
             value, lengths[kind], error = list_argument(r, kind, wrong)
         elif kind == "text" and position == 2 and not wrong:

@@ -88,16 +88,12 @@ def renderer(local):
         counts["wrong pixels"] += done[0] and done[1] != expected[slot][frame]
 
 
+def draw():
+    return _renderlib.tarsel_widget_draw(widget[0], "", 480, 270, 0.0, 0.0, 0.25, 0.25, [1920, 1080, 0]) or True
+
+
 def drawer(local):
-    if (
-        attempt(
-            lambda: (
-                _renderlib.tarsel_widget_draw(widget[0], "", 480, 270, 0.0, 0.0, 0.25, 0.25, [1920, 1080, 0]) or True
-            ),
-            "draws",
-        )
-        is None
-    ):
+    if attempt(draw, "draws") is None:
         time.sleep(0.001)  # until the remaker puts a new instance in place, or the abort is cleared
 
 
@@ -158,10 +154,8 @@ def worker(step, seed):
     return threading.Thread(target=run, daemon=True)
 
 
-threads = [
-    worker(step, SEED * 10 + i)
-    for i, step in enumerate([renderer] * 3 + [drawer, remaker, swapper, aborter, messenger])
-]
+steps = [renderer] * 3 + [drawer, remaker, swapper, aborter, messenger]
+threads = [worker(step, SEED * 10 + i) for i, step in enumerate(steps)]
 for thread in threads:
     thread.start()
 if not STEADY:
@@ -183,15 +177,6 @@ for instance in slots + widget:
         _renderlib.free_tarsel_effect(instance)
 installed.clear()
 gc.collect()
-print(
-    json.dumps(
-        dict(
-            counts,
-            faults=faults,
-            hung=[thread.name for thread in threads if thread.is_alive()],
-            instances_left=probe.live_instances() - instances_before,
-            rss_growth_kib=resident_kib() - rss_warm,
-        )
-    ),
-    flush=True,
-)
+counts.update(instances_left=probe.live_instances() - instances_before, rss_growth_kib=resident_kib() - rss_warm)
+hung = [thread.name for thread in threads if thread.is_alive()]
+print(json.dumps(dict(counts, faults=faults, hung=hung)), flush=True)

@@ -67,10 +67,8 @@ for sequence in range(10 ** 9):
 
 def dead(process):
     """Whether the process has died, reaped or not (waitid leaves a zombie as it is)."""
-    return (
-        process.returncode is not None
-        or os.waitid(os.P_PID, process.pid, os.WEXITED | os.WNOHANG | os.WNOWAIT) is not None
-    )
+    peek = os.WEXITED | os.WNOHANG | os.WNOWAIT
+    return process.returncode is not None or os.waitid(os.P_PID, process.pid, peek) is not None
 
 
 def resources():

@@ -154,19 +154,14 @@ def list_argument(r, kind, wrong):
     """A list for the rasters or images position: (value, the length of the
     list the call sees, None or the exception class)."""
     items, refused = [], []
+    good, last = (8, 15) if kind == "rasters" else (6, 11)  # choices: good items, two Nones, wrong items
     for _ in range(r.int_in(0, 4)):
-        choice = r.int_in(0, 15 if kind == "rasters" else 11) if wrong else r.int_in(0, 9 if kind == "rasters" else 7)
-        refusal = False
-        if kind == "rasters" and choice >= 10:
-            item, refusal = r.pick(WRONG_RASTERS)
-            items.append(made(item))
-        elif kind == "images" and choice >= 8:
-            items.append(made(r.pick(WRONG_IMAGES)))
-            refusal = True
-        elif choice < (8 if kind == "rasters" else 6):
-            items.append(renderlib.T_RasterInfo() if kind == "rasters" else writable_buffer(r, r.int_in(0, 64)))
-        else:
-            items.append(None)
+        choice, item, refusal = r.int_in(0, last if wrong else good + 1), None, False
+        if choice >= good + 2:
+            item, refusal = r.pick(WRONG_RASTERS) if kind == "rasters" else (r.pick(WRONG_IMAGES), True)
+        elif choice < good:
+            item = renderlib.T_RasterInfo if kind == "rasters" else writable_buffer(r, r.int_in(0, 64))
+        items.append(made(item))
         refused.append(refusal)
     if kind == "rasters" and wrong:
         if items and r.one_in(3):

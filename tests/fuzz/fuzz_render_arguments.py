@@ -156,7 +156,8 @@ def list_argument(r, kind, wrong):
     items, refused = [], []
     good, last = (8, 15) if kind == "rasters" else (6, 11)  # choices: good items, two Nones, wrong items
     for _ in range(r.int_in(0, 4)):
-        choice, item, refusal = r.int_in(0, last if wrong else good + 1), None, False
+        choice = r.int_in(0, last if wrong else good + 1)
+        item, refusal = None, False
         if choice >= good + 2:
             item, refusal = r.pick(WRONG_RASTERS) if kind == "rasters" else (r.pick(WRONG_IMAGES), True)
         elif choice < good:
@@ -318,7 +319,9 @@ def render_case(r):
     downsample, quality = mostly(r, [1, 1, 2, 4, 0], [-1, 3]), r.int_in(-1, 3)
     mix = mostly(r, [1.0, 0.0, 0.5, 2.0, -1.0], [math.nan, math.inf])
     aspect = mostly(r, [1.0, 0.0, 2.0, 0.5], [-1.0, math.nan, math.inf])
-    threads, seed, rate = r.int_in(0, 2), r.int32(), mostly(r, [25, 0, 1, 30, 1000], [-5])
+    threads = r.int_in(0, 2)
+    seed = r.int32()
+    rate = mostly(r, [25, 0, 1, 30, 1000], [-5])
     args = [instance, descriptor, dest, frame, field, downsample, quality, rasters, images_arg, mix, n_rasters]
     args += [aspect, threads, seed, flags, rate, r.flag()] + spaces
     try:

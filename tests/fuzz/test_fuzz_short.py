@@ -52,9 +52,10 @@ def test_python_target(target, shared_registry):
 
 
 def test_segment(tmp_path):
-    binary, src = tmp_path / "fuzz_segment", REPO / "reference-engine" / "src"
+    src = REPO / "reference-engine" / "src"
     flags = "-std=c++17 -O1 -g -fsanitize=address,undefined -fno-sanitize-recover=undefined".split()
     sources = [FUZZ / "fuzz_segment.cpp", FUZZ / "replay_main.cpp", src / "ipc" / "segment.cpp"]
+    binary = tmp_path / "fuzz_segment"
     run([os.environ.get("CXX", "g++"), *flags, "-I", src, *sources, "-o", binary])
     stream = tmp_path / "inputs"  # kept to replay a failure: fuzz_segment < inputs
     replayed = list(inputs(corpus("segment"), 20000, SEED, 4200))

@@ -51,8 +51,7 @@ for sequence in range(10 ** 9):
             transport.reserve_pybuf(len(body), "open")[:] = body
         os.kill(os.getpid(), signal.SIGKILL)
     if sequence % 2:
-        view = transport.reserve_pybuf(len(body), "reserved")
-        view[:] = body
+        transport.reserve_pybuf(len(body), "reserved")[:] = body
         sent = transport.commit()
     else:
         sent = transport.write_pybuf(body, "written")

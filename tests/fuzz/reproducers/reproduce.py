@@ -1,14 +1,11 @@
-"""Faults the fuzz targets found that their short runs do not reach again,
-one call each (the others, None or a negative length given to the base64
-decoder, a rasters list cleared by an item while it converts, an object
-whose `this` is itself and n_rasters past the lists, are among the inputs of
-every short run):
+"""Faults the fuzz targets found that their short runs do not reach again
+(the others are among their inputs), one call each, which exits 0 only if
+the call now ends as it should:
 
     python tests/fuzz/reproducers/reproduce.py CASE
 
-Each case exits 0 only if the call now ends as it should. Before the fixes
-they read or wrote memory they must not without always crashing: the suite
-runs them under tools/sanitize.sh too, where such an access is reported."""
+Before the fixes they read or wrote memory they must not without always
+crashing: the suite runs them under tools/sanitize.sh too, which reports it."""
 
 import sys
 

@@ -93,14 +93,11 @@ def made(item):
 # raised), and objects that have none.
 UNVIEWABLE = [lambda: numpy.zeros((4, 4), numpy.float32)[:, ::2], lambda: memoryview(bytearray(16))[::2], released_view]
 NOT_BUFFERS = ["pixels", 16, None, lambda: [bytearray(4)], renderlib.T_RasterInfo]
-# Items of the rasters list other than a record or None: (item, refused).
-WRONG_RASTERS = [
-    (renderlib.T_RenderInfo, True),
-    (7, True),
-    ("raster", True),
-    (lambda: bytearray(104), True),
-    (NamedRaster, True),
-    (bare_pointer, True),
+# Items of the rasters list other than a record or None, (item, refused):
+# objects that are not records, then look-alikes of one, refused unless their
+# `this` is a record's.
+NOT_RECORDS = [renderlib.T_RenderInfo, 7, "raster", lambda: bytearray(104), NamedRaster, bare_pointer]
+WRONG_RASTERS = [(item, True) for item in NOT_RECORDS] + [
     (look_alike, True),
     (lambda: look_alike(this=5), True),
     (lambda: look_alike(slots=True, raising=True), True),

@@ -60,8 +60,7 @@ class ByteReader:
 
 def inputs(paths, count, seed, max_len):
     """Every file under `paths`, then `count` inputs of a seeded generator:
-    random bytes, or a file changed a little (bytes set, inserted or deleted,
-    a bit flipped, another file's tail spliced on)."""
+    random bytes, or a file changed a little."""
     corpus = [
         file.read_bytes()
         for path in map(pathlib.Path, paths)

@@ -21,7 +21,7 @@ def test_peers_dying_at_random_lose_no_committed_message():
     counts = json.loads(done.stdout.strip().splitlines()[-1])
     print("\nhostile peers:", json.dumps(counts))
     assert counts["faults"] == [] and counts["lost"] == counts["out of order"] == counts["changed"] == 0, counts
-    assert counts["deaths"] == counts["peers"] > 3 and counts["left as zombies"] > 0, counts
+    assert counts["peers"] > 3 and counts["left as zombies"] > 0, counts
     assert counts["files_growth"] <= 0 and counts["mappings_growth"] <= 0, counts
     assert UNDER_ADDRESS_SANITIZER or counts["rss_growth_kib"] < 4096, counts
     assert not pathlib.Path("/dev/shm/tarsel-ipc." + name).exists()

@@ -141,20 +141,17 @@ def messenger(local):
     counts["messages sent"] += probe.emit_from_worker(10, _renderlib.Err_Info, "hostile")
 
 
-def worker(step, seed):
-    def run():
-        local = random.Random(seed)
-        try:
-            while not stop.is_set():
-                step(local)
-        except BaseException as error:  # noqa: B902 - anything that escapes is a fault
-            faults.append("%s: %r" % (step.__name__, error))
-
-    return threading.Thread(target=run, daemon=True)
+def work(step, seed):  # a worker thread's body
+    local = random.Random(seed)
+    try:
+        while not stop.is_set():
+            step(local)
+    except BaseException as error:  # noqa: B902 - anything that escapes is a fault
+        faults.append("%s: %r" % (step.__name__, error))
 
 
 steps = [renderer] * 3 + [drawer, remaker, swapper, aborter, messenger]
-threads = [worker(step, SEED * 10 + i) for i, step in enumerate(steps)]
+threads = [threading.Thread(target=work, args=(step, SEED * 10 + i), daemon=True) for i, step in enumerate(steps)]
 for thread in threads:
     thread.start()
 if not STEADY:

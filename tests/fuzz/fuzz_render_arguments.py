@@ -69,9 +69,7 @@ def released_view():
 
 
 def readonly_array(size):
-    a = numpy.zeros(size, numpy.uint8)
-    a.flags.writeable = False
-    return a
+    return numpy.frombuffer(bytes(size), numpy.uint8)
 
 
 BUFFER_KINDS = [
@@ -89,6 +87,7 @@ def made(item):
     return item() if callable(item) else item
 
 
+READ_ONLY = [lambda r: bytes(r.int_in(0, 32)), lambda r: memoryview(b"pixels"), lambda r: readonly_array(8)]
 # Destinations whose buffer cannot be had (TypeError, whatever the exporter
 # raised), and objects that have none.
 UNVIEWABLE = [lambda: numpy.zeros((4, 4), numpy.float32)[:, ::2], lambda: memoryview(bytearray(16))[::2], released_view]
@@ -206,9 +205,7 @@ def conversion_case(r):
             if choice < 5:
                 value = writable_buffer(r, r.int_in(0, 64))
             elif choice == 5:  # read-only is taken
-                value = r.pick(
-                    [lambda: bytes(r.int_in(0, 32)), lambda: memoryview(b"pixels"), lambda: readonly_array(8)]
-                )()
+                value = r.pick(READ_ONLY)(r)
             else:
                 value, error = made(r.pick(NOT_BUFFERS) if choice == 9 else UNVIEWABLE[choice - 6]), TypeError
         elif kind in ("rasters", "images"):

@@ -16,9 +16,8 @@ from renderlib.rendering import EffectRenderer, card_frame
 
 
 def run(capsys, *argv):
-    status = main(list(argv))
-    out, err = capsys.readouterr()
-    return status, out, err
+    """(exit status, standard output, standard error) of the command."""
+    return (main(list(argv)), *capsys.readouterr())
 
 
 def render_centred(capsys, size, source, out, *options):

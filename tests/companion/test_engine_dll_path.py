@@ -26,9 +26,7 @@ def test_the_engine_folders_known_to_the_loader(monkeypatch, tmp_path, platform,
         (tmp_path / folder).mkdir(parents=True, exist_ok=True)
     calls = []
     monkeypatch.setattr(sys, "platform", platform)
-    monkeypatch.setattr(
-        os, "add_dll_directory", lambda folder: calls.append(folder) or ("handle", folder), raising=False
-    )
+    monkeypatch.setattr(os, "add_dll_directory", lambda path: calls.append(path) or ("handle", path), raising=False)
     monkeypatch.setenv("RENDERLIB_ENGINE_DIR", str(tmp_path / "engine"))
     namespace = {"__file__": str(tmp_path / "renderlib" / "__init__.py")}
     exec(compile(PRELUDE, renderlib.__file__, "exec"), namespace)  # the package's prelude, installed there

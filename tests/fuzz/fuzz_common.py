@@ -60,8 +60,7 @@ class ByteReader:
 
 def inputs(paths, count, seed, max_len):
     """Every file under `paths`, then `count` inputs of a seeded generator:
-    random bytes, or a file changed a little (bytes set, inserted or deleted,
-    a bit flipped, another file's tail spliced on)."""
+    random bytes, or a file changed a little."""
     corpus = [
         file.read_bytes()
         for path in map(pathlib.Path, paths)
@@ -124,18 +123,15 @@ def main(test_one_input, max_len, default_inputs=2000):
     atheris.Fuzz()
 
 
-def byte_address_module(folder=None):
+def byte_address_module():
     """tests/shared_registry.i, whose byte_address(buffer, offset) gives base64decode's
-    uchar_t pointer, built into `folder`, $RENDERLIB_FUZZ_HELPERS or build-fuzz/helpers/."""
+    uchar_t pointer, built into $RENDERLIB_FUZZ_HELPERS or build-fuzz/helpers/."""
     import importlib
     import sysconfig
     from native_build import REPO, build_swig_module
 
-    folder = pathlib.Path(
-        folder
-        or os.environ.get("RENDERLIB_FUZZ_HELPERS")
-        or REPO / "build-fuzz" / "helpers" / sysconfig.get_config_var("SOABI")
-    )
+    default = REPO / "build-fuzz" / "helpers" / sysconfig.get_config_var("SOABI")
+    folder = pathlib.Path(os.environ.get("RENDERLIB_FUZZ_HELPERS") or default)
     if not (folder / ("_shared_registry" + sysconfig.get_config_var("EXT_SUFFIX"))).exists():
         folder.mkdir(parents=True, exist_ok=True)
         build_swig_module(TESTS_DIR / "shared_registry.i", folder, [REPO / "engine-api"])

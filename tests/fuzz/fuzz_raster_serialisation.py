@@ -89,15 +89,18 @@ def text_argument(r):
         return text, None
 
 
+def first(*rules):
+    """The refusal of the first (condition, refusal) rule that holds, else None."""
+    return next((refusal for holds, refusal in rules if holds), None)
+
+
 def check(call, args, refusal):
     """`refusal`: None for a call that must go through, else (exception, argument number)."""
     try:
         result = call(*args)
     except (TypeError, ValueError, OverflowError) as error:
-        assert refusal and isinstance(error, refusal[0]) and re.search(r"argument %d\b" % refusal[1], str(error)), (
-            refusal,
-            error,
-        )
+        named = refusal and re.search(r"argument %d\b" % refusal[1], str(error))
+        assert named and isinstance(error, refusal[0]), (refusal, error)
         return None
     assert refusal is None, ("taken", refusal, args)
     return result
@@ -117,16 +120,11 @@ class Case:
     def from_base64(self):
         (info, kind), (text, raw) = self.record_argument(), text_argument(self.r)
         # Conversions first, in argument order, then the null checks.
-        refusal = (
-            (TypeError, 1)
-            if kind == "wrong"
-            else (TypeError, 2)
-            if raw is None and text is not None
-            else (ValueError, 1)
-            if info is None
-            else (ValueError, 2)
-            if text is None
-            else None
+        refusal = first(
+            (kind == "wrong", (TypeError, 1)),
+            (raw is None and text is not None, (TypeError, 2)),
+            (info is None, (ValueError, 1)),
+            (text is None, (ValueError, 2)),
         )
         check(_renderlib.make_tarsel_raster_info_from_base64, (info, text), refusal)
         if refusal is None:
@@ -138,16 +136,11 @@ class Case:
     def from_bits(self):
         (info, kind), (text, raw) = self.record_argument(), text_argument(self.r)
         short = text is None or (raw is not None and len(raw) < IMAGE)
-        refusal = (
-            (TypeError, 1)
-            if kind == "wrong"
-            else (ValueError, 2)
-            if short
-            else (TypeError, 2)
-            if raw is None
-            else (ValueError, 1)
-            if info is None
-            else None
+        refusal = first(
+            (kind == "wrong", (TypeError, 1)),
+            (short, (ValueError, 2)),
+            (raw is None, (TypeError, 2)),
+            (info is None, (ValueError, 1)),
         )
         check(_renderlib.make_tarsel_raster_info_from_bits, (info, text), refusal)
         if refusal is None:
@@ -155,11 +148,8 @@ class Case:
 
     def to_bytearray(self):
         info, kind = self.record_argument()
-        image = check(
-            _renderlib.raster_info_to_bytearray,
-            (info,),
-            None if kind == "ok" else (TypeError if kind == "wrong" else ValueError, 1),
-        )
+        refusal = None if kind == "ok" else (TypeError if kind == "wrong" else ValueError, 1)
+        image = check(_renderlib.raster_info_to_bytearray, (info,), refusal)
         assert kind != "ok" or (type(image) is bytearray and image == self.shadow), image
 
     def decode(self):
@@ -170,31 +160,25 @@ class Case:
         length = max(length, least) if length else 0
         buffer = bytearray(b"\xa5" * (before + length + GUARD))
         dest, bad = helpers.byte_address(buffer, before), r.int_in(0, 15)
+        given = length  # or a length of another type or out of range
         if bad == 0:
             dest = r.pick([buffer, 3, "dest", renderlib.T_RasterInfo()])
         elif bad == 1:
-            length = r.pick([1.0, 2**31, -(2**31) - 1, "4", None])
+            given = r.pick([1.0, 2**31, -(2**31) - 1, "4", None])
         elif bad == 2:
             dest = None
         elif bad == 3:
-            length = r.int_in(-(2**31), -1)
+            length = given = r.int_in(-(2**31), -1)
         expected = bytearray(buffer)
-        refusal = (
-            (TypeError, 1)
-            if raw is None and text is not None
-            else (TypeError, 2)
-            if bad == 0
-            else ((TypeError, OverflowError), 3)
-            if bad == 1
-            else (ValueError, 3)
-            if length < 0
-            else (ValueError, 1)
-            if length > 0 and text is None
-            else (ValueError, 2)
-            if length > 0 and dest is None
-            else None
+        refusal = first(
+            (raw is None and text is not None, (TypeError, 1)),
+            (bad == 0, (TypeError, 2)),
+            (bad == 1, ((TypeError, OverflowError), 3)),
+            (length < 0, (ValueError, 3)),
+            (length > 0 and text is None, (ValueError, 1)),
+            (length > 0 and dest is None, (ValueError, 2)),
         )
-        check(_renderlib.base64decode, (text, dest, length), refusal)
+        check(_renderlib.base64decode, (text, dest, given), refusal)
         if refusal is None and text is not None and dest is not None:
             assert decode_into(raw, expected, before, length)
             assert expected[before + length :] == b"\xa5" * GUARD  # the length given was enough

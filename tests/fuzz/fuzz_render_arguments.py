@@ -29,28 +29,7 @@ ALLOWED = (TypeError, ValueError, OverflowError, BufferError)
 FLT_MAX = 3.4028234663852886e38
 PIXEL_TYPES = [1, 2, 3, 4, 5, 6, 7, 8, 9, 10, 11, 12, 13, 14, 15, 17, 18, 19, 20, 21, 22, 23, 24, 25, 26, 28]
 # Kinds of the twenty positions, in order.
-KINDS = [
-    "instance",
-    "text",
-    "dest",
-    "int",
-    "int",
-    "int",
-    "int",
-    "rasters",
-    "images",
-    "float",
-    "int",
-    "float",
-    "int",
-    "int",
-    "int",
-    "int",
-    "bool",
-    "text",
-    "text",
-    "text",
-]
+KINDS = "instance text dest int int int int rasters images float int float int int int int bool text text text".split()
 instances = []  # (instance, descriptor names)
 dead_instance = None
 
@@ -79,6 +58,10 @@ def look_alike(this=None, slots=False, raising=False, on_this=None):
     return type("T_RasterInfo", (), {"__slots__": (), "this": property(get_this)})()
 
 
+def bare_pointer():  # the pointer object of a record
+    return renderlib.T_RasterInfo().this
+
+
 def released_view():
     view = memoryview(bytearray(8))
     view.release()
@@ -86,9 +69,7 @@ def released_view():
 
 
 def readonly_array(size):
-    a = numpy.zeros(size, numpy.uint8)
-    a.flags.writeable = False
-    return a
+    return numpy.frombuffer(bytes(size), numpy.uint8)
 
 
 BUFFER_KINDS = [
@@ -99,25 +80,23 @@ BUFFER_KINDS = [
     lambda n: memoryview(bytearray(n)),
     lambda n: numpy.zeros(n // 4, numpy.float32) if n % 4 == 0 else bytearray(n),
 ]
-# Arguments whose buffer cannot be had: TypeError, whatever the object raised.
-NOT_BUFFERS = [
-    lambda: numpy.zeros((4, 4), numpy.float32)[:, ::2],
-    lambda: memoryview(bytearray(16))[::2],
-    released_view,
-    lambda: "pixels",
-    lambda: 16,
-    lambda: None,
-    lambda: [bytearray(4)],
-    renderlib.T_RasterInfo,
-]
-# Items of the rasters list other than a record or None: (maker, refused).
-WRONG_RASTERS = [
-    (renderlib.T_RenderInfo, True),
-    (lambda: 7, True),
-    (lambda: "raster", True),
-    (lambda: bytearray(104), True),
-    (NamedRaster, True),
-    (lambda: renderlib.T_RasterInfo().this, True),
+
+
+def made(item):
+    """The tables below hold constants, and makers of the objects made anew for each call."""
+    return item() if callable(item) else item
+
+
+READ_ONLY = [lambda r: bytes(r.int_in(0, 32)), lambda r: memoryview(b"pixels"), lambda r: readonly_array(8)]
+# Destinations whose buffer cannot be had (TypeError, whatever the exporter
+# raised), and objects that have none.
+UNVIEWABLE = [lambda: numpy.zeros((4, 4), numpy.float32)[:, ::2], lambda: memoryview(bytearray(16))[::2], released_view]
+NOT_BUFFERS = ["pixels", 16, None, lambda: [bytearray(4)], renderlib.T_RasterInfo]
+# Items of the rasters list other than a record or None, (item, refused):
+# objects that are not records, then look-alikes of one, refused unless their
+# `this` is a record's.
+NOT_RECORDS = [renderlib.T_RenderInfo, 7, "raster", lambda: bytearray(104), NamedRaster, bare_pointer]
+WRONG_RASTERS = [(item, True) for item in NOT_RECORDS] + [
     (look_alike, True),
     (lambda: look_alike(this=5), True),
     (lambda: look_alike(slots=True, raising=True), True),
@@ -126,72 +105,32 @@ WRONG_RASTERS = [
     (lambda: look_alike(slots=True, this=renderlib.T_RasterInfo().this), False),
     (lambda: look_alike(this=renderlib.T_RasterInfo()), False),
 ]
-WRONG_IMAGES = [
-    lambda: bytes(8),
-    lambda: readonly_array(4),
-    lambda: memoryview(b"abc"),
-    released_view,
-    lambda: numpy.zeros((4, 4), numpy.uint8)[:, ::2],
-    lambda: "pixels",
-    lambda: 8,
-    renderlib.T_RasterInfo,
-]
+WRONG_INSTANCES = [renderlib.T_RasterInfo, lambda: instances[0][0].effect_genotype, 3, "T_Blur", bare_pointer]
+# Items of the images list that are refused: read-only, without a view, not a buffer.
+WRONG_IMAGES = [lambda: bytes(8), lambda: readonly_array(4), lambda: memoryview(b"abc")]
+WRONG_IMAGES += [released_view, lambda: numpy.zeros((4, 4), numpy.uint8)[:, ::2], "pixels", 8, renderlib.T_RasterInfo]
 
 
 def writable_buffer(r, size):  # writable, contiguous, exactly `size` bytes
     return BUFFER_KINDS[r.int_in(0, 5)](size)
 
 
+# Values for the scalar positions: in range, at and past the limits of an int
+# or a float, and of other types (more of these below, made for each call).
+INTS = [0, 1, -1, 2**31 - 1, -(2**31), 2**31, -(2**31) - 1, 2**63, 2**64 + 5, True]
+FLOATS = [0.0, 1.0, -1.0, math.nan, math.inf, -math.inf, 3.5e38, -1e300, FLT_MAX, 1, 2**127, 2**128, 10**400]
+TEXTS = ["", "linear", "srgb", None, "Blur", "\0", "x" * 300, "\u00e9t\u00e9", "\udc80"]
+
+
 def wrong_scalar(r, kind):
     """A value for an int, float, bool or text position, right or wrong:
     (value, None when it converts, else the exception class)."""
     if kind == "int":
-        value = r.pick(
-            [
-                0,
-                1,
-                -1,
-                2**31 - 1,
-                -(2**31),
-                2**31,
-                -(2**31) - 1,
-                2**63,
-                2**64 + 5,
-                True,
-                IntSubclass(7),
-                r.int32(),
-                1.0,
-                "1",
-                None,
-                b"\x01",
-            ]
-        )
+        value = r.pick(INTS + [IntSubclass(7), r.int32(), 1.0, "1", None, b"\x01"])
         in_range = isinstance(value, int) and -(2**31) <= value < 2**31
         return value, None if in_range else OverflowError if isinstance(value, int) else TypeError
     if kind == "float":
-        value = r.pick(
-            [
-                0.0,
-                1.0,
-                -1.0,
-                math.nan,
-                math.inf,
-                -math.inf,
-                3.5e38,
-                -1e300,
-                FLT_MAX,
-                1,
-                2**127,
-                2**128,
-                10**400,
-                FloatSubclass(0.5),
-                r.float32(),
-                True,
-                "1.0",
-                None,
-                1j,
-            ]
-        )
+        value = r.pick(FLOATS + [FloatSubclass(0.5), r.float32(), True, "1.0", None, 1j])
         try:
             as_double = float(value) if isinstance(value, (int, float)) else None
         except OverflowError:
@@ -202,23 +141,7 @@ def wrong_scalar(r, kind):
     if kind == "bool":
         value = r.pick([True, False, 1, 0, None, "true", 1.0])
         return value, None if isinstance(value, bool) else TypeError
-    value = r.pick(
-        [
-            "",
-            "linear",
-            "srgb",
-            None,
-            "Blur",
-            "\0",
-            "x" * 300,
-            "\u00e9t\u00e9",
-            "\udc80",
-            TextSubclass("srgb"),
-            b"linear",
-            3,
-            renderlib.T_RasterInfo,
-        ]
-    )
+    value = r.pick(TEXTS + [TextSubclass("srgb"), b"linear", 3, renderlib.T_RasterInfo])
     value = value() if value is renderlib.T_RasterInfo else value
     return value, None if value is None or (isinstance(value, str) and value != "\udc80") else TypeError
 
@@ -227,19 +150,15 @@ def list_argument(r, kind, wrong):
     """A list for the rasters or images position: (value, the length of the
     list the call sees, None or the exception class)."""
     items, refused = [], []
+    good, last = (8, 15) if kind == "rasters" else (6, 11)  # choices: good items, two Nones, wrong items
     for _ in range(r.int_in(0, 4)):
-        choice = r.int_in(0, 15 if kind == "rasters" else 11) if wrong else r.int_in(0, 9 if kind == "rasters" else 7)
-        refusal = False
-        if kind == "rasters" and choice >= 10:
-            make, refusal = r.pick(WRONG_RASTERS)
-            items.append(make())
-        elif kind == "images" and choice >= 8:
-            items.append(r.pick(WRONG_IMAGES)())
-            refusal = True
-        elif choice < (8 if kind == "rasters" else 6):
-            items.append(renderlib.T_RasterInfo() if kind == "rasters" else writable_buffer(r, r.int_in(0, 64)))
-        else:
-            items.append(None)
+        choice = r.int_in(0, last if wrong else good + 1)
+        item, refusal = None, False
+        if choice >= good + 2:
+            item, refusal = r.pick(WRONG_RASTERS) if kind == "rasters" else (r.pick(WRONG_IMAGES), True)
+        elif choice < good:
+            item = renderlib.T_RasterInfo if kind == "rasters" else writable_buffer(r, r.int_in(0, 64))
+        items.append(made(item))
         refused.append(refusal)
     if kind == "rasters" and wrong:
         if items and r.one_in(3):
@@ -278,18 +197,7 @@ def conversion_case(r):
         error = None
         if kind == "instance":
             if wrong:
-                value, error = (
-                    r.pick(
-                        [
-                            renderlib.T_RasterInfo,
-                            lambda: instances[0][0].effect_genotype,
-                            lambda: 3,
-                            lambda: "T_Blur",
-                            lambda: renderlib.T_RasterInfo().this,
-                        ]
-                    )(),
-                    TypeError,
-                )
+                value, error = made(r.pick(WRONG_INSTANCES)), TypeError
             else:
                 value = chosen_instance = r.pick([None, dead_instance] + [i for i, _ in instances] * 3)
         elif kind == "dest":
@@ -297,11 +205,9 @@ def conversion_case(r):
             if choice < 5:
                 value = writable_buffer(r, r.int_in(0, 64))
             elif choice == 5:  # read-only is taken
-                value = r.pick(
-                    [lambda: bytes(r.int_in(0, 32)), lambda: memoryview(b"pixels"), lambda: readonly_array(8)]
-                )()
+                value = r.pick(READ_ONLY)(r)
             else:
-                value, error = (r.pick(NOT_BUFFERS[3:]) if choice == 9 else NOT_BUFFERS[choice - 6])(), TypeError
+                value, error = made(r.pick(NOT_BUFFERS) if choice == 9 else UNVIEWABLE[choice - 6]), TypeError
         elif kind in ("rasters", "images"):
             value, lengths[kind], error = list_argument(r, kind, wrong)
         elif kind == "text" and position == 2 and not wrong:
@@ -325,12 +231,8 @@ def conversion_case(r):
     except ALLOWED as raised:
         result, error = None, raised
     # Checked once every argument has converted, in argument order.
-    errors += [
-        ValueError if chosen_instance is dead_instance else None,
-        ValueError
-        if isinstance(n_rasters, int) and n_rasters > 0 and any(0 < lengths[kind] < n_rasters for kind in lengths)
-        else None,
-    ]
+    past_lists = isinstance(n_rasters, int) and n_rasters > 0 and any(0 < n < n_rasters for n in lengths.values())
+    errors += [ValueError if chosen_instance is dead_instance else None, ValueError if past_lists else None]
     first = next(((p, e) for p, e in zip(list(range(1, 21)) + [1, 11], errors) if e is not None), None)
     if first is None:
         assert error is None, error
@@ -408,25 +310,14 @@ def render_case(r):
     before_dest = bytes(memoryview(dest).cast("B"))
     before_inputs = [bytes(memoryview(b).cast("B")) for b in inputs]
     spaces = [mostly(r, ["linear", "srgb", "", None], [bad]) for bad in ("cmyk", "rgb", "\u00e9")]
-    args = [
-        instance,
-        descriptor,
-        dest,
-        frame,
-        field,
-        mostly(r, [1, 1, 2, 4, 0], [-1, 3]),
-        r.int_in(-1, 3),
-        rasters,
-        images_arg,
-        mostly(r, [1.0, 0.0, 0.5, 2.0, -1.0], [math.nan, math.inf]),
-        n_rasters,
-        mostly(r, [1.0, 0.0, 2.0, 0.5], [-1.0, math.nan, math.inf]),
-        r.int_in(0, 2),
-        r.int32(),
-        flags,
-        mostly(r, [25, 0, 1, 30, 1000], [-5]),
-        r.flag(),
-    ] + spaces
+    downsample, quality = mostly(r, [1, 1, 2, 4, 0], [-1, 3]), r.int_in(-1, 3)
+    mix = mostly(r, [1.0, 0.0, 0.5, 2.0, -1.0], [math.nan, math.inf])
+    aspect = mostly(r, [1.0, 0.0, 2.0, 0.5], [-1.0, math.nan, math.inf])
+    threads = r.int_in(0, 2)
+    seed = r.int32()
+    rate = mostly(r, [25, 0, 1, 30, 1000], [-5])
+    args = [instance, descriptor, dest, frame, field, downsample, quality, rasters, images_arg, mix, n_rasters]
+    args += [aspect, threads, seed, flags, rate, r.flag()] + spaces
     try:
         result = render(*args)
     except ALLOWED as error:
@@ -439,22 +330,15 @@ def render_case(r):
     reads_dest = any(image is dest for image in images)
     for buffer, before in zip(inputs, before_inputs):
         assert reads_dest or bytes(memoryview(buffer).cast("B")) == before, "an input buffer was written"
-    if (
-        result
-        and field in (1, 2)
-        and not flags & 1
-        and dest_info.ds_ysize > 0
-        and dest_size > 0
-        and dest_info.pixel_type in PIXEL_TYPES
-        and not any(image is dest for image in images[1:])
-    ):
+    # A field render of a supported type and size (a layout's size is 0 for
+    # an unsupported type or an empty frame) leaves the other field alone.
+    if result and field in (1, 2) and not flags & 1 and dest_size > 0 and not reads_dest:
         height, after = dest_info.ds_ysize, bytes(memoryview(dest).cast("B"))
         line = dest_size // height
         for y in range(height):
             stored = (height - 1 - y if dest_info.flip_y_p else y) * line
-            assert (dest_info.y_origin + y) & 1 == field - 1 or after[stored : stored + line] == before_dest[
-                stored : stored + line
-            ], "line %d of the other field was written" % y
+            kept = after[stored : stored + line] == before_dest[stored : stored + line]
+            assert kept or (dest_info.y_origin + y) & 1 == field - 1, "line %d of the other field was written" % y
 
 
 def TestOneInput(data):

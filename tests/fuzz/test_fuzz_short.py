@@ -30,68 +30,41 @@ def check_run(command, expected, env, timeout=120, stdin=None):
         [str(part) for part in command], cwd=FUZZ, env=env, stdin=stdin, capture_output=True, timeout=timeout
     )
     out, err = done.stdout.decode(errors="replace"), done.stderr.decode(errors="replace")
-    assert done.returncode == 0 and expected in out and not SANITIZER_REPORT.search(err), "%s ended with %d\n%s\n%s" % (
-        command[1:],
-        done.returncode,
-        out[-4000:],
-        err[-8000:],
-    )
+    passed = done.returncode == 0 and expected in out and not SANITIZER_REPORT.search(err)
+    assert passed, "%s ended with %d\n%s\n%s" % (command[1:], done.returncode, out[-4000:], err[-8000:])
 
 
-def helpers(shared_registry):
-    """The environment in which a target finds the byte_address module."""
-    return dict(os.environ, RENDERLIB_FUZZ_HELPERS=str(pathlib.Path(shared_registry.__file__).parent))
+# Generated inputs per Python target (tools/fuzz.sh's names: a "-render"
+# target is its script run with --render).
+INPUTS = {"raster_serialisation": 3000, "render_arguments": 3000, "render_arguments-render": 1500}
 
 
-@pytest.mark.parametrize(
-    "script, mode, target, count",
-    [
-        ("fuzz_raster_serialisation.py", [], "raster_serialisation", 3000),
-        ("fuzz_render_arguments.py", [], "render_arguments", 3000),
-        ("fuzz_render_arguments.py", ["--render"], "render_arguments-render", 1500),
-    ],
-    ids=["raster_serialisation", "render_arguments", "render_arguments-render"],
-)
-def test_python_target(script, mode, target, count, shared_registry):
+@pytest.mark.parametrize("target", INPUTS)
+def test_python_target(target, shared_registry):
+    script = "fuzz_%s.py" % target.removesuffix("-render")
+    mode = ["--render"] if target.endswith("-render") else []
     files = sum(1 for folder in corpus(target) for p in folder.rglob("*") if p.is_file())
+    # The target finds the byte_address module where the fixture built it.
+    env = dict(os.environ, RENDERLIB_FUZZ_HELPERS=str(pathlib.Path(shared_registry.__file__).parent))
     # The count is printed only after the last input passed.
-    check_run(
-        [sys.executable, script, "--replay", "--inputs", count, "--seed", SEED] + mode + corpus(target),
-        "replayed %d inputs" % (files + count),
-        helpers(shared_registry),
-    )
+    command = [sys.executable, script, "--replay", "--inputs", INPUTS[target], "--seed", SEED] + mode + corpus(target)
+    check_run(command, "replayed %d inputs" % (files + INPUTS[target]), env)
 
 
 def test_segment(tmp_path):
+    src = REPO / "reference-engine" / "src"
+    flags = "-std=c++17 -O1 -g -fsanitize=address,undefined -fno-sanitize-recover=undefined".split()
+    sources = [FUZZ / "fuzz_segment.cpp", FUZZ / "replay_main.cpp", src / "ipc" / "segment.cpp"]
     binary = tmp_path / "fuzz_segment"
-    run(
-        [
-            os.environ.get("CXX", "g++"),
-            "-std=c++17",
-            "-O1",
-            "-g",
-            "-fsanitize=address,undefined",
-            "-fno-sanitize-recover=undefined",
-            "-I",
-            REPO / "reference-engine" / "src",
-            FUZZ / "fuzz_segment.cpp",
-            FUZZ / "replay_main.cpp",
-            REPO / "reference-engine" / "src" / "ipc" / "segment.cpp",
-            "-o",
-            binary,
-        ]
-    )
+    run([os.environ.get("CXX", "g++"), *flags, "-I", src, *sources, "-o", binary])
     stream = tmp_path / "inputs"  # kept to replay a failure: fuzz_segment < inputs
-    count = 0
-    with open(stream, "wb") as out:
-        for data in inputs(corpus("segment"), 20000, SEED, 4200):
-            out.write(struct.pack("<I", len(data)) + data)
-            count += 1
+    replayed = list(inputs(corpus("segment"), 20000, SEED, 4200))
+    stream.write_bytes(b"".join(struct.pack("<I", len(data)) + data for data in replayed))
     # The binary carries its own sanitizer runtimes.
     env = {k: v for k, v in os.environ.items() if k not in ("LD_PRELOAD", "ASAN_OPTIONS", "UBSAN_OPTIONS")}
     env["UBSAN_OPTIONS"] = "print_stacktrace=1:halt_on_error=1"
-    with open(stream, "rb") as replayed:
-        check_run([binary], "replayed %d inputs" % count, env, stdin=replayed)
+    with open(stream, "rb") as stdin:
+        check_run([binary], "replayed %d inputs" % len(replayed), env, stdin=stdin)
 
 
 @pytest.mark.parametrize("case", ["render_list_replaced", "echo_frame_overflow", "time_blur_frame_overflow"])

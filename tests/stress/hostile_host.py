@@ -26,7 +26,6 @@ from renderlib.widgets import SvgDrawing
 SECONDS, SEED, STEADY = float(sys.argv[1]), int(sys.argv[2]), sys.argv[3:] == ["steady"]
 FRAMES = range(6)
 RENDERED = [("T_Echo", {"echoes": "3"}), ("T_TimeBlur", {"frames_before": "1", "frames_after": "1"})]
-FREED = "no effect instance (freed by free_tarsel_effect)"
 
 probe = EngineProbe()
 probe.keep_call_log(False)
@@ -59,7 +58,7 @@ def attempt(call, what):
             raise
         counts[what + " aborted"] += 1
     except ValueError as error:
-        if not str(error).endswith(FREED):
+        if not str(error).endswith("no effect instance (freed by free_tarsel_effect)"):
             raise
         counts[what + " refused"] += 1
     else:
@@ -88,16 +87,12 @@ def renderer(local):
         counts["wrong pixels"] += done[0] and done[1] != expected[slot][frame]
 
 
+def draw():
+    return _renderlib.tarsel_widget_draw(widget[0], "", 480, 270, 0.0, 0.0, 0.25, 0.25, [1920, 1080, 0]) or True
+
+
 def drawer(local):
-    if (
-        attempt(
-            lambda: (
-                _renderlib.tarsel_widget_draw(widget[0], "", 480, 270, 0.0, 0.0, 0.25, 0.25, [1920, 1080, 0]) or True
-            ),
-            "draws",
-        )
-        is None
-    ):
+    if attempt(draw, "draws") is None:
         time.sleep(0.001)  # until the remaker puts a new instance in place, or the abort is cleared
 
 
@@ -146,22 +141,17 @@ def messenger(local):
     counts["messages sent"] += probe.emit_from_worker(10, _renderlib.Err_Info, "hostile")
 
 
-def worker(step, seed):
-    def run():
-        local = random.Random(seed)
-        try:
-            while not stop.is_set():
-                step(local)
-        except BaseException as error:  # noqa: B902 - anything that escapes is a fault
-            faults.append("%s: %r" % (step.__name__, error))
-
-    return threading.Thread(target=run, daemon=True)
+def work(step, seed):  # a worker thread's body
+    local = random.Random(seed)
+    try:
+        while not stop.is_set():
+            step(local)
+    except BaseException as error:  # noqa: B902 - anything that escapes is a fault
+        faults.append("%s: %r" % (step.__name__, error))
 
 
-threads = [
-    worker(step, SEED * 10 + i)
-    for i, step in enumerate([renderer] * 3 + [drawer, remaker, swapper, aborter, messenger])
-]
+steps = [renderer] * 3 + [drawer, remaker, swapper, aborter, messenger]
+threads = [threading.Thread(target=work, args=(step, SEED * 10 + i), daemon=True) for i, step in enumerate(steps)]
 for thread in threads:
     thread.start()
 if not STEADY:
@@ -183,15 +173,6 @@ for instance in slots + widget:
         _renderlib.free_tarsel_effect(instance)
 installed.clear()
 gc.collect()
-print(
-    json.dumps(
-        dict(
-            counts,
-            faults=faults,
-            hung=[thread.name for thread in threads if thread.is_alive()],
-            instances_left=probe.live_instances() - instances_before,
-            rss_growth_kib=resident_kib() - rss_warm,
-        )
-    ),
-    flush=True,
-)
+counts.update(instances_left=probe.live_instances() - instances_before, rss_growth_kib=resident_kib() - rss_warm)
+hung = [thread.name for thread in threads if thread.is_alive()]
+print(json.dumps(dict(counts, faults=faults, hung=hung)), flush=True)

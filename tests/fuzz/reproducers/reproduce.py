@@ -1,20 +1,22 @@
-"""Faults the fuzz targets found that their short runs do not reach again,
-one call each (the others, None or a negative length given to the base64
-decoder, a rasters list cleared by an item while it converts, an object
-whose `this` is itself and n_rasters past the lists, are among the inputs of
-every short run):
+"""Faults the fuzz targets found that their short runs do not reach again
+(the others are among their inputs), one call each, which exits 0 only if
+the call now ends as it should:
 
     python tests/fuzz/reproducers/reproduce.py CASE
 
-Each case exits 0 only if the call now ends as it should. Before the fixes
-they read or wrote memory they must not without always crashing: the suite
-runs them under tools/sanitize.sh too, where such an access is reported."""
+Before the fixes they read or wrote memory they must not without always
+crashing: the suite runs them under tools/sanitize.sh too, which reports it."""
 
 import sys
 
 import _renderlib
 import renderlib
 from renderlib import effects
+
+
+# The arguments after the lists: mix, n_rasters, pixel aspect, threads, seed,
+# flags, frame rate, premultiplied and the three colour spaces.
+SETTINGS = (1.0, 2, 1.0, 1, 0, 0, 25, False, "linear", "linear", "linear")
 
 
 # An item of the rasters list, a look-alike of a T_RasterInfo, whose `this`
@@ -25,40 +27,11 @@ def render_list_replaced():
     dest, keep = renderlib.T_RasterInfo(), renderlib.T_RasterInfo()
     dest.pixel_type = _renderlib.pixel_rgba8
     pixels = bytearray(_renderlib.make_tarsel_raster_info(dest, 2, 2))
-    rasters = [dest]
-    rasters.append(
-        type(
-            "T_RasterInfo",
-            (),
-            {"__slots__": (), "this": property(lambda self: rasters.__setitem__(0, None) or keep.this)},
-        )()
-    )
+    replacing = property(lambda self: rasters.__setitem__(0, None) or keep.this)
+    rasters = [dest, type("T_RasterInfo", (), {"__slots__": (), "this": replacing})()]
     blur = _renderlib.init_tarsel_effect("T_Blur", False)
-    assert (
-        _renderlib.render_tarsel_effect_to_native_image(
-            blur,
-            "",
-            pixels,
-            0,
-            0,
-            1,
-            1,
-            rasters,
-            [None, bytearray(16)],
-            1.0,
-            2,
-            1.0,
-            1,
-            0,
-            0,
-            25,
-            False,
-            "linear",
-            "linear",
-            "linear",
-        )
-        is False
-    )
+    render = _renderlib.render_tarsel_effect_to_native_image
+    assert render(blur, "", pixels, 0, 0, 1, 1, rasters, [None, bytearray(16)], *SETTINGS) is False
 
 
 # Frame -2**31 (a valid int argument) rendered an echo of frame - 1: signed
@@ -92,10 +65,8 @@ def time_blur_frame_overflow():
     _renderlib.set_load_frame_impl(None)
 
 
-CASES = [render_list_replaced, echo_frame_overflow, time_blur_frame_overflow]
-
 if __name__ == "__main__":
-    cases = {case.__name__: case for case in CASES}
+    cases = {case.__name__: case for case in (render_list_replaced, echo_frame_overflow, time_blur_frame_overflow)}
     if len(sys.argv) != 2 or sys.argv[1] not in cases:
         sys.exit("usage: reproduce.py CASE  (%s)" % ", ".join(cases))
     cases[sys.argv[1]]()

@@ -63,11 +63,8 @@ def shared_registry(tmp_path_factory):
     """A second SWIG module sharing _renderlib's type registry."""
     from native_build import REPO, build_swig_module
 
-    folder = build_swig_module(
-        pathlib.Path(__file__).with_name("shared_registry.i"),
-        tmp_path_factory.mktemp("shared-registry"),
-        [REPO / "engine-api"],
-    )
+    interface = pathlib.Path(__file__).with_name("shared_registry.i")
+    folder = build_swig_module(interface, tmp_path_factory.mktemp("shared-registry"), [REPO / "engine-api"])
     sys.path.insert(0, str(folder))
     try:
         yield importlib.import_module("shared_registry")

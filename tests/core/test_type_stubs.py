@@ -134,14 +134,11 @@ MYPY_LINE = re.compile(r"^(?P<file>[^:]+):(?P<line>\d+): error: (?P<message>.*)\
 
 
 def run(command, cwd, strip_preload=False):
-    env = dict(os.environ)
-    if strip_preload:
-        # A static check loads nothing of the binding: no sanitizer runtime needed.
-        for name in ("LD_PRELOAD", "ASAN_OPTIONS", "UBSAN_OPTIONS", "PYTHONMALLOC"):
-            env.pop(name, None)
-    return subprocess.run(
-        [str(part) for part in command], cwd=cwd, env=env, capture_output=True, text=True, timeout=300
-    )
+    # A static check loads nothing of the binding: no sanitizer runtime needed.
+    dropped = ("LD_PRELOAD", "ASAN_OPTIONS", "UBSAN_OPTIONS", "PYTHONMALLOC") if strip_preload else ()
+    env = {name: value for name, value in os.environ.items() if name not in dropped}
+    command = [str(part) for part in command]
+    return subprocess.run(command, cwd=cwd, env=env, capture_output=True, text=True, timeout=300)
 
 
 def config(tmp_path):
@@ -156,22 +153,8 @@ def mypy(tmp_path, name, source):
     if source:
         (tmp_path / ("%s.py" % name)).write_text(textwrap.dedent(source))
     options = ["--warn-unreachable", "%s.py" % name] if source else ["--config-file", config(tmp_path), "-p", name]
-    result = run(
-        [
-            sys.executable,
-            "-m",
-            "mypy",
-            "--strict",
-            "--no-error-summary",
-            "--show-error-codes",
-            "--no-pretty",
-            "--cache-dir",
-            tmp_path / "mypy-cache",
-            *options,
-        ],
-        tmp_path,
-        strip_preload=True,
-    )
+    strict = "-m mypy --strict --no-error-summary --show-error-codes --no-pretty --cache-dir".split()
+    result = run([sys.executable, *strict, tmp_path / "mypy-cache", *options], tmp_path, strip_preload=True)
     errors = []
     for line in result.stdout.splitlines():
         match = MYPY_LINE.match(line)
@@ -185,20 +168,8 @@ def mypy(tmp_path, name, source):
 def test_stubtest_finds_the_stubs_true_to_the_installed_modules(tmp_path):
     # From an empty folder, so that the installed modules and stubs are what
     # is checked, not anything in the working directory.
-    result = run(
-        [
-            sys.executable,
-            "-m",
-            "mypy.stubtest",
-            "_renderlib",
-            "renderlib",
-            "--allowlist",
-            ALLOWLIST,
-            "--mypy-config-file",
-            config(tmp_path),
-        ],
-        tmp_path,
-    )
+    modules = ["_renderlib", "renderlib", "--allowlist", ALLOWLIST, "--mypy-config-file", config(tmp_path)]
+    result = run([sys.executable, "-m", "mypy.stubtest", *modules], tmp_path)
     report = result.stdout + result.stderr
     assert result.returncode == 0, report
     checked = re.search(r"Success: no issues found in (\d+) modules", report)
@@ -240,11 +211,8 @@ def test_every_mistake_is_reported_and_fails_at_run_time(tmp_path):
     result, errors = mypy(tmp_path, "mistakes", source)
     expected = {(first_line + n, code) for n, (_statement, code, _error) in enumerate(MISTAKES)}
     reported = {(line, code) for line, code, _message in errors}
-    missing = sorted(expected - reported)
-    assert not missing, "mypy let these through: %s\n%s" % (
-        [MISTAKES[line - first_line][0] for line, _code in missing],
-        result.stdout,
-    )
+    missing = [MISTAKES[line - first_line][0] for line, _code in sorted(expected - reported)]
+    assert not missing, "mypy let these through: %s\n%s" % (missing, result.stdout)
     # Nothing else: the correct start is not reported.
     assert all(line >= first_line for line, _code, _message in errors), result.stdout
 

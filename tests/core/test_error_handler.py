@@ -31,7 +31,7 @@ def test_installing_tells_the_engine_and_removing_passes_null(probe, error_handl
     assert probe.emit_from_worker(10, _renderlib.Err_Error, "lost") == 10  # without a handler: dropped
 
 
-def test_a_non_callable_is_refused_and_the_old_handler_stays(probe, error_handler_removed):
+def test_a_refused_or_aborted_change_keeps_the_old_handler(probe, error_handler_removed):
     received = []
     _renderlib.set_error_handler(lambda level, message: received.append(message))
     probe.clear_calls()
@@ -39,8 +39,13 @@ def test_a_non_callable_is_refused_and_the_old_handler_stays(probe, error_handle
         with pytest.raises(TypeError, match="^Callback must be callable$"):
             _renderlib.set_error_handler(bad)
     assert probe.calls() == []  # the engine was not asked
+    probe.abort_next_call()
+    with pytest.raises(RuntimeError) as raised:  # an engine abort becomes RuntimeError
+        _renderlib.set_error_handler(None)
+    assert raised.value.args == ("Tarsel Abort",)
     probe.emit_here(_renderlib.Err_Info, "still here")
     assert received == ["still here"]
+    assert _renderlib.get_n_tarsel_effects() > 0  # the next call is served
 
 
 def test_the_module_holds_exactly_one_reference_to_the_handler(error_handler_removed):
@@ -55,35 +60,13 @@ def test_the_module_holds_exactly_one_reference_to_the_handler(error_handler_rem
     assert sys.getrefcount(handler) == before
 
 
-def test_an_engine_abort_becomes_runtime_error_and_changes_nothing(probe, error_handler_removed):
-    received = []
-    _renderlib.set_error_handler(lambda level, message: received.append(message))
-    probe.abort_next_call()
-    with pytest.raises(RuntimeError) as raised:
-        _renderlib.set_error_handler(None)
-    assert raised.value.args == ("Tarsel Abort",)
-    probe.emit_here(_renderlib.Err_Info, "after abort")
-    assert received == ["after abort"]  # the handler is still installed
-    assert _renderlib.get_n_tarsel_effects() > 0  # the next call is served
+# Every engine call without arguments of its own, and one with.
+NO_ARGUMENTS = """get_n_tarsel_effects get_n_tarsel_builder_effects get_tarsel_version_info get_tarsel_build_id
+    check_build_id get_ocio_path tarsel_abort_render tarsel_clear_abort""".split()
+ENGINE_CALLS = [("get_tarsel_plugin_info_i", (0,))] + [(name, ()) for name in NO_ARGUMENTS]
 
 
-@pytest.mark.parametrize(
-    "name, arguments",
-    [("get_tarsel_plugin_info_i", (0,))]
-    + [
-        (name, ())
-        for name in (
-            "get_n_tarsel_effects",
-            "get_n_tarsel_builder_effects",
-            "get_tarsel_version_info",
-            "get_tarsel_build_id",
-            "check_build_id",
-            "get_ocio_path",
-            "tarsel_abort_render",
-            "tarsel_clear_abort",
-        )
-    ],
-)
+@pytest.mark.parametrize("name, arguments", ENGINE_CALLS)
 def test_every_engine_call_is_guarded(probe, name, arguments):
     probe.abort_next_call()
     with pytest.raises(RuntimeError, match="^Tarsel Abort$"):
@@ -133,12 +116,4 @@ def test_a_handler_exception_surfaces_from_the_call_whatever_it_returns():
         # The instance the failed call made went with its result.
         print(probe.live_instances() - made)
     """)
-    assert out.splitlines() == [
-        "proxy ValueError",
-        "None ValueError",
-        "bool ValueError",
-        "tuple ValueError",
-        "engine ValueError",
-        "3",
-        "1",
-    ]
+    assert out.splitlines() == ["%s ValueError" % kind for kind in "proxy None bool tuple engine".split()] + ["3", "1"]

@@ -11,6 +11,7 @@ null entry.
 
 import ast
 import ctypes
+from ctypes import c_char_p, c_int, c_void_p
 import pathlib
 import types
 
@@ -24,12 +25,7 @@ CONVENTIONS = {0x0001: "METH_VARARGS", 0x0004: "METH_NOARGS", 0x0008: "METH_O"}
 
 
 class PyMethodDef(ctypes.Structure):
-    _fields_ = [
-        ("ml_name", ctypes.c_char_p),
-        ("ml_meth", ctypes.c_void_p),
-        ("ml_flags", ctypes.c_int),
-        ("ml_doc", ctypes.c_char_p),
-    ]
+    _fields_ = [("ml_name", c_char_p), ("ml_meth", c_void_p), ("ml_flags", c_int), ("ml_doc", c_char_p)]
 
 
 class PyCFunctionObjectPrefix(ctypes.Structure):
@@ -52,11 +48,8 @@ def read_list(path=LIST_FILE):
 
 def module_functions():
     """The module's own builtin functions in its dictionary order: {name: function}."""
-    return {
-        name: value
-        for name, value in vars(_renderlib).items()
-        if isinstance(value, types.BuiltinFunctionType) and value.__self__ is _renderlib
-    }
+    functions = vars(_renderlib).items()
+    return {name: f for name, f in functions if isinstance(f, types.BuiltinFunctionType) and f.__self__ is _renderlib}
 
 
 def method_def(function):
@@ -105,9 +98,7 @@ def test_the_module_s_table_equals_the_list(table):
         "in the module's table more than once": {name for name in names if names.count(name) > 1},
     }
     report = [
-        f"{title} ({len(entries)}):\n    " + "\n    ".join(sorted(entries))
-        for title, entries in report.items()
-        if entries
+        f"{title} ({len(items)}):\n    " + "\n    ".join(sorted(items)) for title, items in report.items() if items
     ]
     assert not report, "_renderlib's method table differs from method_table.txt:\n  " + "\n  ".join(report)
 
@@ -123,16 +114,9 @@ def test_swig_heads_the_table_and_what_a_host_makes_it_can_delete(table):
 def test_the_companion_package_defines_and_registers_the_module_s_classes_in_order(table):
     tree = ast.parse(pathlib.Path(renderlib.__file__).read_text(encoding="utf-8"))
     defined = [node.name for node in tree.body if isinstance(node, ast.ClassDef) and not node.name.startswith("_")]
-    registered = []
-    for node in tree.body:
-        if (
-            isinstance(node, ast.Expr)
-            and isinstance(node.value, ast.Call)
-            and isinstance(node.value.func, ast.Attribute)
-            and node.value.func.attr.endswith("_swigregister")
-        ):
-            (argument,) = node.value.args
-            assert node.value.func.attr == f"{argument.id}_swigregister"
-            registered.append(argument.id)
+    calls = [node.value for node in tree.body if isinstance(node, ast.Expr) and isinstance(node.value, ast.Call)]
+    registering = [call for call in calls if getattr(call.func, "attr", "").endswith("_swigregister")]
+    assert all(len(call.args) == 1 and call.func.attr == f"{call.args[0].id}_swigregister" for call in registering)
+    registered = [call.args[0].id for call in registering]
     in_table = [name[: -len("_swigregister")] for name, _ in table if name.endswith("_swigregister")]
     assert defined == registered == in_table and in_table

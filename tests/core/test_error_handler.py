@@ -21,16 +21,6 @@ def test_messages_from_an_engine_worker_reach_the_handler_in_order(probe, error_
     assert {thread for _, _, thread in received} != {threading.get_ident()}
 
 
-def test_installing_tells_the_engine_and_removing_passes_null(probe, error_handler_removed):
-    assert _renderlib.set_error_handler(print) is None
-    assert _renderlib.set_error_handler(None) is None
-    assert _renderlib.set_error_handler(None) is None  # nothing installed: still told
-    calls = probe.calls()
-    assert len(calls) == 3 and calls[0].startswith("T_set_err_handler(0x")
-    assert calls[1:] == ["T_set_err_handler(null)"] * 2
-    assert probe.emit_from_worker(10, _renderlib.Err_Error, "lost") == 10  # without a handler: dropped
-
-
 def test_a_refused_or_aborted_change_keeps_the_old_handler(probe, error_handler_removed):
     received = []
     _renderlib.set_error_handler(lambda level, message: received.append(message))
@@ -48,16 +38,20 @@ def test_a_refused_or_aborted_change_keeps_the_old_handler(probe, error_handler_
     assert _renderlib.get_n_tarsel_effects() > 0  # the next call is served
 
 
-def test_the_module_holds_exactly_one_reference_to_the_handler(error_handler_removed):
+def test_installing_tells_the_engine_holding_one_reference_and_removing_passes_null(probe, error_handler_removed):
     def handler(level, message):
         pass
 
     before = sys.getrefcount(handler)
-    _renderlib.set_error_handler(handler)
-    _renderlib.set_error_handler(handler)  # replacing with itself keeps one
+    assert _renderlib.set_error_handler(handler) is None
+    assert _renderlib.set_error_handler(handler) is None  # replacing with itself keeps one reference
     assert sys.getrefcount(handler) == before + 1
-    _renderlib.set_error_handler(None)
+    assert _renderlib.set_error_handler(None) is None
     assert sys.getrefcount(handler) == before
+    assert _renderlib.set_error_handler(None) is None  # nothing installed: still told
+    calls = probe.calls()
+    assert calls[0].startswith("T_set_err_handler(0x") and calls == calls[:1] * 2 + ["T_set_err_handler(null)"] * 2
+    assert probe.emit_from_worker(10, _renderlib.Err_Error, "lost") == 10  # without a handler: dropped
 
 
 # Every engine call without arguments of its own, and one with.

@@ -11,6 +11,7 @@ null entry.
 
 import ast
 import ctypes
+import itertools
 from ctypes import c_char_p, c_int, c_void_p
 import pathlib
 import types
@@ -68,17 +69,11 @@ def table():
     # in one array, ordered by address as the module dictionary is, and the
     # walked entries are the function objects' own.
     functions = module_functions()
-    assert functions and all(
-        method_def(f).ml_name.decode("ascii") == f.__name__ == name for name, f in functions.items()
-    )
-    address = ctypes.addressof(method_def(next(iter(functions.values()))))
-    entries = []
-    while len(entries) <= len(functions):
-        entry = PyMethodDef.from_address(address)
-        if entry.ml_name is None:
-            break
-        entries.append((entry.ml_name.decode("ascii"), convention_name(entry.ml_flags)))
-        address += ctypes.sizeof(PyMethodDef)
+    assert functions and all(method_def(f).ml_name.decode("ascii") == f.__name__ == n for n, f in functions.items())
+    first = ctypes.addressof(method_def(next(iter(functions.values()))))
+    array = (PyMethodDef * (len(functions) + 1)).from_address(first)  # read entry by entry, up to the null one
+    walked = itertools.takewhile(lambda entry: entry.ml_name is not None, array)
+    entries = [(entry.ml_name.decode("ascii"), convention_name(entry.ml_flags)) for entry in walked]
     assert entries == [(name, convention_name(method_def(f).ml_flags)) for name, f in functions.items()], (
         "the module's functions are not one contiguous array in dictionary order"
     )

@@ -37,18 +37,15 @@ def doctest_text(page):
         match = FENCE.match(line)
         if fence is None and match:
             fence, language = match.group(1), match.group(2).lower()
-            kept.append("")
         elif fence is not None and match and match.group(1).startswith(fence) and not match.group(2):
             fence = None
-            kept.append("")
         elif fence is None or language == "pycon":
             kept.append(line)
+            continue
         else:
-            if line.lstrip().startswith(">>>"):
-                raise AssertionError(
-                    "%s:%d: an example in a ```%s block would not run; use ```pycon" % (page.name, number, language)
-                )
-            kept.append("")
+            message = "%s:%d: an example in a ```%s block would not run; use ```pycon" % (page.name, number, language)
+            assert not line.lstrip().startswith(">>>"), message
+        kept.append("")
     assert fence is None, "%s: a fenced block is never closed" % page.name
     return "\n".join(kept) + "\n"
 

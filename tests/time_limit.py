@@ -42,9 +42,7 @@ def pytest_runtest_protocol(item, nextitem):
         if worker is None:
             dump = sys.__stderr__  # the main thread's stack names the test
         else:
-            if _dump_file is None:
-                _dump_file = open(_dump_path(worker), "w")
-            dump = _dump_file
+            dump = _dump_file = _dump_file or open(_dump_path(worker), "w")
             dump.seek(0)
             dump.truncate()
             dump.write("%s ran past its %g s; the stacks of its threads:\n" % (item.nodeid, TEST_TIME_LIMIT))
@@ -53,8 +51,7 @@ def pytest_runtest_protocol(item, nextitem):
     try:
         yield
     finally:
-        if TEST_TIME_LIMIT > 0:
-            faulthandler.cancel_dump_traceback_later()
+        faulthandler.cancel_dump_traceback_later()  # nothing to cancel without a limit
 
 
 @pytest.hookimpl(optionalhook=True)

@@ -9,18 +9,15 @@ import renderlib  # noqa: F401  (registers the proxy classes before a second mod
 from engine_probe import EngineProbe
 from time_limit import pytest_configure, pytest_handlecrashitem, pytest_runtest_protocol  # noqa: F401 (hooks)
 
-_probe = None
+PROBE = EngineProbe()
 
 
 @pytest.fixture
 def probe():
     """The engine's test probe, with a clean call log; left quiet afterwards."""
-    global _probe
-    if _probe is None:
-        _probe = EngineProbe()
-    _probe.reset()
-    yield _probe
-    _probe.reset()
+    PROBE.reset()
+    yield PROBE
+    PROBE.reset()
     _renderlib.tarsel_clear_abort()
 
 

@@ -1,11 +1,9 @@
-"""The types installed with the package: the stubs the build generates for the
-SWIG layer (_renderlib-stubs, renderlib/__init__.pyi) and the annotations of
-the hand-written modules (py.typed).
+"""The types installed with the package: the stubs the build generates for the SWIG layer (_renderlib-stubs,
+renderlib/__init__.pyi) and the annotations of the hand-written modules (py.typed).
 
-mypy's stubtest compares them with the modules as installed; mypy --strict
-checks the hand-written modules and a typed host (which also runs here), and
-must find nothing wrong with either; and it checks a host's mistakes, every
-one of which it must report and every one of which fails at run time too."""
+mypy's stubtest compares them with the modules as installed; mypy --strict checks the hand-written modules and a typed
+host (which also runs here), and must find nothing wrong with either; and it checks a host's mistakes, every one of
+which it must report and every one of which fails at run time too."""
 
 import os
 import pathlib
@@ -155,14 +153,9 @@ def mypy(tmp_path, name, source):
     options = ["--warn-unreachable", "%s.py" % name] if source else ["--config-file", config(tmp_path), "-p", name]
     strict = "-m mypy --strict --no-error-summary --show-error-codes --no-pretty --cache-dir".split()
     result = run([sys.executable, *strict, tmp_path / "mypy-cache", *options], tmp_path, strip_preload=True)
-    errors = []
-    for line in result.stdout.splitlines():
-        match = MYPY_LINE.match(line)
-        if match:
-            errors.append((int(match["line"]), match["code"], match["message"].strip()))
-        elif ": error:" in line:
-            raise AssertionError("an error mypy reported in a form not understood:\n" + result.stdout)
-    return result, errors
+    found = [MYPY_LINE.match(line) for line in result.stdout.splitlines() if ": error:" in line]
+    assert all(found), "an error mypy reported in a form not understood:\n" + result.stdout
+    return result, [(int(match["line"]), match["code"], match["message"].strip()) for match in found]
 
 
 def test_stubtest_finds_the_stubs_true_to_the_installed_modules(tmp_path):

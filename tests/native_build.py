@@ -1,6 +1,5 @@
-"""Builds native code from the tests: a separately configured reference engine
-and small extension modules. Compilers run without the sanitizer runtime that
-a sanitized test run preloads."""
+"""Builds native code from the tests: a separately configured reference engine and small extension modules. Compilers
+run without the sanitizer runtime that a sanitized test run preloads."""
 
 import os
 import pathlib

@@ -1,6 +1,5 @@
-"""The constants the module registers at import: the engine's enumerations
-with the engine's values, all of them published again by the companion
-package, and an import that registers without calling the engine."""
+"""The constants the module registers at import: the engine's enumerations with the engine's values, all of them
+published again by the companion package, and an import that registers without calling the engine."""
 
 import pathlib
 import re

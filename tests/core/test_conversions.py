@@ -1,5 +1,4 @@
-"""How arguments and results cross the boundary: integers, texts, argument
-counts and proxy objects."""
+"""How arguments and results cross the boundary: integers, texts, argument counts and proxy objects."""
 
 import re
 

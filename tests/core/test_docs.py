@@ -1,10 +1,9 @@
 """The host guide in docs/ runs as doctests, one case per page.
 
-A page's examples are its ```pycon blocks, plus any plain doctest text outside
-fenced blocks, run in page order in one namespace against the reference
-engine. A page must have examples, and must leave the process as it found it:
-no instance, display, image or shared-memory segment of its own left alive,
-no abort request standing, no message handler or drawing object installed."""
+A page's examples are its ```pycon blocks, plus any plain doctest text outside fenced blocks, run in page order in one
+namespace against the reference engine. A page must have examples, and must leave the process as it found it: no
+instance, display, image or shared-memory segment of its own left alive, no abort request standing, no message handler
+or drawing object installed."""
 
 import ctypes
 import doctest
@@ -28,10 +27,9 @@ SEGMENT_PREFIX = "tarsel-ipc."
 
 
 def doctest_text(page):
-    """The page's text with every line that is not an example blanked: fence
-    lines and the lines of fenced blocks other than ```pycon. Line numbers
-    stay those of the page, and a fence ends an example's expected output.
-    A `>>>` line in another kind of fenced block would never run: refused."""
+    """The page's text with every line that is not an example blanked: fence lines and the lines of fenced blocks other
+    than ```pycon. Line numbers stay those of the page, and a fence ends an example's expected output. A `>>>` line in
+    another kind of fenced block would never run: refused."""
     kept, fence, language = [], None, None
     for number, line in enumerate(page.read_text(encoding="utf-8").splitlines(), start=1):
         match = FENCE.match(line)
@@ -51,10 +49,9 @@ def doctest_text(page):
 
 
 class LeftBehind:
-    """What a page could leave alive in the process, counted from outside the
-    module: the engine's and the monitor library's test probes, and the
-    shared-memory segments named with this process's id (pages name theirs
-    so; other processes' come and go meanwhile)."""
+    """What a page could leave alive in the process, counted from outside the module: the engine's and the monitor
+    library's test probes, and the shared-memory segments named with this process's id (pages name theirs so; other
+    processes' come and go meanwhile)."""
 
     def __init__(self, probe):
         self.probe = probe

@@ -1,13 +1,9 @@
 """The module's method table against the hand-written list in method_table.txt.
 
-method_table.txt lists every function of _renderlib with its calling
-convention, as the binding's interface tables give them.  The table itself
-is read from the built module: every function object of the module is a
-builtin function whose PyMethodDef entry points into the module's one static
-method table, so the entries are read in place through ctypes (name and
-ml_flags), and the table is walked from its first entry to the terminating
-null entry.
-"""
+method_table.txt lists every function of _renderlib with its calling convention, as the binding's interface tables give
+them. The table itself is read from the built module: every function object of the module is a builtin function whose
+PyMethodDef entry points into the module's one static method table, so the entries are read in place through ctypes
+(name and ml_flags), and the table is walked from its first entry to the terminating null entry."""
 
 import ast
 import ctypes

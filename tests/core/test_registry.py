@@ -1,5 +1,4 @@
-"""Type sharing between _renderlib and another module on the same registry,
-and the identity rule of engine records."""
+"""Type sharing between _renderlib and another module on the same registry, and the identity rule of engine records."""
 
 import ctypes
 

@@ -1,6 +1,5 @@
-"""The suite's time limit for each test (tests/time_limit.py), on a small
-suite of its own: a test that hangs holding the interpreter lock fails with
-the stacks of its threads, and the tests after it still run."""
+"""The suite's time limit for each test (tests/time_limit.py), on a small suite of its own: a test that hangs holding
+the interpreter lock fails with the stacks of its threads, and the tests after it still run."""
 
 import os
 import subprocess

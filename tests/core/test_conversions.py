@@ -81,10 +81,6 @@ def test_proxy_objects():
     # not read as one: the sanitizer run watches that).
     assert proxy == info.this and proxy != renderlib.T_RasterInfo().this
     assert proxy.__eq__(5) is NotImplemented and proxy != object() and not proxy == "x"
-
-
-def test_a_deleting_function_disowns_its_argument():
-    info = renderlib.T_RasterInfo()
-    proxy = info.this
+    # A deleting function disowns its argument.
     _renderlib.delete_T_RasterInfo(info)
     assert proxy.own() is False  # dropping `info` now frees nothing twice

@@ -7,6 +7,7 @@ import pytest
 import _renderlib
 import renderlib  # noqa: F401  (registers the proxy classes before a second module loads)
 from engine_probe import EngineProbe
+from native_build import REPO, build_module_against, build_reference_engine, build_swig_module
 from time_limit import pytest_configure, pytest_handlecrashitem, pytest_runtest_protocol  # noqa: F401 (hooks)
 
 PROBE = EngineProbe()
@@ -32,8 +33,6 @@ def error_handler_removed():
 def module_on_separate_engine(tmp_path_factory):
     """A module built with the build's option for another engine, against a
     reference engine configured and built on its own: the folder holding it."""
-    from native_build import build_module_against, build_reference_engine
-
     engine = build_reference_engine(tmp_path_factory.mktemp("separate-engine"))
     return build_module_against(engine, tmp_path_factory.mktemp("module-on-separate-engine"))
 
@@ -58,8 +57,6 @@ def instance():
 @pytest.fixture(scope="session")
 def shared_registry(tmp_path_factory):
     """A second SWIG module sharing _renderlib's type registry."""
-    from native_build import REPO, build_swig_module
-
     interface = pathlib.Path(__file__).with_name("shared_registry.i")
     folder = build_swig_module(interface, tmp_path_factory.mktemp("shared-registry"), [REPO / "engine-api"])
     sys.path.insert(0, str(folder))

@@ -24,9 +24,7 @@ def run_python(script, timeout=30, args=()):
 
 def ending(done):
     """How a process ended: "exit N" or the signal that killed it."""
-    if done.returncode < 0:
-        return signal.Signals(-done.returncode).name
-    return "exit %d" % done.returncode
+    return signal.Signals(-done.returncode).name if done.returncode < 0 else "exit %d" % done.returncode
 
 
 def run_cleanly(script, timeout=30, args=()):

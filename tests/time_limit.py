@@ -37,9 +37,8 @@ def pytest_runtest_protocol(item, nextitem):
     global _dump_file
     if TEST_TIME_LIMIT > 0:
         worker = os.environ.get("PYTEST_XDIST_WORKER")
-        if worker is None:
-            dump = sys.__stderr__  # the main thread's stack names the test
-        else:
+        dump = sys.__stderr__  # the main thread's stack names the test
+        if worker is not None:
             dump = _dump_file = _dump_file or open(_dump_path(worker), "w")
             dump.seek(0)
             dump.truncate()

@@ -84,9 +84,8 @@ def test_page_examples(page, probe):
     left = LeftBehind(probe)
     before = left.counts()
     report = []
-    runner = doctest.DocTestRunner(optionflags=OPTIONS)
     try:
-        failed, attempted = runner.run(test, out=report.append, clear_globs=False)
+        failed, attempted = doctest.DocTestRunner(optionflags=OPTIONS).run(test, out=report.append, clear_globs=False)
         assert failed == 0, "%d of %d examples of %s failed:\n%s" % (failed, attempted, page.name, "".join(report))
         assert left.counts() == before, "%s leaves objects alive" % page.name
         assert not probe.abort_requested(), "%s leaves an abort request standing" % page.name

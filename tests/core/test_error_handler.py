@@ -15,9 +15,8 @@ def test_messages_from_an_engine_worker_reach_the_handler_in_order(probe, error_
     # The probe call releases the interpreter lock while the engine's worker
     # thread (which has no Python thread state) delivers the messages.
     assert probe.emit_from_worker(500, _renderlib.Err_Warning, "grain") == 500
-    assert [(level, message) for level, message, _ in received] == [
-        (_renderlib.Err_Warning, "grain %d" % i) for i in range(500)
-    ]
+    sent = [(_renderlib.Err_Warning, "grain %d" % i) for i in range(500)]
+    assert [(level, message) for level, message, _ in received] == sent
     assert {thread for _, _, thread in received} != {threading.get_ident()}
 
 
@@ -57,10 +56,9 @@ def test_installing_tells_the_engine_holding_one_reference_and_removing_passes_n
 # Every engine call without arguments of its own, and one with.
 NO_ARGUMENTS = """get_n_tarsel_effects get_n_tarsel_builder_effects get_tarsel_version_info get_tarsel_build_id
     check_build_id get_ocio_path tarsel_abort_render tarsel_clear_abort""".split()
-ENGINE_CALLS = [("get_tarsel_plugin_info_i", (0,))] + [(name, ()) for name in NO_ARGUMENTS]
 
 
-@pytest.mark.parametrize("name, arguments", ENGINE_CALLS)
+@pytest.mark.parametrize("name, arguments", [("get_tarsel_plugin_info_i", (0,))] + [(n, ()) for n in NO_ARGUMENTS])
 def test_every_engine_call_is_guarded(probe, name, arguments):
     probe.abort_next_call()
     with pytest.raises(RuntimeError, match="^Tarsel Abort$"):

@@ -66,46 +66,46 @@ def test_every_engine_call_is_guarded(probe, name, arguments):
     assert not probe.abort_armed()
 
 
-def test_a_handler_exception_surfaces_from_the_call_whatever_it_returns():
-    # The engine's own call returns normally; the exception stays set in the
-    # thread that called the engine, so each call raises SystemError caused
-    # by it, as the interpreter reports a result returned with an exception
-    # set. On an engine worker the exception goes with the worker's temporary
-    # thread state, and the engine carries on. A fresh process: the first
-    # proxy of a class the module makes is the case that lost the exception.
-    out = run_cleanly("""
-        import _renderlib
-        from engine_probe import EngineProbe
-        from renderlib import effects
+# The engine's own call returns normally; the exception stays set in the
+# thread that called the engine, so each call raises SystemError caused
+# by it, as the interpreter reports a result returned with an exception
+# set. On an engine worker the exception goes with the worker's temporary
+# thread state, and the engine carries on. A fresh process: the first
+# proxy of a class the module makes is the case that lost the exception.
+HANDLER_RAISES = """
+import _renderlib
+from engine_probe import EngineProbe
+from renderlib import effects
 
-        def handler(level, message):
-            raise ValueError(message)
+def handler(level, message):
+    raise ValueError(message)
 
-        probe = EngineProbe()
-        made = probe.live_instances()
-        calls = {
-            "proxy": lambda: _renderlib.init_tarsel_effect_from_string(
-                '{"effect": "T_Glow", "params": {"no_such": "1"}}'),
-            "None": lambda: _renderlib.init_tarsel_effect("T_NoSuchEffect", False),
-            "bool": lambda: effects.render(glow, effects.raster(_renderlib.pixel_rgba8, 4, 4), [None],
-                                           colorspace="cmyk"),
-            "tuple": lambda: _renderlib.tarsel_widget_mouse_event(glow, "no_such", 960, 540, 0.0, 0.0, 0.5, 0.5,
-                                                                  [], 0, 0, 0),
-            "engine": lambda: probe.emit_here(_renderlib.Err_Error, "frame 7"),
-        }
-        glow = None
+probe = EngineProbe()
+made = probe.live_instances()
+calls = {
+    "proxy": lambda: _renderlib.init_tarsel_effect_from_string('{"effect": "T_Glow", "params": {"no_such": "1"}}'),
+    "None": lambda: _renderlib.init_tarsel_effect("T_NoSuchEffect", False),
+    "bool": lambda: effects.render(glow, effects.raster(_renderlib.pixel_rgba8, 4, 4), [None], colorspace="cmyk"),
+    "tuple": lambda: _renderlib.tarsel_widget_mouse_event(glow, "no_such", 960, 540, 0.0, 0.0, 0.5, 0.5, [], 0, 0, 0),
+    "engine": lambda: probe.emit_here(_renderlib.Err_Error, "frame 7"),
+}
+glow = None
+_renderlib.set_error_handler(handler)
+for kind, call in calls.items():
+    try:
+        print(kind, "returned", call())
+    except SystemError as error:
+        print(kind, type(error.__cause__).__name__)
+    if glow is None:
+        _renderlib.set_error_handler(None)
+        glow = _renderlib.init_tarsel_effect("T_Glow", False)
         _renderlib.set_error_handler(handler)
-        for kind, call in calls.items():
-            try:
-                print(kind, "returned", call())
-            except SystemError as error:
-                print(kind, type(error.__cause__).__name__)
-            if glow is None:
-                _renderlib.set_error_handler(None)
-                glow = _renderlib.init_tarsel_effect("T_Glow", False)
-                _renderlib.set_error_handler(handler)
-        print(probe.emit_from_worker(3, _renderlib.Err_Error, "worker"))
-        # The instance the failed call made went with its result.
-        print(probe.live_instances() - made)
-    """)
+print(probe.emit_from_worker(3, _renderlib.Err_Error, "worker"))
+# The instance the failed call made went with its result.
+print(probe.live_instances() - made)
+"""
+
+
+def test_a_handler_exception_surfaces_from_the_call_whatever_it_returns():
+    out = run_cleanly(HANDLER_RAISES)
     assert out.splitlines() == ["%s ValueError" % kind for kind in "proxy None bool tuple engine".split()] + ["3", "1"]

@@ -104,6 +104,7 @@ import renderlib
 
 info = renderlib.T_RasterInfo()
 pixels = bytearray(64)
+after_pixels = (0, 0, 1, 1, [info], [pixels], 1.0, 1, 1.0, 0, 0, 0, 25, False, "srgb", "srgb", "linear")
 """
 MISTAKES = [
     # A bool argument takes True and False only.
@@ -118,12 +119,7 @@ MISTAKES = [
     # Records the engine makes have no constructor.
     ("renderlib.EffectGlobals_t()", "call-arg", AttributeError),
     # Pixels are a buffer, not text.
-    (
-        '_renderlib.render_tarsel_effect_to_native_image(None, "", "pixels", 0, 0, 1, 1, [info], [pixels], 1.0, 1,'
-        ' 1.0, 0, 0, 0, 25, False, "srgb", "srgb", "linear")',
-        "arg-type",
-        TypeError,
-    ),
+    ('_renderlib.render_tarsel_effect_to_native_image(None, "", "pixels", *after_pixels)', "arg-type", TypeError),
     # A catalogue entry may be None (past the end, here).
     ("_renderlib.get_tarsel_plugin_info_i(1 << 20).plugin_name", "union-attr", AttributeError),
 ]

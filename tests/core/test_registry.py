@@ -8,7 +8,7 @@ import _renderlib
 import renderlib
 
 
-def test_a_proxy_crosses_to_the_other_module_and_comes_back_a_renderlib_class(shared_registry):
+def test_a_proxy_crosses_to_the_other_module_and_back_and_one_of_another_class_is_refused(shared_registry):
     info = renderlib.T_RasterInfo()
     info.ds_xsize = 1920
     assert shared_registry.raster_width(info) == shared_registry.raster_width(info.this) == 1920  # bare proxy too
@@ -17,9 +17,7 @@ def test_a_proxy_crosses_to_the_other_module_and_comes_back_a_renderlib_class(sh
     assert not again.this.own()  # the other module did not create it
     again.ds_ysize = 1080
     assert info.ds_ysize == 1080
-
-
-def test_the_other_module_refuses_foreign_types(shared_registry):
+    # A proxy of another class is refused.
     with pytest.raises(TypeError, match=r"^in method 'raster_width', argument 1 of type 'T_RasterInfo const \*'$"):
         shared_registry.raster_width(renderlib.T_RenderInfo())
 

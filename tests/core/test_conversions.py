@@ -8,8 +8,7 @@ import _renderlib
 import renderlib
 
 
-REFUSED_INTS = [(value, OverflowError) for value in (2**31, -(2**31) - 1, 2**70)]
-REFUSED_INTS += [(value, TypeError) for value in (1.0, "1", None)]
+REFUSED_INTS = [(v, OverflowError) for v in (2**31, -(2**31) - 1, 2**70)] + [(v, TypeError) for v in (1.0, "1", None)]
 
 
 @pytest.mark.parametrize("value, error", REFUSED_INTS)

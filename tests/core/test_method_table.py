@@ -36,9 +36,8 @@ def read_list(path=LIST_FILE):
     for number, line in enumerate(path.read_text(encoding="utf-8").splitlines(), 1):
         fields = line.split()
         if fields and not fields[0].startswith("#"):
-            assert len(fields) == 2 and fields[1] in CONVENTIONS.values() and fields[0] not in entries, (
-                f"{path.name} line {number} is malformed or names a function twice: {line!r}"
-            )
+            well_formed = len(fields) == 2 and fields[1] in CONVENTIONS.values() and fields[0] not in entries
+            assert well_formed, f"{path.name} line {number} is malformed or names a function twice: {line!r}"
             entries[fields[0]] = fields[1]
     return entries
 

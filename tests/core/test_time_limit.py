@@ -4,7 +4,6 @@ the interpreter lock fails with the stacks of its threads, and the tests after i
 import os
 import subprocess
 import sys
-import textwrap
 
 from isolated import TESTS
 
@@ -27,7 +26,7 @@ def test_after():
 
 def test_a_test_that_hangs_holding_the_lock_fails_alone_with_its_stacks(tmp_path):
     (tmp_path / "conftest.py").write_text("from time_limit import *  # noqa: F401,F403\n")
-    (tmp_path / "test_hanging.py").write_text(textwrap.dedent(HANGING_SUITE))
+    (tmp_path / "test_hanging.py").write_text(HANGING_SUITE)
     env = dict(os.environ, PYTHONPATH=os.pathsep.join([str(TESTS)] + sys.path), RENDERLIB_TEST_TIME_LIMIT="2")
     env.pop("RENDERLIB_STACK_DUMPS", None)
     command = [sys.executable, *"-m pytest -q -p no:cacheprovider -n 1 --max-worker-restart=5".split(), tmp_path]

@@ -36,8 +36,7 @@ def engine_enumerations():
 
 
 def test_every_engine_enumeration_is_registered_whole_with_the_engines_values():
-    constants = module_constants()
-    enumerations = engine_enumerations()
+    constants, enumerations = module_constants(), engine_enumerations()
     assert set(NOT_REGISTERED) <= set(enumerations) and len(enumerations) > len(NOT_REGISTERED)
     for name, members in enumerations.items():
         if name not in NOT_REGISTERED:

@@ -191,9 +191,8 @@ def test_a_typed_host_checks_clean_and_runs(tmp_path):
 
 
 def test_every_mistake_is_reported_and_fails_at_run_time(tmp_path):
-    start = textwrap.dedent(MISTAKES_START)
-    first_line = start.count("\n") + 1
-    source = start + "".join("%s\n" % statement for statement, _code, _error in MISTAKES)
+    first_line = MISTAKES_START.count("\n") + 1
+    source = MISTAKES_START + "".join("%s\n" % statement for statement, _code, _error in MISTAKES)
     result, errors = mypy(tmp_path, "mistakes", source)
     expected = {(first_line + n, code) for n, (_statement, code, _error) in enumerate(MISTAKES)}
     reported = {(line, code) for line, code, _message in errors}
@@ -204,6 +203,6 @@ def test_every_mistake_is_reported_and_fails_at_run_time(tmp_path):
 
     for statement, _code, error in MISTAKES:
         namespace = {}
-        exec(start, namespace)
+        exec(MISTAKES_START, namespace)
         with pytest.raises(error):
             exec(statement, namespace)

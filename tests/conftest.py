@@ -1,5 +1,4 @@
 import importlib
-import pathlib
 import sys
 
 import pytest
@@ -57,7 +56,7 @@ def instance():
 @pytest.fixture(scope="session")
 def shared_registry(tmp_path_factory):
     """A second SWIG module sharing _renderlib's type registry."""
-    interface = pathlib.Path(__file__).with_name("shared_registry.i")
+    interface = REPO / "tests" / "shared_registry.i"
     folder = build_swig_module(interface, tmp_path_factory.mktemp("shared-registry"), [REPO / "engine-api"])
     sys.path.insert(0, str(folder))
     try:

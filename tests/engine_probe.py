@@ -1,7 +1,5 @@
-"""The reference engine's test probe, reached through ctypes.
-
-The probe lives in the engine library that _renderlib loaded; opening the
-same file again gives the same, already loaded, library."""
+"""The reference engine's test probe, reached through ctypes: it lives in the engine library that _renderlib loaded,
+and opening the same file again gives the same, already loaded, library."""
 
 import ctypes
 from ctypes import c_char_p, c_double, c_int, c_void_p

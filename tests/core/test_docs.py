@@ -95,9 +95,8 @@ def test_page_examples(page, probe):
         # Whatever a failed page left, the rest of the suite runs without it.
         test.globs.clear()
         gc.collect()
-        _renderlib.set_error_handler(None)
-        _renderlib.set_load_frame_impl(None)
-        _renderlib.tarsel_set_gfx_impl(None)
+        for remove in (_renderlib.set_error_handler, _renderlib.set_load_frame_impl, _renderlib.tarsel_set_gfx_impl):
+            remove(None)
         for name in set(left.segments()) - set(before["segments"]):
             _renderlib.ShmemManager_reset(name, True)
 

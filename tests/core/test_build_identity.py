@@ -61,8 +61,7 @@ def test_user_check_compares_the_identity_text_exactly_and_takes_only_encodable_
 
 def test_the_version_command_reports_engine_identity_and_user(capsys):
     assert main(["version"]) == 0
-    lines = capsys.readouterr().out.splitlines()
-    fields = dict((part.strip() for part in line.split(":", 1)) for line in lines)
+    fields = dict((part.strip() for part in line.split(":", 1)) for line in capsys.readouterr().out.splitlines())
     assert fields["engine version"] == _renderlib.get_tarsel_version_info()
     assert fields["engine build id"] == fields["module build id"] == _renderlib.ext_build_id()
     assert fields["build identity"] == "match"

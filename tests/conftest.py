@@ -1,5 +1,4 @@
 import importlib
-import pathlib
 import sys
 
 import pytest
@@ -7,20 +6,18 @@ import pytest
 import _renderlib
 import renderlib  # noqa: F401  (registers the proxy classes before a second module loads)
 from engine_probe import EngineProbe
+from native_build import REPO, build_module_against, build_reference_engine, build_swig_module
 from time_limit import pytest_configure, pytest_handlecrashitem, pytest_runtest_protocol  # noqa: F401 (hooks)
 
-_probe = None
+PROBE = EngineProbe()
 
 
 @pytest.fixture
 def probe():
     """The engine's test probe, with a clean call log; left quiet afterwards."""
-    global _probe
-    if _probe is None:
-        _probe = EngineProbe()
-    _probe.reset()
-    yield _probe
-    _probe.reset()
+    PROBE.reset()
+    yield PROBE
+    PROBE.reset()
     _renderlib.tarsel_clear_abort()
 
 
@@ -35,8 +32,6 @@ def error_handler_removed():
 def module_on_separate_engine(tmp_path_factory):
     """A module built with the build's option for another engine, against a
     reference engine configured and built on its own: the folder holding it."""
-    from native_build import build_module_against, build_reference_engine
-
     engine = build_reference_engine(tmp_path_factory.mktemp("separate-engine"))
     return build_module_against(engine, tmp_path_factory.mktemp("module-on-separate-engine"))
 
@@ -61,13 +56,8 @@ def instance():
 @pytest.fixture(scope="session")
 def shared_registry(tmp_path_factory):
     """A second SWIG module sharing _renderlib's type registry."""
-    from native_build import REPO, build_swig_module
-
-    folder = build_swig_module(
-        pathlib.Path(__file__).with_name("shared_registry.i"),
-        tmp_path_factory.mktemp("shared-registry"),
-        [REPO / "engine-api"],
-    )
+    interface = REPO / "tests" / "shared_registry.i"
+    folder = build_swig_module(interface, tmp_path_factory.mktemp("shared-registry"), [REPO / "engine-api"])
     sys.path.insert(0, str(folder))
     try:
         yield importlib.import_module("shared_registry")

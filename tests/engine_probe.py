@@ -1,9 +1,8 @@
-"""The reference engine's test probe, reached through ctypes.
-
-The probe lives in the engine library that _renderlib loaded; opening the
-same file again gives the same, already loaded, library."""
+"""The reference engine's test probe, reached through ctypes: it lives in the engine library that _renderlib loaded,
+and opening the same file again gives the same, already loaded, library."""
 
 import ctypes
+from ctypes import c_char_p, c_double, c_int, c_void_p
 
 import _renderlib  # noqa: F401  (loads the engine)
 
@@ -18,29 +17,26 @@ def loaded_library_path(stem):
     raise LookupError("lib%s.so is not loaded" % stem)
 
 
+# The argument and result types of the probe's functions (tarsel_probe_<name>)
+# that take arguments or return other than an int.
+ARGUMENTS = {
+    **dict.fromkeys(["call", "set_abort_next_call", "set_call_log", "set_render_immediate_return"], [c_int]),
+    **dict.fromkeys(["shmem_stall_holding_lock", "shmem_abandon_lock", "shmem_break_lock"], [c_void_p, c_int]),
+    "emit_from_worker": [c_int, c_int, c_char_p],
+    "emit_here": [c_int, c_char_p],
+    "set_version_text": [c_char_p],
+    "time_frame_requests": [c_int] * 3,
+}
+RESULTS = {"call": c_char_p, "last_render_seconds": c_double, "time_frame_requests": c_double}
+
+
 class EngineProbe:
     def __init__(self):
-        lib = ctypes.CDLL(loaded_library_path("tarsel_ps"))
-        self.lib = lib
-        lib.tarsel_probe_call_count.restype = ctypes.c_int
-        lib.tarsel_probe_call.restype = ctypes.c_char_p
-        lib.tarsel_probe_call.argtypes = [ctypes.c_int]
-        lib.tarsel_probe_abort_armed.restype = ctypes.c_int
-        lib.tarsel_probe_abort_requested.restype = ctypes.c_int
-        lib.tarsel_probe_emit_from_worker.restype = ctypes.c_int
-        lib.tarsel_probe_emit_from_worker.argtypes = [ctypes.c_int, ctypes.c_int, ctypes.c_char_p]
-        lib.tarsel_probe_emit_here.argtypes = [ctypes.c_int, ctypes.c_char_p]
-        lib.tarsel_probe_set_abort_next_call.argtypes = [ctypes.c_int]
-        lib.tarsel_probe_set_call_log.argtypes = [ctypes.c_int]
-        lib.tarsel_probe_set_render_immediate_return.argtypes = [ctypes.c_int]
-        lib.tarsel_probe_last_render_seconds.restype = ctypes.c_double
-        lib.tarsel_probe_set_version_text.argtypes = [ctypes.c_char_p]
-        for name in ("stall_holding_lock", "abandon_lock", "break_lock"):
-            function = getattr(lib, "tarsel_probe_shmem_" + name)
-            function.argtypes = [ctypes.c_void_p, ctypes.c_int]
-            function.restype = ctypes.c_int
-        lib.tarsel_probe_time_frame_requests.restype = ctypes.c_double
-        lib.tarsel_probe_time_frame_requests.argtypes = [ctypes.c_int, ctypes.c_int, ctypes.c_int]
+        self.lib = ctypes.CDLL(loaded_library_path("tarsel_ps"))
+        for name, types in ARGUMENTS.items():
+            getattr(self.lib, "tarsel_probe_" + name).argtypes = types
+        for name, result in RESULTS.items():
+            getattr(self.lib, "tarsel_probe_" + name).restype = result
 
     def live_instances(self):
         return self.lib.tarsel_probe_live_instances()
@@ -60,10 +56,8 @@ class EngineProbe:
 
     def calls(self):
         """The call log, oldest first, as text."""
-        lib = self.lib
-        return [
-            lib.tarsel_probe_call(i).decode("utf-8", "surrogateescape") for i in range(lib.tarsel_probe_call_count())
-        ]
+        count = self.lib.tarsel_probe_call_count()
+        return [self.lib.tarsel_probe_call(i).decode("utf-8", "surrogateescape") for i in range(count)]
 
     def keep_call_log(self, on=True):
         self.lib.tarsel_probe_set_call_log(int(on))

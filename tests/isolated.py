@@ -1,5 +1,4 @@
-"""Host code run in a process of its own, so that a crash or a hang fails one
-test instead of the whole run."""
+"""Host code run in a process of its own, so that a crash or a hang fails one test instead of the whole run."""
 
 import os
 import pathlib
@@ -12,9 +11,8 @@ TESTS = pathlib.Path(__file__).resolve().parent
 
 
 def run_python(script, timeout=30, args=()):
-    """The finished process of `script` (dedented; the tests' helpers are
-    importable). A process still running after `timeout` seconds is killed and
-    reported as hung."""
+    """The finished process of `script` (dedented; the tests' helpers are importable). A process still running after
+    `timeout` seconds is killed and reported as hung."""
     env = dict(os.environ, PYTHONPATH=os.pathsep.join([str(TESTS)] + sys.path))
     command = [sys.executable, "-c", textwrap.dedent(script)] + [str(a) for a in args]
     try:
@@ -26,9 +24,7 @@ def run_python(script, timeout=30, args=()):
 
 def ending(done):
     """How a process ended: "exit N" or the signal that killed it."""
-    if done.returncode < 0:
-        return signal.Signals(-done.returncode).name
-    return "exit %d" % done.returncode
+    return signal.Signals(-done.returncode).name if done.returncode < 0 else "exit %d" % done.returncode
 
 
 def run_cleanly(script, timeout=30, args=()):

@@ -1,6 +1,5 @@
-"""Builds native code from the tests: a separately configured reference engine
-and small extension modules. Compilers run without the sanitizer runtime that
-a sanitized test run preloads."""
+"""Builds native code from the tests: a separately configured reference engine and small extension modules. Compilers
+run without the sanitizer runtime that a sanitized test run preloads."""
 
 import os
 import pathlib
@@ -28,20 +27,8 @@ def run(command, cwd=None):
 
 
 def cmake_build(source_dir, build_dir, *options):
-    run(
-        [
-            tool("cmake"),
-            "-S",
-            source_dir,
-            "-B",
-            build_dir,
-            "-G",
-            "Ninja",
-            "-DCMAKE_MAKE_PROGRAM=" + tool("ninja"),
-            "-DCMAKE_BUILD_TYPE=Release",
-        ]
-        + list(options)
-    )
+    configure = [tool("cmake"), "-S", source_dir, "-B", build_dir, "-G", "Ninja", "-DCMAKE_BUILD_TYPE=Release"]
+    run(configure + ["-DCMAKE_MAKE_PROGRAM=" + tool("ninja"), *options])
     run([tool("cmake"), "--build", build_dir])
     return pathlib.Path(build_dir)
 
@@ -55,14 +42,9 @@ def build_reference_engine(build_dir):
 def build_module_against(engine_dir, build_dir):
     """Builds the module alone against the engine libraries in `engine_dir`
     (headers from engine-api/); returns the folder holding _renderlib."""
-    cmake_build(
-        REPO,
-        build_dir,
-        "-DRENDERLIB_ENGINE_INCLUDE_DIR=%s" % (REPO / "engine-api"),
-        "-DRENDERLIB_ENGINE_LIBRARY_DIR=%s" % engine_dir,
-        "-DPython_EXECUTABLE=" + sys.executable,
-        "-DSWIG_EXECUTABLE=" + tool("swig"),
-    )
+    options = {"RENDERLIB_ENGINE_INCLUDE_DIR": REPO / "engine-api", "RENDERLIB_ENGINE_LIBRARY_DIR": engine_dir}
+    options.update(Python_EXECUTABLE=sys.executable, SWIG_EXECUTABLE=tool("swig"))
+    cmake_build(REPO, build_dir, *["-D%s=%s" % option for option in options.items()])
     return pathlib.Path(build_dir) / "python" / "render-lib"
 
 
@@ -73,17 +55,7 @@ def build_swig_module(interface, build_dir, include_dirs=()):
     wrap = build_dir / (name + "_wrap.cxx")
     run([tool("swig"), "-c++", "-python", "-threads", "-outdir", build_dir, "-o", wrap, interface])
     extension = build_dir / ("_" + name + sysconfig.get_config_var("EXT_SUFFIX"))
-    run(
-        [
-            os.environ.get("CXX", "g++"),
-            "-std=c++17",
-            "-shared",
-            "-fPIC",
-            "-w",
-            "-O1",
-            "-I" + sysconfig.get_paths()["include"],
-        ]
-        + ["-I%s" % d for d in include_dirs]
-        + [wrap, "-o", extension]
-    )
+    includes = [sysconfig.get_paths()["include"], *include_dirs]
+    compiler = [os.environ.get("CXX", "g++"), *"-std=c++17 -shared -fPIC -w -O1".split()]
+    run(compiler + ["-I%s" % d for d in includes] + [wrap, "-o", extension])
     return build_dir

@@ -1,10 +1,9 @@
 """The host guide in docs/ runs as doctests, one case per page.
 
-A page's examples are its ```pycon blocks, plus any plain doctest text outside
-fenced blocks, run in page order in one namespace against the reference
-engine. A page must have examples, and must leave the process as it found it:
-no instance, display, image or shared-memory segment of its own left alive,
-no abort request standing, no message handler or drawing object installed."""
+A page's examples are its ```pycon blocks, plus any plain doctest text outside fenced blocks, run in page order in one
+namespace against the reference engine. A page must have examples, and must leave the process as it found it: no
+instance, display, image or shared-memory segment of its own left alive, no abort request standing, no message handler
+or drawing object installed."""
 
 import ctypes
 import doctest
@@ -28,36 +27,31 @@ SEGMENT_PREFIX = "tarsel-ipc."
 
 
 def doctest_text(page):
-    """The page's text with every line that is not an example blanked: fence
-    lines and the lines of fenced blocks other than ```pycon. Line numbers
-    stay those of the page, and a fence ends an example's expected output.
-    A `>>>` line in another kind of fenced block would never run: refused."""
+    """The page's text with every line that is not an example blanked: fence lines and the lines of fenced blocks other
+    than ```pycon. Line numbers stay those of the page, and a fence ends an example's expected output. A `>>>` line in
+    another kind of fenced block would never run: refused."""
     kept, fence, language = [], None, None
     for number, line in enumerate(page.read_text(encoding="utf-8").splitlines(), start=1):
         match = FENCE.match(line)
         if fence is None and match:
             fence, language = match.group(1), match.group(2).lower()
-            kept.append("")
         elif fence is not None and match and match.group(1).startswith(fence) and not match.group(2):
             fence = None
-            kept.append("")
         elif fence is None or language == "pycon":
             kept.append(line)
+            continue
         else:
-            if line.lstrip().startswith(">>>"):
-                raise AssertionError(
-                    "%s:%d: an example in a ```%s block would not run; use ```pycon" % (page.name, number, language)
-                )
-            kept.append("")
+            message = "%s:%d: an example in a ```%s block would not run; use ```pycon" % (page.name, number, language)
+            assert not line.lstrip().startswith(">>>"), message
+        kept.append("")
     assert fence is None, "%s: a fenced block is never closed" % page.name
     return "\n".join(kept) + "\n"
 
 
 class LeftBehind:
-    """What a page could leave alive in the process, counted from outside the
-    module: the engine's and the monitor library's test probes, and the
-    shared-memory segments named with this process's id (pages name theirs
-    so; other processes' come and go meanwhile)."""
+    """What a page could leave alive in the process, counted from outside the module: the engine's and the monitor
+    library's test probes, and the shared-memory segments named with this process's id (pages name theirs so; other
+    processes' come and go meanwhile)."""
 
     def __init__(self, probe):
         self.probe = probe
@@ -90,9 +84,8 @@ def test_page_examples(page, probe):
     left = LeftBehind(probe)
     before = left.counts()
     report = []
-    runner = doctest.DocTestRunner(optionflags=OPTIONS)
     try:
-        failed, attempted = runner.run(test, out=report.append, clear_globs=False)
+        failed, attempted = doctest.DocTestRunner(optionflags=OPTIONS).run(test, out=report.append, clear_globs=False)
         assert failed == 0, "%d of %d examples of %s failed:\n%s" % (failed, attempted, page.name, "".join(report))
         assert left.counts() == before, "%s leaves objects alive" % page.name
         assert not probe.abort_requested(), "%s leaves an abort request standing" % page.name
@@ -102,9 +95,8 @@ def test_page_examples(page, probe):
         # Whatever a failed page left, the rest of the suite runs without it.
         test.globs.clear()
         gc.collect()
-        _renderlib.set_error_handler(None)
-        _renderlib.set_load_frame_impl(None)
-        _renderlib.tarsel_set_gfx_impl(None)
+        for remove in (_renderlib.set_error_handler, _renderlib.set_load_frame_impl, _renderlib.tarsel_set_gfx_impl):
+            remove(None)
         for name in set(left.segments()) - set(before["segments"]):
             _renderlib.ShmemManager_reset(name, True)
 

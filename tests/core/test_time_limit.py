@@ -1,11 +1,9 @@
-"""The suite's time limit for each test (tests/time_limit.py), on a small
-suite of its own: a test that hangs holding the interpreter lock fails with
-the stacks of its threads, and the tests after it still run."""
+"""The suite's time limit for each test (tests/time_limit.py), on a small suite of its own: a test that hangs holding
+the interpreter lock fails with the stacks of its threads, and the tests after it still run."""
 
 import os
 import subprocess
 import sys
-import textwrap
 
 from isolated import TESTS
 
@@ -28,28 +26,11 @@ def test_after():
 
 def test_a_test_that_hangs_holding_the_lock_fails_alone_with_its_stacks(tmp_path):
     (tmp_path / "conftest.py").write_text("from time_limit import *  # noqa: F401,F403\n")
-    (tmp_path / "test_hanging.py").write_text(textwrap.dedent(HANGING_SUITE))
+    (tmp_path / "test_hanging.py").write_text(HANGING_SUITE)
     env = dict(os.environ, PYTHONPATH=os.pathsep.join([str(TESTS)] + sys.path), RENDERLIB_TEST_TIME_LIMIT="2")
     env.pop("RENDERLIB_STACK_DUMPS", None)
-    done = subprocess.run(
-        [
-            sys.executable,
-            "-m",
-            "pytest",
-            "-q",
-            "-p",
-            "no:cacheprovider",
-            "-n",
-            "1",
-            "--max-worker-restart=5",
-            str(tmp_path),
-        ],
-        cwd=tmp_path,
-        capture_output=True,
-        text=True,
-        timeout=120,
-        env=env,
-    )
+    command = [sys.executable, *"-m pytest -q -p no:cacheprovider -n 1 --max-worker-restart=5".split(), tmp_path]
+    done = subprocess.run(command, cwd=tmp_path, capture_output=True, text=True, timeout=120, env=env)
     assert done.returncode == 1, done.stdout[-3000:]
     assert "1 failed, 2 passed" in done.stdout, done.stdout[-3000:]
     report = done.stdout[done.stdout.index("crashed while running") :]

@@ -1,16 +1,15 @@
-"""The types installed with the package: the stubs the build generates for the
-SWIG layer (_renderlib-stubs, renderlib/__init__.pyi) and the annotations of
-the hand-written modules (py.typed).
+"""The types installed with the package: the stubs the build generates for the SWIG layer (_renderlib-stubs,
+renderlib/__init__.pyi) and the annotations of the hand-written modules (py.typed).
 
-mypy's stubtest compares them with the modules as installed; mypy --strict
-checks the hand-written modules and a typed host (which also runs here), and
-must find nothing wrong with either; and it checks a host's mistakes, every
-one of which it must report and every one of which fails at run time too."""
+mypy's stubtest compares them with the modules as installed; mypy --strict checks the hand-written modules and a typed
+host (which also runs here), and must find nothing wrong with either; and it checks a host's mistakes, every one of
+which it must report and every one of which fails at run time too."""
 
 import os
 import pathlib
 import pkgutil
 import re
+import runpy
 import subprocess
 import sys
 import textwrap
@@ -23,8 +22,7 @@ import renderlib
 # The test extra installs mypy only where it runs (Python 3.10 and later).
 pytest.importorskip("mypy")
 
-HERE = pathlib.Path(__file__).resolve().parent
-ALLOWLIST = HERE / "stubtest_allowlist.txt"
+ALLOWLIST = pathlib.Path(__file__).resolve().with_name("stubtest_allowlist.txt")
 
 # A host written against the stubs: every line must type-check under --strict,
 # and the assert_type lines pin what the stubs say the binding gives.
@@ -106,6 +104,7 @@ import renderlib
 
 info = renderlib.T_RasterInfo()
 pixels = bytearray(64)
+after_pixels = (0, 0, 1, 1, [info], [pixels], 1.0, 1, 1.0, 0, 0, 0, 25, False, "srgb", "srgb", "linear")
 """
 MISTAKES = [
     # A bool argument takes True and False only.
@@ -120,12 +119,7 @@ MISTAKES = [
     # Records the engine makes have no constructor.
     ("renderlib.EffectGlobals_t()", "call-arg", AttributeError),
     # Pixels are a buffer, not text.
-    (
-        '_renderlib.render_tarsel_effect_to_native_image(None, "", "pixels", 0, 0, 1, 1, [info], [pixels], 1.0, 1,'
-        ' 1.0, 0, 0, 0, 25, False, "srgb", "srgb", "linear")',
-        "arg-type",
-        TypeError,
-    ),
+    ('_renderlib.render_tarsel_effect_to_native_image(None, "", "pixels", *after_pixels)', "arg-type", TypeError),
     # A catalogue entry may be None (past the end, here).
     ("_renderlib.get_tarsel_plugin_info_i(1 << 20).plugin_name", "union-attr", AttributeError),
 ]
@@ -134,14 +128,10 @@ MYPY_LINE = re.compile(r"^(?P<file>[^:]+):(?P<line>\d+): error: (?P<message>.*)\
 
 
 def run(command, cwd, strip_preload=False):
-    env = dict(os.environ)
-    if strip_preload:
-        # A static check loads nothing of the binding: no sanitizer runtime needed.
-        for name in ("LD_PRELOAD", "ASAN_OPTIONS", "UBSAN_OPTIONS", "PYTHONMALLOC"):
-            env.pop(name, None)
-    return subprocess.run(
-        [str(part) for part in command], cwd=cwd, env=env, capture_output=True, text=True, timeout=300
-    )
+    # A static check loads nothing of the binding: no sanitizer runtime needed.
+    dropped = ("LD_PRELOAD", "ASAN_OPTIONS", "UBSAN_OPTIONS", "PYTHONMALLOC") if strip_preload else ()
+    env = {name: value for name, value in os.environ.items() if name not in dropped}
+    return subprocess.run(command, cwd=cwd, env=env, capture_output=True, text=True, timeout=300)
 
 
 def config(tmp_path):
@@ -156,53 +146,21 @@ def mypy(tmp_path, name, source):
     if source:
         (tmp_path / ("%s.py" % name)).write_text(textwrap.dedent(source))
     options = ["--warn-unreachable", "%s.py" % name] if source else ["--config-file", config(tmp_path), "-p", name]
-    result = run(
-        [
-            sys.executable,
-            "-m",
-            "mypy",
-            "--strict",
-            "--no-error-summary",
-            "--show-error-codes",
-            "--no-pretty",
-            "--cache-dir",
-            tmp_path / "mypy-cache",
-            *options,
-        ],
-        tmp_path,
-        strip_preload=True,
-    )
-    errors = []
-    for line in result.stdout.splitlines():
-        match = MYPY_LINE.match(line)
-        if match:
-            errors.append((int(match["line"]), match["code"], match["message"].strip()))
-        elif ": error:" in line:
-            raise AssertionError("an error mypy reported in a form not understood:\n" + result.stdout)
-    return result, errors
+    strict = "-m mypy --strict --no-error-summary --show-error-codes --no-pretty --cache-dir".split()
+    result = run([sys.executable, *strict, tmp_path / "mypy-cache", *options], tmp_path, strip_preload=True)
+    found = [MYPY_LINE.match(line) for line in result.stdout.splitlines() if ": error:" in line]
+    assert all(found), "an error mypy reported in a form not understood:\n" + result.stdout
+    return result, [(int(match["line"]), match["code"], match["message"].strip()) for match in found]
 
 
 def test_stubtest_finds_the_stubs_true_to_the_installed_modules(tmp_path):
     # From an empty folder, so that the installed modules and stubs are what
     # is checked, not anything in the working directory.
-    result = run(
-        [
-            sys.executable,
-            "-m",
-            "mypy.stubtest",
-            "_renderlib",
-            "renderlib",
-            "--allowlist",
-            ALLOWLIST,
-            "--mypy-config-file",
-            config(tmp_path),
-        ],
-        tmp_path,
-    )
+    modules = ["_renderlib", "renderlib", "--allowlist", ALLOWLIST, "--mypy-config-file", config(tmp_path)]
+    result = run([sys.executable, "-m", "mypy.stubtest", *modules], tmp_path)
     report = result.stdout + result.stderr
-    assert result.returncode == 0, report
     checked = re.search(r"Success: no issues found in (\d+) modules", report)
-    assert checked, report
+    assert result.returncode == 0 and checked, report
     # Every module of the package was compared, not just the two named (the
     # count also takes in the engine's folder, renderlib/lib).
     submodules = [m.name for m in pkgutil.walk_packages(renderlib.__path__, "renderlib.")]
@@ -220,8 +178,7 @@ def test_a_typed_host_checks_clean_and_runs(tmp_path):
     assert result.returncode == 0 and not errors, result.stdout + result.stderr
 
     # The host is a working one: what was checked is what a host does.
-    namespace = {}
-    exec(compile(textwrap.dedent(TYPED_HOST), "typed_host", "exec"), namespace)
+    namespace = runpy.run_path(tmp_path / "typed_host.py")  # the file mypy checked
     names = namespace["catalogue_names"](False)
     assert "T_Gradient" in names and all(isinstance(name, str) for name in names)
     assert namespace["catalogue_names"](True)
@@ -234,22 +191,18 @@ def test_a_typed_host_checks_clean_and_runs(tmp_path):
 
 
 def test_every_mistake_is_reported_and_fails_at_run_time(tmp_path):
-    start = textwrap.dedent(MISTAKES_START)
-    first_line = start.count("\n") + 1
-    source = start + "".join("%s\n" % statement for statement, _code, _error in MISTAKES)
+    first_line = MISTAKES_START.count("\n") + 1
+    source = MISTAKES_START + "".join("%s\n" % statement for statement, _code, _error in MISTAKES)
     result, errors = mypy(tmp_path, "mistakes", source)
     expected = {(first_line + n, code) for n, (_statement, code, _error) in enumerate(MISTAKES)}
     reported = {(line, code) for line, code, _message in errors}
-    missing = sorted(expected - reported)
-    assert not missing, "mypy let these through: %s\n%s" % (
-        [MISTAKES[line - first_line][0] for line, _code in missing],
-        result.stdout,
-    )
+    missing = [MISTAKES[line - first_line][0] for line, _code in sorted(expected - reported)]
+    assert not missing, "mypy let these through: %s\n%s" % (missing, result.stdout)
     # Nothing else: the correct start is not reported.
     assert all(line >= first_line for line, _code, _message in errors), result.stdout
 
     for statement, _code, error in MISTAKES:
         namespace = {}
-        exec(start, namespace)
+        exec(MISTAKES_START, namespace)
         with pytest.raises(error):
             exec(statement, namespace)

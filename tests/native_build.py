@@ -21,9 +21,10 @@ def tool(name):
 
 def run(command, cwd=None):
     env = {k: v for k, v in os.environ.items() if k not in ("LD_PRELOAD", "ASAN_OPTIONS", "UBSAN_OPTIONS")}
-    subprocess.run(
-        [str(part) for part in command], cwd=cwd, env=env, check=True, stdout=subprocess.PIPE, stderr=subprocess.STDOUT
+    done = subprocess.run(
+        [str(part) for part in command], cwd=cwd, env=env, stdout=subprocess.PIPE, stderr=subprocess.STDOUT
     )
+    assert done.returncode == 0, "%s failed:\n%s" % (command[0], done.stdout.decode(errors="replace")[-4000:])
 
 
 def cmake_build(source_dir, build_dir, *options):

@@ -17,8 +17,6 @@ typedef unsigned char uchar_t;
 struct T_RasterInfo;
 class RenderContext;
 
-%feature("compactdefaultargs") scaled;
-
 %inline %{
 int raster_width(const T_RasterInfo *info) { return info ? info->ds_xsize : -1; }
 T_RasterInfo *same_raster(T_RasterInfo *info) { return info; }
@@ -43,7 +41,4 @@ void *object_address(PyObject *object) { return object; }
 bool negate(bool value) { return !value; }
 float halve(float value) { return value / 2; }
 unsigned int echo_unsigned(unsigned int value) { return value; }
-int scaled(int value, int factor = 2) { return value * factor; }
-int arity(int) { return 1; }
-int arity(int, int) { return 2; }
 %}

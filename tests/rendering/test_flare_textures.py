@@ -23,14 +23,6 @@ def test_registered_pixels_are_copied_and_read_back(store):
     out = bytearray(16)
     assert _renderlib.tarsel_get_texture_pixels(index, out) == 16
     assert out == bytearray(range(16))
-    with pytest.raises(
-        TypeError, match=r"^in method 'tarsel_get_texture_pixels', argument 2 of type '\(TYPEMAP, SIZE\)'$"
-    ):
-        _renderlib.tarsel_get_texture_pixels(index, 16)
-    with pytest.raises(
-        TypeError, match=r"^in method 'tarsel_register_flare_texture', argument 5 of type '\(RawImage\)'$"
-    ):
-        _renderlib.tarsel_register_flare_texture(2, 2, 4, 1, "pixels")
 
 
 def test_textures_load_from_png_files(store, tmp_path):

@@ -8,7 +8,6 @@ from effect_helpers import all_entries, all_params
 from renderlib import effects
 
 
-
 def read_every_field(record):
     """Reads every attribute its proxy class defines (each a field of the engine's record)."""
     for name, value in vars(type(record)).items():

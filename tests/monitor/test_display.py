@@ -72,7 +72,6 @@ def test_image_add_and_remove_pass_straight_through_to_the_last_reference(displa
     at = address(image)
     assert (rl.EM_XIImage_addRef(image), image.addRef(), rl.EM_XIImage_removeRef(image)) == (2, 3, 2)
     assert image.thisown and probe.image_refs(at) == 2
-    assert (image.getWidth(), image.getHeight(), rl.EM_XIImage_getRowBytes(image)) == (8, 4, 32)
     assert image.removeRef() == 1 and image.removeRef() == 0  # the proxy's own reference given back by the caller
     no_image = r"^in method 'EM_XIImage_getWidth', argument 1 of type 'EM_XIImage const \*': no image"
     with pytest.raises(ValueError, match=no_image):

@@ -61,7 +61,6 @@ def test_instance_queries(instance):
     assert _renderlib.tarsel_effect_is_time_varying(blur, "", 0) == 0
     assert _renderlib.tarsel_effect_is_time_varying(blur, "no_such_parameter", 0) == -1
     assert repr(blur) == 'Globals("T_Blur" @0x%x)' % int(blur.this)
-    assert blur != echo and blur == blur
 
 
 def test_shared_parameters(instance):
@@ -95,9 +94,7 @@ def test_engine_controls(probe, tmp_path, error_handler_removed):
     _renderlib.tarsel_free_all_stamp_collections()
     assert probe.stamp_count() == 0
     _renderlib.tarsel_shutdown_apps()
-    effect = _renderlib.init_tarsel_effect("T_Blur", False)  # usable again after shutdown
-    assert effect is not None
-    _renderlib.free_tarsel_effect(effect)
+    assert _renderlib.init_tarsel_effect("T_Blur", False) is not None  # usable again after shutdown
 
 
 def test_creation_and_freeing_from_four_threads(probe):

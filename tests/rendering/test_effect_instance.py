@@ -1,6 +1,5 @@
 """Effect instances: creation, saved text, queries, freeing, threads."""
 
-import gc
 import json
 import threading
 
@@ -55,20 +54,6 @@ def test_changed_values_are_kept_by_the_saved_text(instance):
         effects.saved_text(blur, {"no_such_parameter": "1"})
 
 
-def test_freeing_disowns_the_proxy(probe):
-    live = probe.live_instances()
-    effect = _renderlib.init_tarsel_effect("T_Blur", False)
-    assert probe.live_instances() == live + 1
-    _renderlib.free_tarsel_effect(effect)
-    assert probe.live_instances() == live and not effect.this.own()
-    del effect  # must not free again
-    gc.collect()
-    assert probe.live_instances() == live
-    dropped = _renderlib.init_tarsel_effect("T_Glow", False)
-    del dropped  # the owning proxy frees the instance
-    assert probe.live_instances() == live
-
-
 def test_instance_queries(instance):
     blur, echo = instance("T_Blur"), instance("T_Echo")
     assert "CPU" in _renderlib.tarsel_get_gpu_status(blur)
@@ -76,7 +61,6 @@ def test_instance_queries(instance):
     assert _renderlib.tarsel_effect_is_time_varying(blur, "", 0) == 0
     assert _renderlib.tarsel_effect_is_time_varying(blur, "no_such_parameter", 0) == -1
     assert repr(blur) == 'Globals("T_Blur" @0x%x)' % int(blur.this)
-    assert blur != echo and blur == blur
 
 
 def test_shared_parameters(instance):
@@ -110,9 +94,7 @@ def test_engine_controls(probe, tmp_path, error_handler_removed):
     _renderlib.tarsel_free_all_stamp_collections()
     assert probe.stamp_count() == 0
     _renderlib.tarsel_shutdown_apps()
-    effect = _renderlib.init_tarsel_effect("T_Blur", False)  # usable again after shutdown
-    assert effect is not None
-    _renderlib.free_tarsel_effect(effect)
+    assert _renderlib.init_tarsel_effect("T_Blur", False) is not None  # usable again after shutdown
 
 
 def test_creation_and_freeing_from_four_threads(probe):

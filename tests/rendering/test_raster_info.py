@@ -6,7 +6,6 @@ import struct
 
 import pytest
 
-import _renderlib
 import renderlib
 
 # The first 24 words of a raster descriptor (two floats follow); "-" for words the module does not name.
@@ -44,6 +43,3 @@ def test_enumerated_fields_take_any_int_and_read_only_fields_refuse():
     assert render_info.full_xsize == 0 and render_info.pixel_scale == 0.0 and type(render_info.y_pixel_scale) is float
     with pytest.raises(AttributeError):
         render_info.full_xsize = 1
-    with pytest.raises(AttributeError, match="No constructor defined"):
-        renderlib.RenderContext()
-    assert not hasattr(_renderlib, "new_RenderContext")

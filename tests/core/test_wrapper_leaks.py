@@ -541,8 +541,6 @@ def images(call, helpers, tmp_path):
 
     def step():
         info = renderlib.T_RasterInfo()
-        # Neither the record nor the text is given as None to the two record
-        # writers: they pass it on to memcpy and strlen unchecked.
         info.pixel_type = _renderlib.pixel_rgba8
         call.each("make_tarsel_raster_info", (200, info, 10, 5), (OverflowError, info, BIG, 5))
         info.pixel_type = 27  # no such layout
@@ -552,8 +550,15 @@ def images(call, helpers, tmp_path):
             (lambda data: len(data) == 104, "raster_info_to_bytearray", info),
             (ValueError, "delete_RenderContext", None),
         )  # a host never owns one
-        call.each("make_tarsel_raster_info_from_bits", (None, info, bits), (ValueError, info, short_bits))
-        call.each("make_tarsel_raster_info_from_base64", (None, info, encoded))
+        # None for the record or the text of the two record writers is refused
+        # before the engine sees it (the engine would read through it).
+        call.each(
+            "make_tarsel_raster_info_from_bits",
+            (None, info, bits),
+            (ValueError, info, short_bits),
+            (ValueError, None, bits),
+        )
+        call.each("make_tarsel_raster_info_from_base64", (None, info, encoded), (ValueError, info, None))
         call.each(
             "base64decode",
             (ANY, encoded, decoded_at, 120),

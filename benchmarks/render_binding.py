@@ -62,28 +62,10 @@ def ctypes_render(engine_library):
     name = next(line.split()[-1] for line in symbol.splitlines() if RENDER_SYMBOL_PREFIX in line)
     entry = getattr(ctypes.CDLL(engine_library), name)
     i, f, p, s = ctypes.c_int, ctypes.c_float, ctypes.c_void_p, ctypes.c_char_p
-    entry.argtypes = [
-        p,
-        s,
-        p,
-        i,
-        i,
-        i,
-        i,
-        ctypes.POINTER(p),
-        ctypes.POINTER(p),
-        f,
-        i,
-        f,
-        i,
-        i,
-        i,
-        i,
-        ctypes.c_bool,
-        s,
-        s,
-        s,
-    ]
+    # instance, descriptor, destination and its window; the two lists; then the
+    # scalars, in the order the render call takes them; the three colour spaces.
+    scalars = [f, i, f, i, i, i, i, ctypes.c_bool]
+    entry.argtypes = [p, s, p, i, i, i, i, ctypes.POINTER(p), ctypes.POINTER(p), *scalars, s, s, s]
     entry.restype = i
 
     def call(

@@ -10,6 +10,9 @@ python3 -m venv .venv-wheel
 .venv-wheel/bin/python -m pip install -q --upgrade pip
 .venv-wheel/bin/python -m pip wheel -q --no-deps -w dist .
 wheel=$(ls dist/renderlib-*.whl)
+.venv-wheel/bin/python -c "import sys, zipfile; names = zipfile.ZipFile(sys.argv[1]).namelist()
+sys.exit(not any(name.endswith('.dist-info/licenses/LICENSE') for name in names))" "$wheel" ||
+  { echo "wheel_check: $wheel carries no LICENSE" >&2; exit 1; }
 .venv-wheel/bin/python -m pip install -q "${wheel}[test]"
 echo "installed $wheel"
 # From another folder, so nothing of the source tree can be imported by accident.

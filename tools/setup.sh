@@ -11,10 +11,15 @@ for p in "${packages[@]}"; do
   dpkg -s "$p" >/dev/null 2>&1 || missing+=("$p")
 done
 if ((${#missing[@]})); then
+  echo "setup: installing ${missing[*]}"
   apt-get update -qq
   DEBIAN_FRONTEND=noninteractive apt-get install -y -qq "${missing[@]}"
 fi
 
+echo "setup: the virtual environment .venv"
 python3 -m venv .venv
 .venv/bin/python -m pip install -q --upgrade pip
-.venv/bin/python -m pip install -q '.[test,lint]'
+# The first build takes a few minutes on two cores; later ones reuse
+# build/<wheel tag>/ and rebuild what changed.
+echo "setup: building and installing the package with its test and lint tools"
+.venv/bin/python -m pip install --progress-bar off '.[test,lint]'

@@ -1,4 +1,4 @@
-"""Version text, build identifiers, colour configuration and the user check."""
+"""Version text, build identifiers, colour configuration, the user check, and configuring without a system library."""
 
 import os
 import re
@@ -8,6 +8,7 @@ import sys
 import pytest
 
 import _renderlib
+from native_build import REPO, tool
 from renderlib.cli import main
 
 
@@ -66,3 +67,13 @@ def test_the_version_command_reports_engine_identity_and_user(capsys):
     assert fields["engine build id"] == fields["module build id"] == _renderlib.ext_build_id()
     assert fields["build identity"] == "match"
     assert fields["user check"].endswith("-> ok")
+
+
+@pytest.mark.parametrize("library, package", [("cJSON", "libcjson-dev"), ("PNG", "libpng-dev")])
+def test_a_missing_system_library_stops_the_configure_step_naming_its_package(tmp_path, library, package):
+    hidden = "-DCMAKE_DISABLE_FIND_PACKAGE_%s=ON" % library
+    configure = [tool("cmake"), "-S", str(REPO / "reference-engine"), "-B", str(tmp_path), "-G", "Ninja", hidden]
+    done = subprocess.run(
+        configure + ["-DCMAKE_MAKE_PROGRAM=" + tool("ninja")], capture_output=True, text=True, timeout=120
+    )
+    assert done.returncode != 0 and "apt-get install %s)" % package in " ".join(done.stderr.split()), done.stderr

@@ -14,6 +14,7 @@ import inspect
 import operator
 import os
 import pathlib
+import re
 import sys
 
 import numpy
@@ -64,9 +65,10 @@ def stub_text():
 def arities():
     """{function: (fewest, most) positional arguments}, from the type stubs."""
     counts = {}
-    for node in ast.parse(stub_text()).body:
+    # Without the positional-only marker, which Python 3.7's parser cannot read.
+    for node in ast.parse(re.sub(r",\s*/(?=\s*[,)])", "", stub_text())).body:
         if isinstance(node, ast.FunctionDef):
-            positional = node.args.posonlyargs + node.args.args
+            positional = node.args.args
             low, high = len(positional) - len(node.args.defaults), len(positional)
             fewest, most = counts.get(node.name, (low, high))  # another overload's, if any
             counts[node.name] = (min(low, fewest), max(high, most))

@@ -70,7 +70,8 @@ def inputs(paths, count, seed, max_len):
     rng = random.Random(seed)
     for _ in range(count):
         if not corpus or rng.random() < 0.4:
-            yield rng.randbytes(rng.randint(0, max_len))
+            size = rng.randint(0, max_len)  # the bytes rng.randbytes(size) makes, on Pythons before 3.9 too
+            yield rng.getrandbits(8 * size).to_bytes(size, "little") if size else b""
             continue
         data = bytearray(rng.choice(corpus))
         for _ in range(rng.randint(1, 8)):
